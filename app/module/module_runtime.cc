@@ -1,0 +1,28 @@
+// What the compiler and nanopb's library expect of a C and C++ run-time library and a nanoapp does
+// not have. Part of the module alone: linked into a program, these would take the place of the real
+// ones.
+
+#include <cstddef>
+#include <cstdint>
+
+// Nothing here allocates with new. The operators stand so that the module needs no library for
+// them: an address that faults at first use where there would be an allocation, and nothing where
+// there would be a release (virtual destructors refer to operator delete).
+
+void* operator new[](size_t) { return reinterpret_cast<void*>(uintptr_t{0xDEADBEEF}); }
+void operator delete(void*) noexcept {}
+void operator delete[](void*) noexcept {}
+void operator delete(void*, size_t) noexcept {}
+void operator delete[](void*, size_t) noexcept {}
+
+extern "C" {
+
+// A call of an abstract function: there is nobody to tell.
+void __cxa_pure_virtual() { __builtin_trap(); }
+
+// nanopb's library is built with stack checks, and can grow pointer fields, of which our messages
+// have none.
+void __stack_chk_fail() { __builtin_trap(); }
+void* realloc(void*, size_t) { return nullptr; }
+void free(void*) {}
+}

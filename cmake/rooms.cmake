@@ -1,0 +1,48 @@
+# How the rooms of the house are compiled: one target per room, and the include path of a target holds
+# only its own folder and the rooms it links, so that an include against the order fails to compile.
+
+find_package(Python3 REQUIRED COMPONENTS Interpreter)
+
+# Flags of everything: floats exactly as written, no warning let through.
+add_library(qz_flags INTERFACE)
+target_compile_options(qz_flags INTERFACE -ffp-contract=off -Wall -Wextra -Wshadow -Wundef -Werror)
+if(QZ_SANITIZE)
+  # vptr checks need RTTI, which the module does without.
+  set(sanitizers -fsanitize=address,undefined -fno-sanitize=vptr -fno-sanitize-recover=all)
+  target_compile_options(qz_flags INTERFACE ${sanitizers} -fno-omit-frame-pointer)
+  target_link_options(qz_flags INTERFACE ${sanitizers})
+endif()
+
+# Flags of the module: as on the device. errno of sqrt and stack protectors would be imports.
+add_library(qz_module_flags INTERFACE)
+target_link_libraries(qz_module_flags INTERFACE qz_flags)
+target_compile_options(
+  qz_module_flags
+  INTERFACE -fvisibility=hidden -fno-stack-protector -U_FORTIFY_SOURCE -fno-math-errno
+            -fno-asynchronous-unwind-tables
+            $<$<COMPILE_LANGUAGE:CXX>:-fno-exceptions -fno-rtti -fno-threadsafe-statics>)
+
+# qz_module_room(NAME SOURCES... LINKS...): a room of the module, as a static library.
+function(qz_module_room name)
+  cmake_parse_arguments(room "" "" "SOURCES;LINKS" ${ARGN})
+  add_library(${name} STATIC ${room_SOURCES})
+  target_include_directories(${name} PUBLIC ${CMAKE_CURRENT_SOURCE_DIR})
+  target_link_libraries(${name} PUBLIC ${room_LINKS} PRIVATE qz_module_flags)
+endfunction()
+
+# qz_room(NAME SOURCES... LINKS...): a room of the PC side, as a static library.
+function(qz_room name)
+  cmake_parse_arguments(room "" "" "SOURCES;LINKS" ${ARGN})
+  add_library(${name} STATIC ${room_SOURCES})
+  target_include_directories(${name} PUBLIC ${CMAKE_CURRENT_SOURCE_DIR})
+  target_link_libraries(${name} PUBLIC ${room_LINKS} PRIVATE qz_flags)
+endfunction()
+
+# qz_test(NAME SOURCES... LINKS...): one suite, run by CTest as one test that fails when it holds none.
+function(qz_test name)
+  cmake_parse_arguments(test "" "" "SOURCES;LINKS" ${ARGN})
+  add_executable(${name} ${test_SOURCES})
+  target_link_libraries(${name} PRIVATE ${test_LINKS} qz_test_support qz_flags)
+  add_test(NAME ${name} COMMAND ${name})
+  set_tests_properties(${name} PROPERTIES TIMEOUT 900)
+endfunction()
