@@ -24,8 +24,11 @@ class Heap {
   void Free(void* block);
 
   // Refuses the n-th allocation from now, counted from 1; 0 takes the order back.
-  void RefuseNth(uint64_t n) { refuse_in_ = n; }
-  // True once the ordered refusal has happened.
+  void RefuseNth(uint64_t n) {
+    refuse_in_ = n;
+    refused_ = false;
+  }
+  // True once the refusal last ordered has happened.
   bool refused() const { return refused_; }
 
   size_t live_blocks() const { return live_.size(); }

@@ -219,7 +219,8 @@ bool Hub::ConfigureAudioSource(uint32_t handle, bool enable, uint64_t buffer_dur
 }
 
 bool Hub::RequestClockRate(uint32_t request) {
-  if (request != 0) ++counts_.clock_raises;
+  clock_raised_ = request != 0;
+  if (clock_raised_) ++counts_.clock_raises;
   return true;
 }
 

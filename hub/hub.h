@@ -42,7 +42,7 @@ struct HubCounts {
   uint64_t messages_to_host = 0;    // from the nanoapp to host endpoints
   uint64_t messages_from_host = 0;  // to the nanoapp
   uint64_t undeliverable = 0;       // to an endpoint or instance that is not there
-  uint64_t clock_raises = 0;        // passes that raised the processor clock
+  uint64_t clock_raises = 0;        // requests for the higher processor clock
 };
 
 // A context hub on a PC: one nanoapp, one thread, an event queue, a virtual clock. Everything that
@@ -97,6 +97,8 @@ class Hub final : public Runtime {
   // Tells the nanoapp that its source was suspended or resumed.
   void SetAudioSuspended(bool suspended);
   void AdvanceTime(uint64_t ns);
+  // True while the nanoapp asks for the higher processor clock.
+  bool clock_raised() const { return clock_raised_; }
 
   // Hands any event to the nanoapp at once, then runs the queue dry.
   void DeliverToNanoapp(uint32_t sender, uint16_t type, const void* data);
@@ -146,6 +148,7 @@ class Hub final : public Runtime {
   int64_t host_time_offset_ns_;
   uint32_t next_instance_id_ = 0x101;
   bool ended_ = false;
+  bool clock_raised_ = false;
   bool real_time_ = false;
   uint64_t wall_start_ns_ = 0;  // wall clock at virtual time 0
 };

@@ -15,6 +15,8 @@ void operator delete[](void*) noexcept {}
 void operator delete(void*, size_t) noexcept {}
 void operator delete[](void*, size_t) noexcept {}
 
+// The compiler knows these names as another library's: they are hidden here like all else.
+#pragma GCC visibility push(hidden)
 extern "C" {
 
 // A call of an abstract function: there is nobody to tell.
@@ -26,3 +28,4 @@ void __stack_chk_fail() { __builtin_trap(); }
 void* realloc(void*, size_t) { return nullptr; }
 void free(void*) {}
 }
+#pragma GCC visibility pop

@@ -8,14 +8,14 @@
 
 extern "C" {
 
-extern const char _chreNanoappUnstableId[];
-extern const chreNslNanoappInfo _chreNslDsoNanoappInfo;
+QZ_EXPORT extern const char _chreNanoappUnstableId[];
+QZ_EXPORT extern const chreNslNanoappInfo _chreNslDsoNanoappInfo;
 
 // Which build this is, for people and tools: QZ_BUILD_NUMBER and QZ_DEVICE come from the build.
-QZ_EXPORT __attribute__((section(".unstable_id"))) const char _chreNanoappUnstableId[] =
+__attribute__((section(".unstable_id"))) const char _chreNanoappUnstableId[] =
     "nanoapp=qz@" QZ_BUILD_NUMBER "~" QZ_DEVICE;
 
-QZ_EXPORT const chreNslNanoappInfo _chreNslDsoNanoappInfo = {
+const chreNslNanoappInfo _chreNslDsoNanoappInfo = {
     CHRE_NSL_NANOAPP_INFO_MAGIC,
     CHRE_NSL_NANOAPP_INFO_STRUCT_MINOR_VERSION,
     /*isSystemNanoapp=*/0,

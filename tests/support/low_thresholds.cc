@@ -1,0 +1,12 @@
+// Detection tables with which things are detected; linked into a suite, they take the place of the
+// default.
+
+#include "detection_tables.h"
+
+namespace tarn::contexthub::sound {
+
+const float kSoundThresholds[kSoundCategoryCount] = {0.5f, 0.25f, 0.5f, 0.0625f, 0.5f};
+
+const uint64_t kSoundDetectionCoolingTimeNs[kSoundCategoryCount] = {0, 0, 5'000'000'000, 0, 0};
+
+}  // namespace tarn::contexthub::sound
