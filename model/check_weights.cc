@@ -1,0 +1,132 @@
+#include "check_weights.h"
+
+#include <cmath>
+#include <cstdio>
+
+namespace qz::model {
+namespace {
+
+// Nine significant digits tell any two float32 apart.
+std::string Number(float value) {
+  char text[32];
+  std::snprintf(text, sizeof(text), "%.9g", static_cast<double>(value));
+  return text;
+}
+
+class TableChecker {
+ public:
+  TableChecker(const PackedModel& model, const TableLayout& table,
+               std::vector<std::string>& findings)
+      : model_(model), table_(table), findings_(findings) {}
+
+  void Run() {
+    for (int column = 0; column < table_.PaddedColumns(); ++column) {
+      if (column < table_.outputs) {
+        CheckColumn(column);
+      } else {
+        CheckPadding(column);
+      }
+    }
+  }
+
+ private:
+  bool depthwise() const { return table_.kind == TableKind::kDepthwise; }
+
+  std::string ColumnName(int column) const {
+    return (depthwise() ? "channel " : "column ") + std::to_string(column);
+  }
+
+  void Report(const char* what, int column, const std::string& place, const std::string& value,
+              const std::string& right) {
+    findings_.push_back(std::string(table_.name) + (depthwise() ? ", group " : ", block ") +
+                        std::to_string(column / table_.BlockColumns()) + ": the " + what + " of " +
+                        ColumnName(column) + place + " is " + value + "; " + right + ".");
+  }
+
+  // Calls visit(weight, place) for every weight of a column.
+  template <typename Visit>
+  void ForEachWeight(int column, Visit visit) const {
+    for (int tap = 0; tap < table_.taps; ++tap) {
+      for (int input = 0; input < table_.inputs; ++input) {
+        std::string place;
+        if (table_.taps > 1) place += ", tap " + std::to_string(tap);
+        if (!depthwise()) place += ", input channel " + std::to_string(input);
+        visit(int{Load<int8_t>(model_, table_.WeightOffset(tap, input, column))}, place);
+      }
+    }
+  }
+
+  void CheckColumn(int column) {
+    int sum = 0;
+    ForEachWeight(column, [&](int weight, const std::string& place) {
+      sum += weight;
+      if (weight == -128) {
+        Report("weight", column, place, "-128", "weights lie from -127 to 127");
+      }
+    });
+    if (depthwise()) CheckDepthwiseBias(column, 128 * sum);
+    if (table_.HasScales()) CheckScale(column);
+  }
+
+  void CheckDepthwiseBias(int column, int right) {
+    const int32_t bias = Load<int32_t>(model_, table_.BiasOffset(column));
+    if (bias == right) return;
+    Report("bias", column, "", std::to_string(bias),
+           "128 x the sum of its weights, " + std::to_string(right) + ", would be right");
+  }
+
+  void CheckScale(int column) {
+    const float scale = Load<float>(model_, table_.ScaleOffset(column));
+    if (!std::isfinite(scale) || scale < 0) {
+      Report("scale", column, "", Number(scale), "scales are finite and not negative");
+    } else if (table_.fixed_scale != 0 && scale != table_.fixed_scale) {
+      Report("scale", column, "", Number(scale), Number(table_.fixed_scale) + " would be right");
+    }
+  }
+
+  void CheckPadding(int column) {
+    const std::string right = ColumnName(column) + " is padding (" +
+                              std::to_string(table_.outputs) + " are real) and holds 0";
+    const int32_t bias = Load<int32_t>(model_, table_.BiasOffset(column));
+    if (bias != 0) Report("bias", column, "", std::to_string(bias), right);
+    ForEachWeight(column, [&](int weight, const std::string& place) {
+      if (weight != 0) Report("weight", column, place, std::to_string(weight), right);
+    });
+    if (!table_.HasScales()) return;
+    // By its bits: padding is zero bytes, and a negative zero is not.
+    if (Load<uint32_t>(model_, table_.ScaleOffset(column)) != 0) {
+      Report("scale", column, "", Number(Load<float>(model_, table_.ScaleOffset(column))), right);
+    }
+  }
+
+  const PackedModel& model_;
+  const TableLayout& table_;
+  std::vector<std::string>& findings_;
+};
+
+}  // namespace
+
+std::vector<std::string> CheckWeights(const PackedModel& model) {
+  std::vector<std::string> findings;
+  if (model.size() != kModelBytes) {
+    findings.push_back("The packed model has " + std::to_string(model.size()) + " bytes; " +
+                       std::to_string(kModelBytes) + " would be right.");
+    return findings;
+  }
+  for (const TableLayout& table : kTables) TableChecker(model, table, findings).Run();
+  return findings;
+}
+
+std::string FormatFindings(const std::string& file, const std::vector<std::string>& findings,
+                           size_t cap) {
+  std::string text;
+  for (size_t i = 0; i < findings.size() && i < cap; ++i) {
+    text += file + ": " + findings[i] + "\n";
+  }
+  if (findings.size() > cap) {
+    text += file + ": and " + std::to_string(findings.size() - cap) + " more findings.\n";
+  }
+  return text;
+}
+
+}  // namespace qz::model

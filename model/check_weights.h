@@ -1,0 +1,25 @@
+// The checker of packed models: what it passes drives the network within its contracts.
+#pragma once
+
+#include <cstddef>
+#include <string>
+#include <vector>
+
+#include "weight_layout.h"
+
+namespace qz::model {
+
+// Every finding as one sentence that names the table, the block (or group), the place, its value
+// and what would be right; none for a good model. A model of the wrong size yields that one
+// finding. Findings come in file order of their tables and columns.
+//
+// A good model has 86,000 bytes; weights from -127 to 127; zeros in all places beyond the real
+// columns; finite scales that are not negative; and in the depthwise tables the table's fixed scale
+// and the bias 128 x the sum of the channel's weights (a real bias of 0 at input zero point -128).
+std::vector<std::string> CheckWeights(const PackedModel& model);
+
+// One line per finding, each begun by `file`; from `cap` on only their number.
+std::string FormatFindings(const std::string& file, const std::vector<std::string>& findings,
+                           size_t cap = 20);
+
+}  // namespace qz::model

@@ -1,0 +1,128 @@
+#include "model_commands.h"
+
+#include <cstdint>
+#include <cstdio>
+#include <exception>
+#include <string>
+
+#include "check_weights.h"
+#include "model_files.h"
+#include "standin_model.h"
+
+namespace qz::model {
+namespace {
+
+constexpr char kUsage[] =
+    "usage: qz-model-tool standin --seed N -o FILE    write a stand-in for trained tables\n"
+    "       qz-model-tool check FILE                  refuse a packed model that is not sound\n"
+    "       qz-model-tool embed FILE -o HEADER        turn a sound packed model into a C++ header\n"
+    "exit codes: 0 fine, 1 findings, 2 wrong usage, 3 a file that cannot be read or written\n";
+
+int Usage(const std::string& trouble) {
+  std::fprintf(stderr, "qz-model-tool: %s\n%s", trouble.c_str(), kUsage);
+  return kWrongUsage;
+}
+
+struct Arguments {
+  std::string trouble;  // empty when the command line is understood
+  std::string file;
+  std::string output;
+  std::string seed;
+};
+
+// Everything behind the subcommand: at most one file, and each option once with its value.
+Arguments Parse(const std::vector<std::string>& words) {
+  Arguments arguments;
+  for (size_t i = 1; i < words.size(); ++i) {
+    const std::string& word = words[i];
+    std::string* value = &arguments.file;
+    if (word == "-o" || word == "--seed") {
+      value = word == "-o" ? &arguments.output : &arguments.seed;
+      if (++i == words.size()) {
+        arguments.trouble = word + " needs a value";
+        return arguments;
+      }
+    } else if (!word.empty() && word[0] == '-') {
+      arguments.trouble = "unknown option " + word;
+      return arguments;
+    }
+    if (!value->empty() || words[i].empty()) {
+      arguments.trouble = "unexpected argument '" + words[i] + "'";
+      return arguments;
+    }
+    *value = words[i];
+  }
+  return arguments;
+}
+
+// Decimal digits only, below 2^64.
+bool ParseSeed(const std::string& text, uint64_t& seed) {
+  seed = 0;
+  for (const char c : text) {
+    if (c < '0' || c > '9') return false;
+    const uint64_t digit = static_cast<uint64_t>(c - '0');
+    if (seed > (UINT64_MAX - digit) / 10) return false;
+    seed = seed * 10 + digit;
+  }
+  return !text.empty();
+}
+
+int Standin(const Arguments& arguments) {
+  uint64_t seed;
+  if (arguments.output.empty() || !arguments.file.empty()) {
+    return Usage("standin needs --seed N and -o FILE");
+  }
+  if (!ParseSeed(arguments.seed, seed)) {
+    return Usage("--seed needs an integer from 0 to 18446744073709551615, not '" + arguments.seed +
+                 "'");
+  }
+  const PackedModel model = MakeStandinModel(seed);
+  WriteWholeFile(arguments.output, std::string(model.begin(), model.end()));
+  return kFine;
+}
+
+// Reads and checks; prints the findings.
+int LoadSoundModel(const std::string& file, PackedModel& model) {
+  model = ReadModelFile(file);
+  const std::vector<std::string> findings = CheckWeights(model);
+  std::fputs(FormatFindings(file, findings).c_str(), stderr);
+  return findings.empty() ? kFine : kFindings;
+}
+
+int Check(const Arguments& arguments) {
+  if (arguments.file.empty() || !arguments.output.empty() || !arguments.seed.empty()) {
+    return Usage("check needs one FILE");
+  }
+  PackedModel model;
+  return LoadSoundModel(arguments.file, model);
+}
+
+int Embed(const Arguments& arguments) {
+  if (arguments.file.empty() || arguments.output.empty() || !arguments.seed.empty()) {
+    return Usage("embed needs one FILE and -o HEADER");
+  }
+  PackedModel model;
+  const int result = LoadSoundModel(arguments.file, model);
+  if (result != kFine) return result;
+  WriteWholeFile(arguments.output, TablesHeader(model));
+  return kFine;
+}
+
+}  // namespace
+
+int RunModelCommand(const std::vector<std::string>& words) {
+  const std::string command = words.empty() ? "" : words[0];
+  const Arguments arguments = Parse(words);
+  try {
+    if (!arguments.trouble.empty()) return Usage(arguments.trouble);
+    if (command == "standin") return Standin(arguments);
+    if (command == "check") return Check(arguments);
+    if (command == "embed") return Embed(arguments);
+    return Usage(command.empty() ? "no subcommand" : "unknown subcommand '" + command + "'");
+  } catch (const std::exception& error) {
+    std::fprintf(stderr, "qz-model-tool: %s\n", error.what());
+    return kFileTrouble;
+  }
+}
+
+}  // namespace qz::model

@@ -1,0 +1,23 @@
+// The subcommands of qz-model-tool.
+#pragma once
+
+#include <string>
+#include <vector>
+
+namespace qz::model {
+
+enum ModelCommandResult {
+  kFine = 0,
+  kFindings = 1,     // the packed model is not sound; the findings stand on stderr
+  kWrongUsage = 2,   // the command line was not understood
+  kFileTrouble = 3,  // a file cannot be read or written; a file to be written stays as it was
+};
+
+// Runs the subcommand words[0] with its arguments and returns the exit code. Every failure puts at
+// least one line on stderr.
+//   standin --seed N -o FILE   writes the stand-in model of a seed
+//   check FILE                 checks a packed model
+//   embed FILE -o HEADER       checks it and writes it as a C++ header
+int RunModelCommand(const std::vector<std::string>& words);
+
+}  // namespace qz::model
