@@ -1,0 +1,51 @@
+# The commands of this project; CMake and its presets do the work.
+
+JOBS ?= $(shell nproc)
+# The recording that `make run` plays; made of the sounds of Debian packages unless given.
+CLIP := build/host/clip.wav
+AUDIO ?= $(CLIP)
+
+.PHONY: help run test bench lint setup clean configure-host build-host clip
+
+help:
+	@echo 'make run               build, then run the detector on a clip of recorded sound'
+	@echo 'make run AUDIO=FILE    the same on a sound file of your own'
+	@echo 'make test              build and test, then once more under the sanitizers'
+	@echo 'make bench             time the kernels, the graphs and the whole program'
+	@echo 'make lint              check formatting and the rules of clang-tidy'
+	@echo 'make setup             install what is missing of the Debian packages for all this'
+	@echo 'make clean             remove everything that was built'
+
+setup:
+	@scripts/setup-debian.sh build clip lint
+
+configure-host:
+	@scripts/setup-debian.sh build
+	cmake --preset host
+
+build-host: configure-host
+	cmake --build --preset host --parallel $(JOBS)
+
+run: configure-host $(if $(filter $(CLIP),$(AUDIO)),clip)
+	cmake --build --preset host --parallel $(JOBS) --target qz
+	build/host/bin/qz run --log-level info "$(AUDIO)"
+
+clip:
+	@scripts/setup-debian.sh clip
+	@test -e $(CLIP) || scripts/make-clip.sh $(CLIP)
+
+test: build-host
+	ctest --preset host
+	cmake --preset host-asan
+	cmake --build --preset host-asan --parallel $(JOBS)
+	ctest --preset host-asan
+
+bench: build-host clip
+	scripts/bench.sh
+
+lint: build-host
+	@scripts/setup-debian.sh lint
+	scripts/lint.sh
+
+clean:
+	rm -rf build

@@ -1,0 +1,70 @@
+#!/usr/bin/env bash
+# Installs what is missing of the Debian packages that this project needs; silent when nothing is.
+# Usage: scripts/setup-debian.sh [build] [clip] [lint]     (no argument: all groups)
+set -euo pipefail
+
+packages_of() {
+  case "$1" in
+    build)
+      echo g++ cmake ninja-build make python3 nanopb libnanopb-dev libprotobuf-dev \
+        protobuf-compiler libsndfile1-dev libsoxr-dev libcli11-dev nlohmann-json3-dev \
+        libgtest-dev libgmock-dev libbenchmark-dev binutils
+      ;;
+    clip) echo sox libsox-fmt-base alsa-utils sound-theme-freedesktop ;;
+    lint) echo git clang-format clang-tidy ;;
+    *)
+      echo "setup-debian.sh: no such group: '$1', should be build, clip or lint" >&2
+      exit 2
+      ;;
+  esac
+}
+
+installed() {
+  [ "$(dpkg-query -W -f '${db:Status-Status}' "$1" 2>/dev/null)" = installed ]
+}
+
+still_missing() {
+  local package
+  for package in "$@"; do installed "$package" || echo "$package"; done
+}
+
+[ $# -gt 0 ] || set -- build clip lint
+wanted=()
+for group in "$@"; do
+  names=$(packages_of "$group")
+  read -ra names <<<"$names"
+  wanted+=("${names[@]}")
+done
+
+if ! command -v dpkg-query >/dev/null; then
+  echo "setup-debian.sh: not a Debian system; install the equivalents of: ${wanted[*]}" >&2
+  exit 1
+fi
+
+mapfile -t missing < <(still_missing "${wanted[@]}")
+[ ${#missing[@]} -gt 0 ] || exit 0
+echo "setup-debian.sh: installing ${missing[*]}" >&2
+
+run=(env DEBIAN_FRONTEND=noninteractive)
+if [ "$(id -u)" != 0 ]; then
+  if ! command -v sudo >/dev/null; then
+    echo "setup-debian.sh: neither root nor sudo; install as root: ${missing[*]}" >&2
+    exit 1
+  fi
+  run=(sudo "${run[@]}")
+fi
+
+# One index that can't be fetched need not matter: what the others, or the present ones, hold may do.
+"${run[@]}" apt-get -q update >&2 ||
+  echo "setup-debian.sh: the package index could not be updated; trying with the present one" >&2
+# One package that can't be had must not keep back the others.
+"${run[@]}" apt-get -q install -y --no-install-recommends "${missing[@]}" >&2 ||
+  for package in "${missing[@]}"; do
+    "${run[@]}" apt-get -q install -y --no-install-recommends "$package" >&2 || true
+  done
+
+mapfile -t missing < <(still_missing "${missing[@]}")
+if [ ${#missing[@]} -gt 0 ]; then
+  echo "setup-debian.sh: could not be installed: ${missing[*]}" >&2
+  exit 1
+fi

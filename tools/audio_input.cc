@@ -1,0 +1,85 @@
+#include "audio_input.h"
+
+#include <fcntl.h>
+#include <stdlib.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+#include <vector>
+
+#include "file_descriptor.h"
+#include "interrupt.h"
+#include "raw_input.h"
+#include "sound_file_input.h"
+
+namespace qz::tools {
+namespace {
+
+constexpr size_t kCopyBlockBytes = 65536;
+
+[[noreturn]] void ThrowSystemError(const std::string& name, const char* what) {
+  const int error = errno;
+  throw AudioError(name + ": " + what + ": " + std::strerror(error));
+}
+
+FileDescriptor OpenTemporary() {
+  const char* folder = getenv("TMPDIR");
+  std::string path = std::string(folder != nullptr ? folder : "/tmp") + "/qz-XXXXXX";
+  FileDescriptor file(mkostemp(path.data(), O_CLOEXEC));
+  if (file.get() < 0) ThrowSystemError(path, "can't make a temporary file");
+  unlink(path.c_str());
+  return file;
+}
+
+void WriteAll(const std::string& name, int fd, const char* bytes, size_t count) {
+  while (count > 0) {
+    const ssize_t written = write(fd, bytes, count);
+    if (written < 0 && errno == EINTR) continue;
+    if (written < 0) ThrowSystemError(name, "can't be copied to a temporary file");
+    bytes += written;
+    count -= static_cast<size_t>(written);
+  }
+}
+
+// Some containers need seeking, which a pipe can't do.
+FileDescriptor CopyToTemporary(const std::string& name, const FileDescriptor& source) {
+  FileDescriptor copy = OpenTemporary();
+  std::vector<char> block(kCopyBlockBytes);
+  while (WaitReadable(source.get())) {
+    const ssize_t got = read(source.get(), block.data(), block.size());
+    if (got < 0 && (errno == EINTR || errno == EAGAIN)) continue;
+    if (got < 0) ThrowSystemError(name, "can't be read");
+    if (got == 0) {
+      if (lseek(copy.get(), 0, SEEK_SET) != 0) ThrowSystemError(name, "can't rewind the copy");
+      return copy;
+    }
+    WriteAll(name, copy.get(), block.data(), static_cast<size_t>(got));
+  }
+  throw AudioError(name + ": interrupted before its end");
+}
+
+}  // namespace
+
+std::unique_ptr<AudioInput> OpenAudio(const std::string& path, bool raw) {
+  const bool standard_input = path == "-";
+  const std::string name = standard_input ? "standard input" : path;
+  FileDescriptor file(standard_input ? dup(STDIN_FILENO)
+                                     : open(path.c_str(), O_RDONLY | O_CLOEXEC));
+  if (file.get() < 0) ThrowSystemError(name, "can't be opened");
+  struct stat status = {};
+  if (fstat(file.get(), &status) != 0) ThrowSystemError(name, "can't be examined");
+  if (S_ISDIR(status.st_mode)) throw AudioError(name + ": is a folder, not a sound file");
+  if (raw) return std::make_unique<RawInput>(name, std::move(file));
+
+  // Standard input may be a file that somebody has read from already.
+  const bool at_beginning = S_ISREG(status.st_mode) && lseek(file.get(), 0, SEEK_CUR) == 0;
+  if (!at_beginning) file = CopyToTemporary(name, file);
+  if (fstat(file.get(), &status) == 0 && status.st_size == 0) {
+    throw AudioError(name + ": empty: 0 bytes");
+  }
+  return std::make_unique<SoundFileInput>(name, std::move(file));
+}
+
+}  // namespace qz::tools

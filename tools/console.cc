@@ -1,0 +1,70 @@
+#include "console.h"
+
+#include <signal.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <chrono>
+#include <cstdio>
+#include <cstring>
+
+#include "audio_input.h"
+
+namespace qz::tools {
+namespace {
+
+constexpr int64_t kProgressIntervalMs = 200;
+constexpr uint64_t kLongAudioSamples = uint64_t{120} * kSampleRateHz;
+
+int64_t SteadyMs() {
+  return std::chrono::duration_cast<std::chrono::milliseconds>(
+             std::chrono::steady_clock::now().time_since_epoch())
+      .count();
+}
+
+}  // namespace
+
+Console::Console()
+    : data_on_terminal_(isatty(STDOUT_FILENO) != 0),
+      messages_on_terminal_(isatty(STDERR_FILENO) != 0),
+      next_progress_ms_(SteadyMs() + kProgressIntervalMs) {
+  // A reader that leaves shows up as a failed write instead.
+  signal(SIGPIPE, SIG_IGN);
+}
+
+Console::~Console() { EraseProgress(); }
+
+void Console::Data(const std::string& line) {
+  if (output_lost()) return;
+  EraseProgress();
+  if (std::fwrite((line + '\n').data(), 1, line.size() + 1, stdout) != line.size() + 1 ||
+      std::fflush(stdout) != 0) {
+    lost_error_ = errno;
+  }
+}
+
+void Console::Message(const std::string& line) {
+  EraseProgress();
+  std::fprintf(stderr, "%s\n", line.c_str());
+}
+
+void Console::Progress(uint64_t done, uint64_t total) {
+  if (!messages_on_terminal_ || total < kLongAudioSamples || SteadyMs() < next_progress_ms_) return;
+  next_progress_ms_ = SteadyMs() + kProgressIntervalMs;
+  progress_shown_ = true;
+  std::fprintf(stderr, "\r%.0f of %.0f s, %.0f%%\x1b[K", static_cast<double>(done) / kSampleRateHz,
+               static_cast<double>(total) / kSampleRateHz,
+               100.0 * static_cast<double>(done) / static_cast<double>(total));
+}
+
+std::string Console::OutputFault() const {
+  if (lost_error_ == 0 || lost_error_ == EPIPE) return {};
+  return std::string("standard output: can't be written: ") + std::strerror(lost_error_);
+}
+
+void Console::EraseProgress() {
+  if (progress_shown_) std::fputs("\r\x1b[K", stderr);
+  progress_shown_ = false;
+}
+
+}  // namespace qz::tools

@@ -1,0 +1,40 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+namespace qz::tools {
+
+// The two outputs: data lines on stdout, messages and the progress line on stderr.
+class Console {
+ public:
+  Console();
+  ~Console();
+
+  // A line of data, out at once. After a failed write all further ones are dropped.
+  void Data(const std::string& line);
+  // A line of message.
+  void Message(const std::string& line);
+
+  // `done` of `total` samples in a progress line that the next line replaces; at most five a
+  // second. Only on a terminal, and only for audio that is long.
+  void Progress(uint64_t done, uint64_t total);
+
+  // True once nobody reads stdout any more, or it can't be written.
+  bool output_lost() const { return lost_error_ != 0; }
+  // One line about output that was lost to anything but a reader that had enough; else empty.
+  std::string OutputFault() const;
+
+  bool data_on_terminal() const { return data_on_terminal_; }
+
+ private:
+  void EraseProgress();
+
+  bool data_on_terminal_;
+  bool messages_on_terminal_;
+  bool progress_shown_ = false;
+  int64_t next_progress_ms_;  // on the steady clock
+  int lost_error_ = 0;        // errno of the first failed write of data
+};
+
+}  // namespace qz::tools

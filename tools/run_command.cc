@@ -1,0 +1,181 @@
+#include "run_command.h"
+
+#include <chrono>
+#include <cstdio>
+#include <memory>
+#include <vector>
+
+#include "audio_input.h"
+#include "buffer_cutter.h"
+#include "clients.h"
+#include "console.h"
+#include "hub.h"
+#include "interrupt.h"
+#include "report_format.h"
+
+namespace qz::tools {
+namespace {
+
+// How the nanoapp cuts audio into frames, and how many frames its network looks at.
+constexpr uint64_t kFrameSamples = 400;
+constexpr uint64_t kHopSamples = 160;
+constexpr uint64_t kWindowFrames = 382;
+
+uint64_t FramesOf(uint64_t samples) {
+  return samples < kFrameSamples ? 0 : 1 + (samples - kFrameSamples) / kHopSamples;
+}
+
+std::string LogLine(chreLogLevel level, uint64_t time_ns, const std::string& line) {
+  const char* const names[] = {"error", "warning", "info", "debug"};
+  char head[64];
+  std::snprintf(head, sizeof(head), "[%8.3f s] %s: ", static_cast<double>(time_ns) * 1e-9,
+                names[level]);
+  return head + line;
+}
+
+// One run from its first message to its exit code.
+class Run {
+ public:
+  explicit Run(const RunOptions& options)
+      : options_(options),
+        format_(options.json ? MakeJsonFormat() : MakeTextFormat(console_.data_on_terminal())),
+        clients_(&hub_, format_.get(), &console_) {}
+  // Whatever the module still sends at its end needs the clients.
+  ~Run() { hub_.End(); }
+
+  ExitCode Execute();
+
+ private:
+  bool StartModule(ExitCode* exit_code);
+  void Stream(AudioInput* input);
+  void ReportShortAudio();
+  RunSummary Summarise() const;
+  ExitCode Conclude();
+
+  const RunOptions& options_;
+  Console console_;
+  std::unique_ptr<ReportFormat> format_;
+  hub::Hub hub_;
+  Clients clients_;
+  uint64_t delivered_samples_ = 0;
+  uint64_t silent_samples_ = 0;
+  double wall_seconds_ = 0;
+};
+
+ExitCode Run::Execute() {
+  CatchInterrupt();
+  std::unique_ptr<AudioInput> input;
+  try {
+    input = OpenAudio(options_.file, options_.raw);
+  } catch (const AudioError& error) {
+    console_.Message(std::string("qz: ") + error.what());
+    return kUnreadableInput;
+  }
+
+  ExitCode exit_code = kFine;
+  if (!StartModule(&exit_code)) return exit_code;
+  console_.Message(input->Description());
+  clients_.Connect(options_.host_clients, options_.client_nanoapps);
+  const bool audio_taken = hub_.audio_enabled();
+  if (!audio_taken) console_.Message("no audio source was taken: the nanoapp hears nothing");
+
+  try {
+    Stream(input.get());
+  } catch (const AudioError& error) {
+    clients_.Leave();
+    console_.Message(std::string("qz: ") + error.what());
+    return kUnreadableInput;
+  }
+  if (audio_taken && !console_.output_lost()) ReportShortAudio();
+  clients_.Leave();
+  hub_.End();
+  return Conclude();
+}
+
+bool Run::StartModule(ExitCode* exit_code) {
+  hub_.SetLogHandler([this](chreLogLevel level, uint64_t time_ns, const std::string& line) {
+    if (level <= options_.log_level) console_.Message(LogLine(level, time_ns, line));
+  });
+  hub_.sources().emplace_back();
+  hub::LoadFailure failure;
+  if (hub_.Start(options_.module_path, &failure)) return true;
+  console_.Message("qz: " + failure.sentence);
+  *exit_code = failure.kind == hub::LoadFailure::Kind::kRefused ? kFaultFound : kModuleNotLoadable;
+  return false;
+}
+
+void Run::Stream(AudioInput* input) {
+  if (options_.real_time) hub_.RunInRealTime();
+  const auto start = std::chrono::steady_clock::now();
+  BufferCutter cutter([this](const int16_t* buffer) {
+    hub_.PlayAudio(buffer, kBufferSamples);
+    delivered_samples_ += kBufferSamples;
+  });
+  while (!Interrupted() && !console_.output_lost()) {
+    const size_t got = input->Read(cutter.room(), cutter.room_samples());
+    if (got == 0) break;
+    cutter.Commit(got);
+    console_.Progress(delivered_samples_, input->ExpectedSamples());
+  }
+  if (console_.output_lost()) return;
+  silent_samples_ = cutter.Finish();
+  wall_seconds_ = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+  if (Interrupted()) console_.Message("interrupted");
+  if (silent_samples_ > 0) {
+    char text[96];
+    std::snprintf(text, sizeof(text), "padded the last buffer with %.3f s of silence",
+                  static_cast<double>(silent_samples_) / kSampleRateHz);
+    console_.Message(text);
+  }
+}
+
+void Run::ReportShortAudio() {
+  const uint64_t frames = FramesOf(delivered_samples_);
+  if (frames >= kWindowFrames) return;
+  console_.Message("no network run happened yet: the audio gave " + std::to_string(frames) +
+                   " of the " + std::to_string(kWindowFrames) +
+                   " frames that the network looks at");
+}
+
+RunSummary Run::Summarise() const {
+  const hub::HubCounts& counts = hub_.counts();
+  RunSummary summary;
+  summary.audio_samples = delivered_samples_;
+  summary.silent_samples = silent_samples_;
+  summary.passes = counts.audio_buffers;
+  summary.feature_frames = FramesOf(counts.audio_buffers * kBufferSamples);
+  summary.reports = clients_.reports();
+  summary.detections = clients_.detections();
+  summary.host_clients_accepted = clients_.accepted_hosts();
+  summary.host_clients = options_.host_clients;
+  summary.client_nanoapps = options_.client_nanoapps;
+  summary.messages_from_host = counts.messages_from_host;
+  summary.messages_to_host = counts.messages_to_host;
+  summary.events_to_clients = counts.client_events;
+  return summary;
+}
+
+ExitCode Run::Conclude() {
+  std::vector<std::string> faults = clients_.faults();
+  for (const std::string& fault : hub_.Faults()) faults.push_back(fault);
+
+  RunSummary summary = Summarise();
+  summary.heap_blocks_held = hub_.heap().live_blocks();
+  summary.faults = faults.size();
+  // The pace of the clock on the wall says nothing about speed.
+  if (!options_.real_time && wall_seconds_ > 0) {
+    summary.speed = static_cast<double>(delivered_samples_) / kSampleRateHz / wall_seconds_;
+  }
+  console_.Data(format_->Summary(summary));
+
+  for (const std::string& fault : faults) console_.Message("qz: fault: " + fault);
+  const std::string output_fault = console_.OutputFault();
+  if (!output_fault.empty()) console_.Message("qz: " + output_fault);
+  return faults.empty() && output_fault.empty() ? kFine : kFaultFound;
+}
+
+}  // namespace
+
+ExitCode RunCommand(const RunOptions& options) { return Run(options).Execute(); }
+
+}  // namespace qz::tools

@@ -1,0 +1,32 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+#include "chre.h"
+
+namespace qz::tools {
+
+enum ExitCode {
+  kFine = 0,
+  kFaultFound = 1,
+  kUsage = 2,
+  kUnreadableInput = 3,
+  kModuleNotLoadable = 4,
+};
+
+struct RunOptions {
+  std::string file;  // "-": standard input
+  bool raw = false;
+  uint32_t host_clients = 1;
+  uint32_t client_nanoapps = 1;
+  chreLogLevel log_level = CHRE_LOG_WARN;
+  bool json = false;
+  bool real_time = false;
+  std::string module_path;
+};
+
+// Plays a file to the nanoapp and prints what its clients receive. Says what went wrong itself.
+ExitCode RunCommand(const RunOptions& options);
+
+}  // namespace qz::tools

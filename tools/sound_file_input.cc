@@ -1,0 +1,124 @@
+#include "sound_file_input.h"
+
+#include <algorithm>
+#include <cmath>
+#include <utility>
+
+#include "truncation.h"
+
+namespace qz::tools {
+namespace {
+
+constexpr int kLowestRateHz = 1000;
+constexpr int kHighestRateHz = 768000;
+constexpr int kMostChannels = 64;
+constexpr size_t kBlockFrames = 4096;
+
+// libsndfile's messages may begin with "Error : ", span lines and end in a dot.
+std::string OneLine(std::string text) {
+  const std::string prefix = "Error : ";
+  if (text.compare(0, prefix.size(), prefix) == 0) text.erase(0, prefix.size());
+  std::replace(text.begin(), text.end(), '\n', ' ');
+  while (!text.empty() && (text.back() == ' ' || text.back() == '.')) text.pop_back();
+  return text;
+}
+
+}  // namespace
+
+SoundFileInput::SoundFileInput(std::string name, FileDescriptor file)
+    : name_(std::move(name)), file_(std::move(file)) {
+  sound_file_.reset(sf_open_fd(file_.get(), SFM_READ, &info_, SF_FALSE));
+  if (sound_file_ == nullptr) {
+    throw AudioError(name_ + ": not a readable sound file: " + OneLine(sf_strerror(nullptr)));
+  }
+  CheckHeader();
+  const std::string truncation = FindTruncation(file_.get());
+  if (!truncation.empty()) throw AudioError(name_ + ": " + truncation);
+  converter_ = std::make_unique<SampleConverter>(info_.samplerate, info_.channels);
+  block_.resize(kBlockFrames * static_cast<size_t>(info_.channels));
+}
+
+void SoundFileInput::CheckHeader() const {
+  if (info_.samplerate < kLowestRateHz || info_.samplerate > kHighestRateHz) {
+    throw AudioError(name_ + ": the sample rate is " + std::to_string(info_.samplerate) +
+                     " Hz, should be " + std::to_string(kLowestRateHz) + " to " +
+                     std::to_string(kHighestRateHz));
+  }
+  if (info_.channels < 1 || info_.channels > kMostChannels) {
+    throw AudioError(name_ + ": " + std::to_string(info_.channels) + " channels, should be 1 to " +
+                     std::to_string(kMostChannels));
+  }
+  if (info_.frames == 0) throw AudioError(name_ + ": no audio: 0 frames");
+}
+
+std::string SoundFileInput::Description() const {
+  const bool mix = info_.channels > 1;
+  const bool resample = info_.samplerate != static_cast<int>(kSampleRateHz);
+  std::string text = name_ + ": " + std::to_string(info_.samplerate) + " Hz, " +
+                     std::to_string(info_.channels) + (mix ? " channels, " : " channel, ");
+  if (mix) text += resample ? "mixed down and " : "mixed down to mono";
+  if (resample) text += "resampled to 16000 Hz mono";
+  if (!mix && !resample) {
+    const int encoding = info_.format & SF_FORMAT_SUBMASK;
+    text += encoding == SF_FORMAT_PCM_16 ? "16 bits, taken as it is" : "rounded to 16 bits";
+  }
+  return text;
+}
+
+uint64_t SoundFileInput::ExpectedSamples() const {
+  if (!LengthKnown()) return 0;
+  return static_cast<uint64_t>(
+      std::ceil(static_cast<double>(info_.frames) * kSampleRateHz / info_.samplerate));
+}
+
+size_t SoundFileInput::Read(int16_t* samples, size_t count) {
+  while (converted_read_ == converted_.size()) {
+    if (at_end_) return 0;
+    ConvertBlock();
+  }
+  const size_t given = std::min(count, converted_.size() - converted_read_);
+  std::copy_n(converted_.data() + converted_read_, given, samples);
+  converted_read_ += given;
+  return given;
+}
+
+void SoundFileInput::ConvertBlock() {
+  converted_.clear();
+  converted_read_ = 0;
+  const sf_count_t got = sf_readf_float(sound_file_.get(), block_.data(), kBlockFrames);
+  if (got > 0) {
+    CheckFinite(static_cast<size_t>(got));
+    frames_decoded_ += got;
+    converter_->Convert(block_.data(), static_cast<size_t>(got), &converted_);
+  } else {
+    CheckEnd();
+    converter_->Flush(&converted_);
+    at_end_ = true;
+  }
+}
+
+void SoundFileInput::CheckFinite(size_t frames) const {
+  const auto channels = static_cast<size_t>(info_.channels);
+  for (size_t i = 0; i < frames * channels; ++i) {
+    if (std::isfinite(block_[i])) continue;
+    throw AudioError(name_ + ": frame " +
+                     std::to_string(static_cast<size_t>(frames_decoded_) + i / channels) +
+                     ", channel " + std::to_string(i % channels) + ": the sample is " +
+                     (std::isnan(block_[i]) ? "not a number" : "infinite"));
+  }
+}
+
+void SoundFileInput::CheckEnd() const {
+  const std::string place = name_ + ": frame " + std::to_string(frames_decoded_) + ": ";
+  if (sf_error(sound_file_.get()) != SF_ERR_NO_ERROR) {
+    throw AudioError(place + "corrupt: " + OneLine(sf_strerror(sound_file_.get())));
+  }
+  // The length of an MPEG stream is an estimate.
+  const bool exact = LengthKnown() && (info_.format & SF_FORMAT_TYPEMASK) != SF_FORMAT_MPEG;
+  if (frames_decoded_ == 0 || (exact && frames_decoded_ < info_.frames)) {
+    throw AudioError(place + "truncated or corrupt: the audio ends here, the header promises " +
+                     std::to_string(info_.frames) + " frames");
+  }
+}
+
+}  // namespace qz::tools

@@ -1,0 +1,49 @@
+#pragma once
+
+#include <sndfile.h>
+
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "audio_input.h"
+#include "file_descriptor.h"
+#include "sample_converter.h"
+
+namespace qz::tools {
+
+// A sound file in any container that libsndfile knows, told by its contents.
+class SoundFileInput final : public AudioInput {
+ public:
+  // `name` stands for the file in messages; `file` is seekable and stands at its beginning. Throws
+  // AudioError.
+  SoundFileInput(std::string name, FileDescriptor file);
+
+  size_t Read(int16_t* samples, size_t count) override;
+  std::string Description() const override;
+  uint64_t ExpectedSamples() const override;
+
+ private:
+  struct CloseSoundFile {
+    void operator()(SNDFILE* file) const { sf_close(file); }
+  };
+
+  void CheckHeader() const;
+  void ConvertBlock();
+  void CheckFinite(size_t frames) const;
+  void CheckEnd() const;
+  bool LengthKnown() const { return info_.frames < SF_COUNT_MAX; }
+
+  std::string name_;
+  FileDescriptor file_;
+  SF_INFO info_ = {};
+  std::unique_ptr<SNDFILE, CloseSoundFile> sound_file_;
+  std::unique_ptr<SampleConverter> converter_;
+  std::vector<float> block_;        // frames as decoded
+  std::vector<int16_t> converted_;  // what came of them,
+  size_t converted_read_ = 0;       // and how much of that has been read
+  sf_count_t frames_decoded_ = 0;
+  bool at_end_ = false;
+};
+
+}  // namespace qz::tools
