@@ -1,7 +1,5 @@
 #include "clients.h"
 
-#include <cstdio>
-
 #include "messages.h"
 
 namespace qz::tools {
@@ -9,12 +7,10 @@ namespace {
 
 constexpr uint16_t kFirstEndpoint = 0x0010;
 
-std::string FaultSentence(const char* what, uint32_t type, const char* receiver, uint32_t id,
-                          size_t size) {
-  char text[128];
-  std::snprintf(text, sizeof(text), "%s 0x%x to %s 0x%x: its %zu bytes can't be decoded", what,
-                type, receiver, id, size);
-  return text;
+std::string FaultSentence(const std::string& what, uint32_t type, const std::string& receiver,
+                          uint32_t id, size_t size) {
+  return what + " " + std::to_string(type) + " to " + receiver + " " + std::to_string(id) +
+         ": its " + std::to_string(size) + " bytes can't be decoded";
 }
 
 }  // namespace

@@ -45,7 +45,7 @@ class TextFormat final : public ReportFormat {
   }
 
   std::string Report(uint32_t client, const hub::SoundReport& report) const override {
-    return Line(Format("report to nanoapp 0x%x", client), report);
+    return Line(Format("report to nanoapp %u", client), report);
   }
 
   std::string Detection(uint16_t endpoint, const hub::SoundReport& event) const override {

@@ -4,7 +4,6 @@
 
 #include <cmath>
 #include <cstring>
-#include <fstream>
 #include <map>
 #include <set>
 
@@ -15,9 +14,7 @@
 namespace qz::test {
 namespace {
 
-using ::testing::Each;
 using ::testing::ElementsAre;
-using ::testing::HasSubstr;
 using Bytes = std::vector<uint8_t>;
 
 constexpr uint32_t kBufferSamples = 32000;
@@ -140,18 +137,14 @@ TEST(LoadedModule, ServesHostsAndNanoappsFromOneRecording) {
   EXPECT_EQ(heard.counts.audio_buffers, kBuffers);
   EXPECT_EQ(heard.counts.clock_raises, kBuffers);
   EXPECT_EQ(heard.counts.undeliverable, 0u);
-}
 
-TEST(LoadedModule, EveryLoadBeginsAnewAndAnswersTheSame) {
-  const std::vector<int16_t> samples = Recording(6);
-  const Heard first = Listen(samples, QZ_MODULE);
-  const Heard second = Listen(samples, QZ_MODULE);
-  EXPECT_EQ(first.reports, second.reports);
+  // Every load begins anew.
+  EXPECT_EQ(Listen(Recording(kBuffers), QZ_MODULE).reports, heard.reports);
+#ifdef QZ_STANDIN
   // Recorded with the stand-in model: another figure on another machine or build is a broken
   // promise.
-  if (QZ_STANDIN) {
-    EXPECT_EQ(Fnv1a(first.reports.at(0)), 0x0u);
-  }
+  EXPECT_EQ(Fnv1a(heard.reports.at(0)), 0x6F9AA3DA2058A843u);
+#endif
 }
 
 TEST(LoadedModule, LivesOnARuntimeWithoutAudio) {
@@ -170,30 +163,6 @@ TEST(LoadedModule, LivesOnARuntimeWithoutAudio) {
   EXPECT_THAT(responses, ElementsAre(hub::kEnableResponse, hub::kDisableResponse,
                                      hub::kEnableResponse, hub::kDisableResponse));
   EXPECT_FALSE(runtime.hub.audio_enabled());
-}
-
-TEST(LoadedModule, OtherFilesAreRefusedWithASentence) {
-  const std::string text = testing::TempDir() + "no_module.so";
-  std::ofstream(text) << "no module";
-  const struct {
-    std::string path;
-    hub::LoadFailure::Kind kind;
-    const char* sentence;
-  } cases[] = {
-      {"/nonexistent/qz.so", hub::LoadFailure::Kind::kNotLoadable, "/nonexistent/qz.so"},
-      {text, hub::LoadFailure::Kind::kNotLoadable, "no_module.so"},
-      {QZ_NO_RECORD, hub::LoadFailure::Kind::kNotLoadable, "does not export _chreNslDso"},
-      {QZ_WRONG_MAGIC, hub::LoadFailure::Kind::kRefused,
-       "magic is 0x50e69978, should be 0x50e69977"},
-  };
-  for (const auto& other : cases) {
-    hub::Hub hub;
-    hub::LoadFailure failure;
-    EXPECT_FALSE(hub.Start(other.path, &failure));
-    EXPECT_EQ(failure.kind, other.kind) << failure.sentence;
-    EXPECT_THAT(failure.sentence, HasSubstr(other.sentence));
-    EXPECT_EQ(hub.nanoapp(), nullptr);
-  }
 }
 
 }  // namespace

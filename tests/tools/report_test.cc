@@ -1,6 +1,5 @@
 // The parts of a run that need no nanoapp: buffers cut from a stream, and how reports look.
 
-#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <nlohmann/json.hpp>
@@ -11,8 +10,6 @@
 
 namespace qz::tools {
 namespace {
-
-using testing::HasSubstr;
 
 TEST(BufferCutterTest, CutsAnyPiecesIntoWholeBuffersAndPadsTheLast) {
   std::vector<int16_t> stream(2 * kBufferSamples + 5000);
@@ -33,16 +30,6 @@ TEST(BufferCutterTest, CutsAnyPiecesIntoWholeBuffersAndPadsTheLast) {
   stream.resize(3 * kBufferSamples);
   EXPECT_EQ(delivered, stream);
   EXPECT_EQ(cutter.Finish(), 0u);
-}
-
-TEST(ReportFormatTest, TextNamesEverythingThatAReportCarries) {
-  const hub::SoundReport report{4'000'000'000, 4'000'000'000, 202208270, {{6, 0.25f}, {15, 2.0f}}};
-  EXPECT_EQ(MakeTextFormat(false)->Report(0x101, report),
-            "[   4.000 s] report to nanoapp 0x101: category 6 0.2500, category 15 2.0000, "
-            "model 202208270");
-  const std::string bars = MakeTextFormat(true)->Detection(0x10, report);
-  EXPECT_THAT(bars, HasSubstr("0x0010: category 6 0.2500 [####............]"));
-  EXPECT_THAT(bars, HasSubstr("2.0000 [################]"));
 }
 
 TEST(ReportFormatTest, JsonKeepsEveryBit) {
