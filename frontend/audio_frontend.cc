@@ -45,7 +45,8 @@ uint8_t state_initialized;
 // instruction.
 template <typename T, size_t kCount>
 T* Begin(size_t offset) {
-  return ::new (arena + offset) T[kCount];
+  // This form of new, of a reserved name, keeps no count before the elements.
+  return ::new (arena + offset) T[kCount];  // NOLINT(clang-analyzer-cplusplus.PlacementNew)
 }
 
 // Left shift that brings a non-zero peak into 16384 to 32767, where it is not there or above

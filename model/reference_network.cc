@@ -64,7 +64,7 @@ int8_t RequantiseFloat(int32_t acc, float scale, int zero_point) {
 int8_t RequantiseFixed(int32_t acc, const Requantisation& requantisation) {
   int64_t high = (int64_t{acc} * requantisation.multiplier) >> 31;
   high = std::min<int64_t>(high, std::numeric_limits<int32_t>::max());
-  const int64_t half = int64_t{1} << (requantisation.shift - 1);
+  const int64_t half = (int64_t{1} << requantisation.shift) / 2;
   return Clamp(((high + half) >> requantisation.shift) + requantisation.zero_point);
 }
 
@@ -92,7 +92,7 @@ std::vector<int32_t> Accumulate(const PackedModel& model, const TableLayout& tab
         }
       }
       for (int c = 0; c < real; ++c) {
-        out[static_cast<size_t>(row * table.outputs + first + c)] = static_cast<int32_t>(sums[c]);
+        out[static_cast<size_t>(row) * table.outputs + first + c] = static_cast<int32_t>(sums[c]);
       }
     }
   }

@@ -68,7 +68,7 @@ class StandinMaker {
         sums[i % sums.size()] += accumulators[i];
         squares[i % sums.size()] += value * value;
       }
-      count += static_cast<double>(accumulators.size() / sums.size());
+      count += static_cast<double>(accumulators.size()) / static_cast<double>(sums.size());
     }
     std::vector<Spread> spreads;
     for (size_t c = 0; c < sums.size(); ++c) {

@@ -36,7 +36,7 @@ class Scene {
 
  private:
   double& At(int row, int channel) {
-    return cells_[static_cast<size_t>(row * kInputChannels + channel)];
+    return cells_[static_cast<size_t>(row) * kInputChannels + static_cast<size_t>(channel)];
   }
 
   void Raise(int row, int channel, double level) {

@@ -10,10 +10,13 @@
 // there would be a release (virtual destructors refer to operator delete).
 
 void* operator new[](size_t) { return reinterpret_cast<void*>(uintptr_t{0xDEADBEEF}); }
+// NOLINTBEGIN(misc-new-delete-overloads): the single operator new is never called, not even
+// referred to.
 void operator delete(void*) noexcept {}
 void operator delete[](void*) noexcept {}
 void operator delete(void*, size_t) noexcept {}
 void operator delete[](void*, size_t) noexcept {}
+// NOLINTEND(misc-new-delete-overloads)
 
 // The compiler knows these names as another library's: they are hidden here like all else.
 #pragma GCC visibility push(hidden)

@@ -27,6 +27,7 @@ void chreLog(chreLogLevel level, const char* format, ...) {
   char line[512];
   va_list arguments;
   va_start(arguments, format);
+  // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): it was, one line above.
   std::vsnprintf(line, sizeof(line), format, arguments);
   va_end(arguments);
   InstalledRuntime()->Log(level, line);

@@ -208,7 +208,7 @@ TEST_F(HostClients, HostilePayloadsEndInALogLine) {
     const Bytes payload = random.Fill<uint8_t>(static_cast<size_t>(random.Between(0, 40)), 0, 255);
     const auto type = static_cast<uint32_t>(random.Between(0, 9));
     Send(static_cast<uint16_t>(random.Between(0x10, 0x1F)), type, payload);
-    for (const std::string& line : TakeLog()) refused += line.find("Unable to decode") != line.npos;
+    for (const std::string& line : TakeLog()) refused += line.find("Unable to decode") != std::string::npos;
   }
   EXPECT_GT(refused, 1000);
   const Bytes oversized(100'000, 0x08);

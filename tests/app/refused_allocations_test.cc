@@ -48,7 +48,7 @@ TEST_F(RefusedAllocations, EachInTurn) {
     if (!refused) break;
     size_t lines = 0;
     for (const std::string& line : TakeLog()) {
-      if (line[0] != 'E' || line.find("not registered") != line.npos) continue;
+      if (line[0] != 'E' || line.find("not registered") != std::string::npos) continue;
       errors.insert(line.substr(0, line.find('#')));
       ++lines;
     }
