@@ -5,6 +5,9 @@ JOBS ?= $(shell nproc)
 CLIP := build/host/clip.wav
 AUDIO ?= $(CLIP)
 
+# Parallelism is the builds' own; two set-ups at a time would fight over dpkg's lock.
+.NOTPARALLEL:
+
 .PHONY: help run test bench lint setup clean configure-host build-host clip
 
 help:

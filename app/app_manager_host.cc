@@ -12,8 +12,8 @@ namespace {
 constexpr uint32_t kQueryResponseBufferSize = 1024;
 constexpr uint16_t kInvalidHostEndpoint = 0xFFFF;
 
-// Number of the out-of-memory log line of a query: fixed, so that a line from the field keeps its
-// meaning when the file changes.
+// Place of the out-of-memory log line of a query: fixed, so that a line from the field keeps its
+// meaning when the code moves.
 constexpr const char* kSourceFile = "app_manager.cc";
 constexpr int kQueryOomLine = 174;
 

@@ -9,8 +9,8 @@
 
 namespace {
 
-// The loader's handle for "the runtime's functions": every lookup scope but this module's own
-// exports, which these two are not among.
+// The loader's handle for the runtime's functions. The two definitions here are not exported, so
+// that the lookup can't find them.
 template <typename Function>
 Function* FindInRuntime(const char* name) {
   void* const runtime = reinterpret_cast<void*>(static_cast<intptr_t>(-1));

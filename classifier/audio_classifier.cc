@@ -13,9 +13,9 @@ namespace {
 
 constexpr uint32_t kPassSamples = 32000;
 constexpr uint32_t kHopSamples = 160;
-constexpr uint32_t kFrameSamples = 400;
+constexpr uint32_t kFrameSamples = qz::frontend::kFrameSamples;
 constexpr uint32_t kCarriedSamples = kFrameSamples - kHopSamples;
-constexpr uint32_t kFeatures = 48;
+constexpr uint32_t kFeatures = qz::frontend::kFeatureChannels;
 constexpr uint32_t kWindowFrames = 382;
 constexpr uint32_t kFramesBetweenRuns = 64;
 constexpr uint32_t kCarriedFrames = kWindowFrames - kFramesBetweenRuns;

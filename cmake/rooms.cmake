@@ -22,12 +22,13 @@ target_compile_options(
             -fno-asynchronous-unwind-tables
             $<$<COMPILE_LANGUAGE:CXX>:-fno-exceptions -fno-rtti -fno-threadsafe-statics>)
 
-# qz_module_room(NAME SOURCES... LINKS...): a room of the module, as a static library.
+# qz_module_room(NAME SOURCES... LINKS... USES...): a room of the module, as a static library. Who links it
+# sees the rooms of LINKS too, which its headers include, but not those of USES.
 function(qz_module_room name)
-  cmake_parse_arguments(room "" "" "SOURCES;LINKS" ${ARGN})
+  cmake_parse_arguments(room "" "" "SOURCES;LINKS;USES" ${ARGN})
   add_library(${name} STATIC ${room_SOURCES})
   target_include_directories(${name} PUBLIC ${CMAKE_CURRENT_SOURCE_DIR})
-  target_link_libraries(${name} PUBLIC ${room_LINKS} PRIVATE qz_module_flags)
+  target_link_libraries(${name} PUBLIC ${room_LINKS} PRIVATE ${room_USES} qz_module_flags)
 endfunction()
 
 # qz_room(NAME SOURCES... LINKS...): a room of the PC side, as a static library.

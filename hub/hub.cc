@@ -33,6 +33,7 @@ void Hub::RunInRealTime() {
 }
 
 bool Hub::Start(const std::string& module_path, LoadFailure* failure) {
+  End();
   module_ = NanoappModule::Load(module_path, failure);
   if (module_ != nullptr && StartNanoapp(module_->info(), module_path, failure)) return true;
   module_.reset();
@@ -40,6 +41,7 @@ bool Hub::Start(const std::string& module_path, LoadFailure* failure) {
 }
 
 bool Hub::StartLinked(const chreNslNanoappInfo& info, LoadFailure* failure) {
+  End();
   const std::string wrong = CheckNanoappInfo(info);
   if (wrong.empty()) return StartNanoapp(info, info.name, failure);
   *failure = {LoadFailure::Kind::kRefused, "linked nanoapp: refused: " + wrong};
@@ -48,6 +50,7 @@ bool Hub::StartLinked(const chreNslNanoappInfo& info, LoadFailure* failure) {
 
 bool Hub::StartNanoapp(const chreNslNanoappInfo& info, const std::string& name,
                        LoadFailure* failure) {
+  ended_ = false;
   nanoapp_ = info.start() ? &info : nullptr;
   RunQueue();
   if (nanoapp_ == nullptr) {
@@ -167,7 +170,9 @@ bool Hub::SendEvent(uint16_t type, void* data, chreEventCompleteFunction* free_c
       return;
     }
     ++counts_.client_events;
-    client->second(type, data, heap_.SizeOf(data));
+    // A copy: the handler may stop its own client.
+    const EventHandler handler = client->second;
+    handler(type, data, heap_.SizeOf(data));
   };
   queue_.push_back({deliver, release});
   return true;
@@ -189,7 +194,8 @@ bool Hub::SendMessageToHost(void* message, size_t size, uint32_t type, uint16_t 
       return;
     }
     ++counts_.messages_to_host;
-    found->second(type, static_cast<const uint8_t*>(message), size);
+    const MessageHandler handler = found->second;
+    handler(type, static_cast<const uint8_t*>(message), size);
   };
   queue_.push_back({deliver, release});
   return true;

@@ -56,8 +56,6 @@ class Hub final : public Runtime {
   using LogHandler =
       std::function<void(chreLogLevel level, uint64_t time_ns, const std::string& line)>;
 
-  static constexpr uint32_t kNanoappInstanceId = 1;
-
   // There can be one hub at a time.
   explicit Hub(int64_t host_time_offset_ns = 0);
   // Ends the nanoapp if it runs.
@@ -66,12 +64,13 @@ class Hub final : public Runtime {
   // Set-up.
   void SetLogHandler(LogHandler handler) { log_ = std::move(handler); }
   std::vector<AudioSource>& sources() { return sources_; }
-  FaultPlan& faults() { return fault_plan_; }
+  FaultPlan& fault_plan() { return fault_plan_; }
   Heap& heap() { return heap_; }
   // Lets the virtual clock keep pace with the wall clock.
   void RunInRealTime();
 
-  // Loads the module and runs its start entry point; false with `*failure` filled if either fails.
+  // Ends what runs, loads the module and runs its start entry point; false with `*failure` filled
+  // if either fails.
   bool Start(const std::string& module_path, LoadFailure* failure);
   // The same for a nanoapp that is linked into the program.
   bool StartLinked(const chreNslNanoappInfo& info, LoadFailure* failure);

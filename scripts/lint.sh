@@ -7,7 +7,8 @@ cd "$(dirname "$0")/.."
 database=build/host/compile_commands.json
 [ -e "$database" ] || { echo "lint.sh: $database is missing, run make lint" >&2; exit 1; }
 
-mapfile -t sources < <(git ls-files --cached --others --exclude-standard -- '*.h' '*.cc')
+mapfile -t sources < <(
+  git ls-files --cached --others --exclude-standard -- '*.h' '*.cc' | xargs -d '\n' ls -d 2>/dev/null)
 [ ${#sources[@]} -gt 0 ] || { echo "lint.sh: no sources found" >&2; exit 1; }
 clang-format --dry-run -Werror "${sources[@]}"
 

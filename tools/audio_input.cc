@@ -57,7 +57,7 @@ FileDescriptor CopyToTemporary(const std::string& name, const FileDescriptor& so
     }
     WriteAll(name, copy.get(), block.data(), static_cast<size_t>(got));
   }
-  throw AudioError(name + ": interrupted before its end");
+  throw AudioError(name + ": interrupted before its end; live sound needs --raw");
 }
 
 }  // namespace

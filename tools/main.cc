@@ -1,5 +1,7 @@
 // qz: runs the sound event detector on a PC.
 
+#include <fcntl.h>
+
 #include <CLI/CLI.hpp>
 #include <algorithm>
 #include <cstdio>
@@ -19,16 +21,23 @@ constexpr int kMostClients = 64;
 // In the order of chreLogLevel.
 const std::vector<std::string> kLogLevels = {"error", "warning", "info", "debug"};
 
+// A standard stream that is closed stays an error: nothing opened later may take its number.
+void OccupyStandardStreams() {
+  for (int fd = 0; fd <= 2; ++fd) {
+    if (fcntl(fd, F_GETFD) == -1) open("/dev/null", fd == 0 ? O_WRONLY : O_RDONLY);
+  }
+}
+
 // The module beside this program: bin/qz and lib/qz.so.
 std::string DefaultModulePath() {
   const std::filesystem::path program = std::filesystem::read_symlink("/proc/self/exe");
   return (program.parent_path().parent_path() / "lib" / "qz.so").string();
 }
 
-void AddRun(CLI::App* app, RunOptions* options, std::string* log_level) {
+CLI::App* AddRun(CLI::App* app, RunOptions* options, std::string* log_level) {
   CLI::App* run =
       app->add_subcommand("run", "Play a sound file to the detector, print its reports");
-  run->add_option("FILE", options->file, "WAV, FLAC, OGG, ...; - is standard input")->required();
+  run->add_option("FILE", options->file, "WAV, FLAC, OGG, ...; - is standard input, read to its end first unless --raw")->required();
   run->add_flag("--raw", options->raw, "FILE is headerless 16-bit little-endian mono at 16 kHz");
   run->add_option("--host-clients", options->host_clients, "Host clients to connect")
       ->check(CLI::Range(0, kMostClients))
@@ -42,22 +51,26 @@ void AddRun(CLI::App* app, RunOptions* options, std::string* log_level) {
   run->add_flag("--json", options->json, "One JSON object a line on standard output");
   run->add_flag("--realtime", options->real_time, "Play at the pace of the clock on the wall");
   run->add_option("--module", options->module_path, "The module to load (default: ../lib/qz.so)");
+  return run;
 }
 
 int Main(int argc, char** argv) {
   CLI::App app("Sound event detector, run on a PC", "qz");
   app.set_version_flag("--version", "qz " QZ_VERSION);
-  app.require_subcommand(1);
   app.failure_message([](const CLI::App*, const CLI::Error& error) {
     return std::string("qz: ") + error.what() + " (see qz run --help)\n";
   });
   RunOptions options;
   std::string log_level = "warning";
-  AddRun(&app, &options, &log_level);
+  const CLI::App* run = AddRun(&app, &options, &log_level);
   try {
     app.parse(argc, argv);
   } catch (const CLI::ParseError& error) {
     return app.exit(error) == 0 ? qz::tools::kFine : qz::tools::kUsage;
+  }
+  if (!run->parsed()) {
+    std::fprintf(stderr, "qz: no command, should be run (see qz --help)\n");
+    return qz::tools::kUsage;
   }
   options.log_level = static_cast<chreLogLevel>(
       std::find(kLogLevels.begin(), kLogLevels.end(), log_level) - kLogLevels.begin());
@@ -68,6 +81,7 @@ int Main(int argc, char** argv) {
 }  // namespace
 
 int main(int argc, char** argv) {
+  OccupyStandardStreams();
   try {
     return Main(argc, argv);
   } catch (const std::exception& error) {

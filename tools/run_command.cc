@@ -47,7 +47,8 @@ class Run {
 
  private:
   bool StartModule(ExitCode* exit_code);
-  void Stream(AudioInput* input);
+  // Plays the input, of which `first_samples` stand in the cutter's room already.
+  void Stream(AudioInput* input, size_t first_samples);
   void ReportShortAudio();
   RunSummary Summarise() const;
   ExitCode Conclude();
@@ -57,6 +58,10 @@ class Run {
   std::unique_ptr<ReportFormat> format_;
   hub::Hub hub_;
   Clients clients_;
+  BufferCutter cutter_{[this](const int16_t* buffer) {
+    hub_.PlayAudio(buffer, kBufferSamples);
+    delivered_samples_ += kBufferSamples;
+  }};
   uint64_t delivered_samples_ = 0;
   uint64_t silent_samples_ = 0;
   double wall_seconds_ = 0;
@@ -65,8 +70,11 @@ class Run {
 ExitCode Run::Execute() {
   CatchInterrupt();
   std::unique_ptr<AudioInput> input;
+  size_t first_samples = 0;
   try {
     input = OpenAudio(options_.file, options_.raw);
+    // Before anything starts: audio that is bad from its beginning costs one line.
+    first_samples = input->Read(cutter_.room(), cutter_.room_samples());
   } catch (const AudioError& error) {
     console_.Message(std::string("qz: ") + error.what());
     return kUnreadableInput;
@@ -79,17 +87,19 @@ ExitCode Run::Execute() {
   const bool audio_taken = hub_.audio_enabled();
   if (!audio_taken) console_.Message("no audio source was taken: the nanoapp hears nothing");
 
+  std::string broken_off;
   try {
-    Stream(input.get());
+    Stream(input.get(), first_samples);
+    if (audio_taken && !console_.output_lost()) ReportShortAudio();
   } catch (const AudioError& error) {
-    clients_.Leave();
-    console_.Message(std::string("qz: ") + error.what());
-    return kUnreadableInput;
+    broken_off = std::string("qz: ") + error.what();
   }
-  if (audio_taken && !console_.output_lost()) ReportShortAudio();
   clients_.Leave();
   hub_.End();
-  return Conclude();
+  exit_code = Conclude();
+  if (broken_off.empty()) return exit_code;
+  console_.Message(broken_off);
+  return kUnreadableInput;
 }
 
 bool Run::StartModule(ExitCode* exit_code) {
@@ -104,21 +114,16 @@ bool Run::StartModule(ExitCode* exit_code) {
   return false;
 }
 
-void Run::Stream(AudioInput* input) {
+void Run::Stream(AudioInput* input, size_t first_samples) {
   if (options_.real_time) hub_.RunInRealTime();
   const auto start = std::chrono::steady_clock::now();
-  BufferCutter cutter([this](const int16_t* buffer) {
-    hub_.PlayAudio(buffer, kBufferSamples);
-    delivered_samples_ += kBufferSamples;
-  });
-  while (!Interrupted() && !console_.output_lost()) {
-    const size_t got = input->Read(cutter.room(), cutter.room_samples());
-    if (got == 0) break;
-    cutter.Commit(got);
+  for (size_t got = first_samples; got > 0 && !console_.output_lost();) {
+    cutter_.Commit(got);
     console_.Progress(delivered_samples_, input->ExpectedSamples());
+    got = Interrupted() ? 0 : input->Read(cutter_.room(), cutter_.room_samples());
   }
   if (console_.output_lost()) return;
-  silent_samples_ = cutter.Finish();
+  silent_samples_ = cutter_.Finish();
   wall_seconds_ = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
   if (Interrupted()) console_.Message("interrupted");
   if (silent_samples_ > 0) {
@@ -130,11 +135,10 @@ void Run::Stream(AudioInput* input) {
 }
 
 void Run::ReportShortAudio() {
-  const uint64_t frames = FramesOf(delivered_samples_);
-  if (frames >= kWindowFrames) return;
-  console_.Message("no network run happened yet: the audio gave " + std::to_string(frames) +
-                   " of the " + std::to_string(kWindowFrames) +
-                   " frames that the network looks at");
+  if (FramesOf(delivered_samples_) >= kWindowFrames) return;
+  console_.Message("no network run happened yet: the audio gave " +
+                   std::to_string(FramesOf(delivered_samples_ - silent_samples_)) + " of the " +
+                   std::to_string(kWindowFrames) + " frames that the network looks at");
 }
 
 RunSummary Run::Summarise() const {

@@ -28,8 +28,8 @@ class Runtime {
   virtual bool RequestClockRate(uint32_t request) = 0;
 };
 
-// Makes `runtime` the one behind the functions; null when it goes. Without one, allocations and
-// sends fail and the clock stands at 0.
+// Makes `runtime` the one behind the functions; null when it goes. Without one no nanoapp runs:
+// allocations and sends fail, no callback is called, and the clock stands at 0.
 void InstallRuntime(Runtime* runtime);
 Runtime* InstalledRuntime();
 

@@ -1,7 +1,6 @@
 #pragma once
 
 #include <cstddef>
-#include <new>
 #include <type_traits>
 
 namespace chre {
@@ -15,7 +14,6 @@ class FixedSizeVector {
 
  public:
   size_t size() const { return size_; }
-  static constexpr size_t capacity() { return kCapacity; }
   bool empty() const { return size_ == 0; }
   bool full() const { return size_ == kCapacity; }
 

@@ -24,8 +24,6 @@ class Singleton {
     sIsInitialized = false;
   }
 
-  static bool isInitialized() { return sIsInitialized; }
-
   // The object; it must stand.
   static T* get() { return std::launder(reinterpret_cast<T*>(sObject)); }
 

@@ -31,7 +31,7 @@ TEST_F(Nanoapp, StartsOnceAndDispatchesWhatItKnows) {
 
 TEST_F(Nanoapp, TakesTheFirstSuitableSource) {
   hub().sources().resize(5);
-  hub().sources()[0].sample_rate_hz = 48000;
+  hub().sources()[0].sample_rate_hz = 15999;
   hub().sources()[1].max_buffer_ns = 1'999'999'999;
   hub().sources()[2].min_buffer_ns = 2'000'000'001;
   hub().sources()[3].min_buffer_ns = hub().sources()[3].max_buffer_ns = 2'000'000'000;
@@ -94,6 +94,7 @@ TEST_F(Nanoapp, HoldsTheMicrophoneFromTheFirstClientToTheLast) {
                           "I is_audio_enabled_ = 1; HostCount = 0; hasInternalClient = 0", "I Stop",
                           "I Disabling audio"));
   EXPECT_FALSE(audio());
+  EXPECT_EQ(hub().sources()[0].buffer_ns + hub().sources()[0].interval_ns, 0u);
   hub().SendFromClientNanoapp(second, hub::kUnregisterEvent);
   EXPECT_THAT(TakeLog(),
               ElementsAre("I SoundService: unregisterClient 258", "E SoundService: not registered",
@@ -107,6 +108,22 @@ TEST_F(Nanoapp, AStoppedClientIsForgottenButTheAudioGoesOn) {
   EXPECT_TRUE(audio());
   hub().StopClientNanoapp(0xBAD);
   EXPECT_EQ(TakeLog().back(), "E SoundService: not registered");
+}
+
+TEST_F(Nanoapp, TheLastClientTakesTheSmoothedScoresAlong) {
+  Start();
+  stub_network.scores = [](int) { return Scores{0, 0.5f, 0, 0.5f, 0}; };
+  for (int visit = 0; visit < 3; ++visit) {
+    const uint32_t client = RegisterClientNanoapp();
+    stub_network.runs = 0;
+    events.clear();
+    while (stub_network.runs == 0) PlayBuffer();
+    const auto& bytes = events.back().bytes;
+    const auto report = hub::DecodeFramedSoundReport(bytes.data(), bytes.size());
+    ASSERT_TRUE(report.has_value());
+    EXPECT_EQ(report->results[1].confidence, stub_network.runs * 0.5f / 16.0f) << visit;
+    hub().SendFromClientNanoapp(client, hub::kUnregisterEvent);
+  }
 }
 
 TEST_F(Nanoapp, DropsAudioOfAnotherLength) {
@@ -126,15 +143,20 @@ TEST_F(Nanoapp, PublishesToEachClientInOrderOfRegistration) {
   const uint32_t second = RegisterClientNanoapp();
   const uint32_t third = RegisterClientNanoapp();
   hub().SendFromClientNanoapp(second, hub::kUnregisterEvent);
-  hub().faults().refuse_events = true;
+  hub().fault_plan().refuse_events = true;
   PlayBuffer();
-  hub().faults().refuse_events = false;
+  hub().fault_plan().refuse_events = false;
   EXPECT_THAT(events, IsEmpty());
   PlayBuffer();
   ASSERT_EQ(events.size(), 2u);
   EXPECT_EQ(events[0].receiver, first);
   EXPECT_EQ(events[1].receiver, third);
   EXPECT_EQ(events[0].bytes, events[1].bytes);
+
+  // A copy that the heap refuses costs this client and all later ones the report.
+  hub().heap().RefuseNth(2);
+  PlayBuffer();
+  EXPECT_EQ(events.size(), 2u);
 }
 
 }  // namespace

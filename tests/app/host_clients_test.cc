@@ -173,7 +173,7 @@ TEST_F(HostClients, RawAudioReachesEveryHost) {
   EXPECT_EQ(messages[1].type, hub::kRawAudioSegment);
   EXPECT_EQ(messages[1].bytes, (Bytes{0x08, 1, 0x10, 2, 0x1A, 3, 0xAA, 0xBB, 0xCC}));
   TakeLog();
-  hub().faults().refuse_host_messages = true;
+  hub().fault_plan().refuse_host_messages = true;
   manager->OnRawAudioTransmissibleSegment(1, 2, &info);
   const std::string failed = "E Failed to send RAW_AUDIO_SEGMENT message to host client.";
   EXPECT_THAT(TakeLog(), ElementsAre(failed, failed));
@@ -183,7 +183,7 @@ TEST_F(HostClients, FailedSendsAreLoggedAndNothingElseChanges) {
   Start();
   Enable(0x10, 1);
   Enable(0x11, 2);
-  hub().faults().refuse_host_messages = true;
+  hub().fault_plan().refuse_host_messages = true;
   TakeLog();
   Send(0x12, hub::kQueryRequest, {});
   Enable(0x12, 3);
@@ -194,7 +194,7 @@ TEST_F(HostClients, FailedSendsAreLoggedAndNothingElseChanges) {
   PlayDetection();
   const std::string failed = "E Failed to send SOUND_EVENT_DETECTION message to host.";
   EXPECT_THAT(TakeLog(), ElementsAre(failed, failed));
-  hub().faults() = {};
+  hub().fault_plan() = {};
   TakeMessages();
   PlayDetection();
   EXPECT_THAT(TakeMessages(), ElementsAre("7@16", "7@17"));
@@ -208,7 +208,8 @@ TEST_F(HostClients, HostilePayloadsEndInALogLine) {
     const Bytes payload = random.Fill<uint8_t>(static_cast<size_t>(random.Between(0, 40)), 0, 255);
     const auto type = static_cast<uint32_t>(random.Between(0, 9));
     Send(static_cast<uint16_t>(random.Between(0x10, 0x1F)), type, payload);
-    for (const std::string& line : TakeLog()) refused += line.find("Unable to decode") != std::string::npos;
+    for (const std::string& line : TakeLog())
+      refused += line.find("Unable to decode") != std::string::npos;
   }
   EXPECT_GT(refused, 1000);
   const Bytes oversized(100'000, 0x08);

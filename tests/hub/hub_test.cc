@@ -96,7 +96,7 @@ TEST(Hub, DeliversInOrderFreesEverythingOnceAndFindsTheLeak) {
   for (const bool refuse : {false, true}) {
     Hub hub;
     freed = 0;
-    hub.faults() = {refuse, refuse};
+    hub.fault_plan() = {refuse, refuse};
     std::vector<std::string> delivered;
     hub.ConnectHostEndpoint(1, [&](uint32_t type, const uint8_t*, size_t size) {
       delivered.push_back("message " + std::to_string(type) + " size " + std::to_string(size) +
