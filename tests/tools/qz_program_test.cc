@@ -10,7 +10,7 @@
 
 #include "program.h"
 #include "random.h"
-#include "temporary_folder.h"
+#include "sound_folder.h"
 
 namespace qz::test {
 namespace {
@@ -50,7 +50,7 @@ void ExpectOneLine(const std::string& text) {
 
 class QzProgramTest : public testing::Test {
  protected:
-  TemporaryFolder folder_;
+  SoundFolder folder_;
 };
 
 TEST_F(QzProgramTest, JsonTellsWhatEveryClientReceived) {

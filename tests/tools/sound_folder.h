@@ -1,35 +1,19 @@
-// A folder for the files of one test, removed with it; and how to fill it.
+// A folder with sound files.
 #pragma once
 
 #include <gtest/gtest.h>
 #include <sndfile.h>
 
-#include <cstdlib>
-#include <filesystem>
-#include <fstream>
 #include <string>
 #include <vector>
 
+#include "temporary_folder.h"
+
 namespace qz::test {
 
-class TemporaryFolder {
+// Each function writes a file and gives its path.
+class SoundFolder : public TemporaryFolder {
  public:
-  TemporaryFolder() {
-    std::string path = (std::filesystem::temp_directory_path() / "qz-test-XXXXXX").string();
-    if (mkdtemp(path.data()) == nullptr) std::abort();
-    path_ = path;
-  }
-  TemporaryFolder(const TemporaryFolder&) = delete;
-  TemporaryFolder& operator=(const TemporaryFolder&) = delete;
-  ~TemporaryFolder() { std::filesystem::remove_all(path_); }
-
-  std::string Path(const std::string& name) const { return (path_ / name).string(); }
-
-  // Each writes a file and gives its path.
-  std::string WriteBytes(const std::string& name, const std::string& bytes) const {
-    std::ofstream(Path(name), std::ios::binary) << bytes;
-    return Path(name);
-  }
   std::string WriteRaw(const std::string& name, const std::vector<int16_t>& samples) const {
     return WriteBytes(name, {reinterpret_cast<const char*>(samples.data()), samples.size() * 2});
   }
@@ -52,9 +36,6 @@ class TemporaryFolder {
     sf_close(file);
     return Path(name);
   }
-
- private:
-  std::filesystem::path path_;
 };
 
 }  // namespace qz::test

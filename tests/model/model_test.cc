@@ -1,0 +1,199 @@
+// The checker's findings, the tool's dealings with files, the stand-in, and what the reference
+// network does where no stand-in takes it; the rest of that is compared with the module's network.
+
+#include <gmock/gmock.h>
+
+#include <algorithm>
+#include <cmath>
+#include <filesystem>
+#include <iterator>
+#include <map>
+#include <sstream>
+#include <stdexcept>
+
+#include "check_weights.h"
+#include "model_commands.h"
+#include "model_files.h"
+#include "reference_network.h"
+#include "standin_model.h"
+#include "synthetic_features.h"
+#include "temporary_folder.h"
+
+namespace qz::model {
+namespace {
+
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::StartsWith;
+
+// Each made once: that takes half a second.
+const PackedModel& Standin(uint64_t seed) {
+  static std::map<uint64_t, PackedModel> models;
+  PackedModel& model = models[seed];
+  if (model.empty()) model = MakeStandinModel(seed);
+  return model;
+}
+
+template <typename T>
+std::vector<std::string> FindingsWith(size_t offset, T value) {
+  PackedModel model = Standin(1);
+  Store(model, offset, value);
+  return CheckWeights(model);
+}
+
+TEST(CheckWeights, NamesTheTableAndPlaceOfEveryKindOfDefect) {
+  const auto& [w0, w1, w3, w4, w6, w8, w10, w12, w13, w15, w17, w18] = kTables;
+  const size_t weight = w6.WeightOffset(1, 14, 27), scale = w4.ScaleOffset(9);
+  const std::pair<std::vector<std::string>, const char*> kCases[] = {
+      {FindingsWith<int8_t>(weight, -128),
+       "w6, block 3: the weight of column 27, tap 1, input channel 14 is -128; weights lie from"},
+      {FindingsWith<int8_t>(w3.WeightOffset(2, 0, 63), -128),
+       "w3, group 3: the weight of channel 63, tap 2 is -128; channel 63 is padding (60 are real)"},
+      {FindingsWith<int8_t>(w18.WeightOffset(0, 63, 7), 1),
+       "w18, block 0: the weight of column 7, input channel 63 is 1; column 7 is padding (5 are"},
+      {FindingsWith(w1.BiasOffset(60), -7), "w1, block 7: the bias of column 60 is -7; column 60"},
+      {FindingsWith(w15.ScaleOffset(63), -0.0f), "w15, block 7: the scale of column 63 is -0; col"},
+      {FindingsWith(scale, -0.5f), "w4, block 1: the scale of column 9 is -0.5; scales are finite"},
+      {FindingsWith(scale, INFINITY), "w4, block 1: the scale of column 9 is inf; scales are"},
+      {FindingsWith(scale, NAN), "w4, block 1: the scale of column 9 is nan; scales are"},
+      {FindingsWith(w0.ScaleOffset(17), std::nextafter(0.0076417988f, 1.0f)),
+       "w0, group 1: the scale of channel 17 is 0.00764179928; 0.00764179882 would be right."}};
+  for (const auto& [findings, start] : kCases) {
+    EXPECT_THAT(findings, ElementsAre(StartsWith(start)));
+  }
+  EXPECT_THAT(FindingsWith<int8_t>(weight, -127), ElementsAre());
+  EXPECT_THAT(FindingsWith(scale, 0.0f), ElementsAre());
+
+  PackedModel model = Standin(1);
+  for (int tap : {0, 1, 2}) Store<int8_t>(model, w3.WeightOffset(tap, 0, 16), 60 - 55 * tap);
+  Store<int32_t>(model, w3.BiasOffset(16), 128 * (60 + 5 - 50) + 1);
+  EXPECT_THAT(CheckWeights(model),
+              ElementsAre("w3, group 1: the bias of channel 16 is 1921; 128 x the sum of its "
+                          "weights, 1920, would be right."));
+  model.push_back(0);
+  EXPECT_THAT(CheckWeights(model), ElementsAre(StartsWith("The packed model has 86001 bytes; ")));
+}
+
+TEST(CheckWeights, PrintsSomeFindingsAndCountsTheRest) {
+  EXPECT_EQ(FormatFindings("f", {"a", "b", "c"}, 1), "f: a\nf: and 2 more findings.\n");
+  EXPECT_EQ(FormatFindings("f", {"a", "b"}, 2), "f: a\nf: b\n");
+}
+
+// A folder of its own, and the tool's words on stderr.
+class ModelTool : public testing::Test {
+ protected:
+  int Run(const std::string& line) {
+    std::istringstream words(line);
+    testing::internal::CaptureStderr();
+    const int result = RunModelCommand({std::istream_iterator<std::string>(words), {}});
+    errors_ = testing::internal::GetCapturedStderr();
+    return result;
+  }
+
+  std::ptrdiff_t FilesInFolder() const {
+    return std::distance(std::filesystem::directory_iterator(folder_), {});
+  }
+
+  const test::TemporaryFolder own_folder_;
+  const std::string folder_ = own_folder_.Path("");
+  const std::string model_ = folder_ + "model.bin";
+  std::string errors_;
+};
+
+TEST_F(ModelTool, MakesChecksAndEmbeds) {
+  EXPECT_EQ(Run("standin --seed 18446744073709551615 -o " + model_), kFine);
+  EXPECT_EQ(ReadModelFile(model_), Standin(UINT64_MAX));
+  EXPECT_EQ(Run("check " + model_), kFine);
+  EXPECT_EQ(Run("embed " + model_ + " -o " + folder_ + "a.h"), kFine);
+  EXPECT_EQ(FilesInFolder(), 2);
+  // A folder in the way lets the temporary file be written but not renamed.
+  std::filesystem::create_directories(folder_ + "way/inner");
+  EXPECT_EQ(Run("embed " + model_ + " -o " + folder_ + "way"), kFileTrouble);
+  EXPECT_EQ(FilesInFolder(), 3);
+}
+
+TEST_F(ModelTool, NamesUnsoundAndUnreadableModelsAndWritesNothing) {
+  WriteWholeFile(model_, "four");
+  EXPECT_EQ(Run("embed " + model_ + " -o " + folder_ + "a.h"), kFindings);
+  EXPECT_EQ(errors_, model_ + ": The packed model has 4 bytes; 86000 would be right.\n");
+  EXPECT_EQ(Run("check " + folder_ + "absent.bin"), kFileTrouble);
+  EXPECT_THAT(errors_, HasSubstr(folder_ + "absent.bin: cannot open: No such file"));
+  EXPECT_EQ(Run("check " + folder_), kFileTrouble);
+  EXPECT_EQ(FilesInFolder(), 1);
+}
+
+TEST_F(ModelTool, ExplainsItsUsage) {
+  for (const char* line :
+       {"", "melt", "check", "check a b", "check --fast", "embed a", "embed a -o", "standin -o a",
+        "standin --seed 1x -o a", "standin --seed 18446744073709551616 -o a",
+        "standin --seed 1 --seed 2 -o a"}) {
+    EXPECT_EQ(Run(line), kWrongUsage) << line;
+    EXPECT_THAT(errors_, HasSubstr("usage: qz-model-tool")) << line;
+  }
+}
+
+TEST(ReferenceNetwork, SaturatesWrapsAndRefuses) {
+  EXPECT_EQ(RequantiseFloat(INT32_MAX, 1e6f, -128), 127);
+  EXPECT_EQ(RequantiseFloat(INT32_MIN, 1e6f, 127), -128);
+  // Exactly 0.5 + 2^-25; single precision holds 2^24 there.
+  EXPECT_EQ(RequantiseFloat((1 << 24) + 1, 0x1p-25f, 0), 0);
+  EXPECT_EQ(RequantiseFixed(INT32_MAX, {-128, INT32_MAX, 1}), 127);
+  EXPECT_EQ(RequantiseFixed(INT32_MIN, {0, INT32_MIN, 25}), 64) << "2^31 saturates, then rounds";
+
+  PackedModel model(kModelBytes);
+  Store(model, FindTable(17)->BiasOffset(63), INT32_MAX);
+  Store<int8_t>(model, FindTable(17)->WeightOffset(0, 0, 63), 1);
+  Tensor in(1, 60);
+  in.values[0] = 1;
+  EXPECT_EQ(Accumulate(model, *FindTable(17), in)[63], INT32_MIN);
+  EXPECT_THROW(RunNetwork(model, Tensor(381, 48)), std::invalid_argument);
+  model.pop_back();
+  EXPECT_THROW(RunNetwork(model, Tensor(382, 48)), std::invalid_argument);
+}
+
+// On every machine, compiler and optimisation level.
+TEST(StandinModel, FollowsItsSeedAndNothingElse) {
+  uint64_t digest = 0xCBF29CE484222325u;  // 64-bit FNV-1a
+  for (const uint8_t byte : Standin(1)) digest = (digest ^ byte) * 0x100000001B3u;
+  EXPECT_EQ(digest, 5163167844880385850u);
+  EXPECT_NE(Standin(UINT64_MAX), Standin(1));
+}
+
+// Width of the middle 98 % of a channel's bytes over time and windows: a pattern over channels that
+// stands still counts for nothing.
+int UsedRange(const std::vector<NetworkRun>& runs, size_t op, int channel) {
+  std::vector<int8_t> values;
+  for (const NetworkRun& run : runs) {
+    const Tensor& tensor = run.outputs[op];
+    for (int row = 0; row < tensor.rows; ++row) values.push_back(tensor.Row(row)[channel]);
+  }
+  std::sort(values.begin(), values.end());
+  return values[values.size() * 99 / 100] - values[values.size() / 100];
+}
+
+TEST(StandinModel, IsSoundAndAlive) {
+  for (uint64_t seed : {uint64_t{1}, UINT64_MAX}) {
+    SCOPED_TRACE(seed);
+    const PackedModel& model = Standin(seed);
+    EXPECT_THAT(CheckWeights(model), ElementsAre());
+    std::vector<NetworkRun> runs;  // on windows that the calibration did not see
+    for (uint64_t s = 0; s < 40; ++s) runs.push_back(RunNetwork(model, SyntheticWindow(s)));
+    for (size_t op = 0; op < 19; ++op) {
+      // Logits live within 21 steps of the zero point; the depthwise outputs are not rectified.
+      const int least = op == 18 ? 30 : op == 0 || op == 3 ? 50 : 100;
+      for (int c = 0; c < runs[0].outputs[op].channels; ++c) {
+        EXPECT_GE(UsedRange(runs, op, c), least) << "operator " << op << ", channel " << c;
+      }
+    }
+    for (size_t i = 0; i < kClasses; ++i) {
+      int low = 0, middle = 0, high = 0;
+      for (const NetworkRun& run : runs) {
+        ++(run.scores[i] < 0.2f ? low : run.scores[i] > 0.8f ? high : middle);
+      }
+      EXPECT_GE(std::min({low, middle, high}), 3) << "class " << i;
+    }
+  }
+}
+
+}  // namespace
+}  // namespace qz::model
