@@ -50,10 +50,10 @@ class Detection : public testing::Test {
     runtime_.TakeLog();
   }
 
-  // One pass, two seconds later; the number of its runs.
-  int Pass(uint32_t confidence_size = 2) {
+  // One pass, so many seconds later; the number of its runs.
+  int Pass(uint32_t confidence_size = 2, uint64_t seconds = 2) {
     static const std::vector<int16_t> silence(32000);
-    runtime_.hub.AdvanceTime(2'000'000'000);
+    runtime_.hub.AdvanceTime(seconds * 1'000'000'000);
     const int before = stub_network.runs;
     uint32_t version = 0;
     classifier_.Classify(silence.data(), report_, confidence_size, &version);
@@ -172,18 +172,13 @@ TEST_F(Detection, ACoolingCategoryIsSkipped) {
                                       "17:0.750000 18:0.750000", "18:0.750000"));
 }
 
-TEST_F(Detection, NoTimeIsNoCooling) {
+TEST_F(Detection, WithoutACoolingTimeACategoryRestsUntilTheClockMoves) {
   RecordingListener listener;
   classifier_.RegisterListener(&listener);
-  stub_network.scores = [](int) { return Scores{0.75f, 0, 0, 0, 0}; };
-  static const std::vector<int16_t> silence(32000);
-  uint32_t version = 0;
-  // Without a cooling time the category still rests until the clock moves.
-  runtime_.hub.AdvanceTime(1);
-  for (int pass = 0; pass < 3; ++pass) classifier_.Classify(silence.data(), report_, 2, &version);
+  PassWith({{0.75f, 0, 0, 0, 0}});
+  for (int pass = 0; pass < 2; ++pass) Pass(2, /*seconds=*/0);
   EXPECT_EQ(listener.calls.size(), 1u);
-  runtime_.hub.AdvanceTime(1);
-  classifier_.Classify(silence.data(), report_, 2, &version);
+  Pass();
   EXPECT_EQ(listener.calls.size(), 2u);
 }
 

@@ -3,7 +3,6 @@
 #include <vector>
 
 #include "chre/dynamic_vector.h"
-#include "chre/fixed_size_vector.h"
 #include "test_hub.h"
 
 namespace {
@@ -39,16 +38,6 @@ TEST(DynamicVector, DoublesItsStorageAndKeepsTheOrder) {
   EXPECT_EQ(vector.find(4), 2u);
   EXPECT_EQ(vector.find(2), vector.size());
   EXPECT_EQ(vector.capacity(), 8u);
-}
-
-TEST(FixedSizeVector, EraseClosesTheGap) {
-  chre::FixedSizeVector<int, 3> vector;
-  for (int i = 1; i <= 3; ++i) vector.push_back(i);
-  EXPECT_TRUE(vector.full());
-  vector.erase(0);
-  EXPECT_EQ(Contents(vector), (std::vector<int>{2, 3}));
-  vector.erase(1);
-  EXPECT_EQ(Contents(vector), std::vector<int>{2});
 }
 
 }  // namespace
