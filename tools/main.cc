@@ -37,7 +37,9 @@ std::string DefaultModulePath() {
 CLI::App* AddRun(CLI::App* app, RunOptions* options, std::string* log_level) {
   CLI::App* run =
       app->add_subcommand("run", "Play a sound file to the detector, print its reports");
-  run->add_option("FILE", options->file, "WAV, FLAC, OGG, ...; - is standard input, read to its end first unless --raw")->required();
+  run->add_option("FILE", options->file,
+                  "WAV, FLAC, OGG, ...; - is standard input, read to its end first unless --raw")
+      ->required();
   run->add_flag("--raw", options->raw, "FILE is headerless 16-bit little-endian mono at 16 kHz");
   run->add_option("--host-clients", options->host_clients, "Host clients to connect")
       ->check(CLI::Range(0, kMostClients))

@@ -26,9 +26,9 @@ extern "C" {
 void __cxa_pure_virtual() { __builtin_trap(); }
 
 // nanopb's library is built with stack checks, and can grow pointer fields, of which our messages
-// have none.
+// have none: the linker hands its calls of realloc and free to these.
 void __stack_chk_fail() { __builtin_trap(); }
-void* realloc(void*, size_t) { return nullptr; }
-void free(void*) {}
+void* __wrap_realloc(void*, size_t) { return nullptr; }
+void __wrap_free(void*) {}
 }
 #pragma GCC visibility pop

@@ -67,7 +67,7 @@ TEST(ModuleFile, RunsNothingAtLoad) {
 #endif
 
 TEST(ModuleFile, ExportsTheRecordAndTheUnstableId) {
-  EXPECT_THAT(DynamicSymbols("--defined-only --extern-only"),
+  EXPECT_THAT(DynamicSymbols("--defined-only"),
               ElementsAre("_chreNanoappUnstableId", "_chreNslDsoNanoappInfo"));
 }
 

@@ -194,8 +194,8 @@ TEST(Depthwise, EqualsPlainSums) {
     std::vector<int8_t> out(width * stride + 16, kGuard), expected = out;
     for (size_t p = 0; p < width; ++p) {
       for (size_t c = 0, first = p * step; c < channels; ++c) {
-        const int8_t x[] = {rows[first][c], rows[first + 1][c], rows[first + 2][c]};
-        expected[p * stride + c] = Requantise(layer.Sum(c, x), layer.scales[c], params);
+        const std::vector<int8_t> x = {rows[first][c], rows[first + 1][c], rows[first + 2][c]};
+        expected[p * stride + c] = Requantise(layer.Sum(c, x.data()), layer.scales[c], params);
       }
     }
     orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35(
