@@ -156,13 +156,6 @@ void Hub::Log(chreLogLevel level, const char* line) {
 
 bool Hub::SendEvent(uint16_t type, void* data, chreEventCompleteFunction* free_callback,
                     uint32_t target_instance_id) {
-  auto release = [=] {
-    if (free_callback != nullptr) free_callback(type, data);
-  };
-  if (fault_plan_.refuse_events) {
-    release();
-    return false;
-  }
   auto deliver = [=] {
     const auto client = clients_.find(target_instance_id);
     if (client == clients_.end()) {
@@ -174,31 +167,37 @@ bool Hub::SendEvent(uint16_t type, void* data, chreEventCompleteFunction* free_c
     const EventHandler handler = client->second;
     handler(type, data, heap_.SizeOf(data));
   };
-  queue_.push_back({deliver, release});
-  return true;
+  auto release = [=] {
+    if (free_callback != nullptr) free_callback(type, data);
+  };
+  return Post(fault_plan_.refuse_events, {deliver, release});
 }
 
 bool Hub::SendMessageToHost(void* message, size_t size, uint32_t type, uint16_t endpoint,
                             chreMessageFreeFunction* free_callback) {
-  auto release = [=] {
-    if (free_callback != nullptr) free_callback(message, size);
-  };
-  if (fault_plan_.refuse_host_messages) {
-    release();
-    return false;
-  }
   auto deliver = [=] {
-    const auto found = endpoints_.find(endpoint);
-    if (found == endpoints_.end()) {
+    const auto host = endpoints_.find(endpoint);
+    if (host == endpoints_.end()) {
       ++counts_.undeliverable;
       return;
     }
     ++counts_.messages_to_host;
-    const MessageHandler handler = found->second;
+    const MessageHandler handler = host->second;
     handler(type, static_cast<const uint8_t*>(message), size);
   };
-  queue_.push_back({deliver, release});
-  return true;
+  auto release = [=] {
+    if (free_callback != nullptr) free_callback(message, size);
+  };
+  return Post(fault_plan_.refuse_host_messages, {deliver, release});
+}
+
+bool Hub::Post(bool refused, Parcel parcel) {
+  if (refused) {
+    parcel.release();
+  } else {
+    queue_.push_back(std::move(parcel));
+  }
+  return !refused;
 }
 
 bool Hub::GetAudioSource(uint32_t handle, chreAudioSource* source) {
@@ -253,7 +252,7 @@ void Hub::PostAudioStatus(uint32_t handle, bool enabled, bool suspended) {
     const chreAudioSourceStatusEvent event{handle, {enabled, suspended}};
     CallNanoapp(0, CHRE_EVENT_AUDIO_SAMPLING_CHANGE, &event);
   };
-  queue_.push_back({deliver, [] {}});
+  Post(/*refused=*/false, {deliver, [] {}});
 }
 
 }  // namespace qz::hub

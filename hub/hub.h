@@ -128,6 +128,8 @@ class Hub final : public Runtime {
     std::function<void()> release;  // runs once, delivered or not
   };
 
+  // Queues the parcel, or releases it at once if it is refused; false then.
+  bool Post(bool refused, Parcel parcel);
   void RunQueue();
   bool StartNanoapp(const chreNslNanoappInfo& info, const std::string& name, LoadFailure* failure);
   void CallNanoapp(uint32_t sender, uint16_t type, const void* data);
