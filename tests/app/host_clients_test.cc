@@ -1,6 +1,6 @@
 // Host clients: requests, answers, the map of clients, and broadcasts.
 
-#include <gmock/gmock.h>
+#include <set>
 
 #include "app_manager.h"
 #include "chre/singleton.h"
@@ -12,10 +12,9 @@ namespace {
 
 using ::testing::Contains;
 using ::testing::ElementsAre;
+using ::testing::HasSubstr;
 using ::testing::IsEmpty;
-using ::testing::IsSupersetOf;
 using ::testing::MatchesRegex;
-using ::testing::StartsWith;
 using Bytes = std::vector<uint8_t>;
 
 class HostClients : public LinkedNanoapp {
@@ -23,196 +22,204 @@ class HostClients : public LinkedNanoapp {
   HostClients() {
     for (uint16_t endpoint = 0x10; endpoint < 0x20; ++endpoint) Connect(endpoint);
   }
-
-  // "type@endpoint" of what arrived since the last call.
-  std::vector<std::string> TakeMessages() {
-    std::vector<std::string> list;
-    for (const Received& message : std::exchange(messages, {})) {
-      list.push_back(std::to_string(message.type) + "@" + std::to_string(message.receiver));
-    }
-    return list;
-  }
-
-  // Plays until the network has run, with scores that are detected for outputs 0 and 4.
-  void PlayDetection() {
-    stub_network.scores = [](int) { return Scores{0.75f, 0, 0, 0, 0.625f}; };
-    const int before = stub_network.runs;
-    while (stub_network.runs == before) PlayBuffer();
-  }
 };
 
+// Detected for outputs 0 and 4.
+constexpr Scores kDetected = {0.75f, 0, 0, 0, 0.625f};
+
 TEST_F(HostClients, AQueryIsAnsweredAlwaysTheSame) {
-  Start();
-  const Bytes expected = {0x08, 0x00, 0x08, 0x06, 0x08, 0x11, 0x08, 0x0F, 0x08, 0x12};
   for (const Bytes& payload : {Bytes{}, Bytes{0xFF, 0x00, 0xAB}}) {
-    Send(0x1F, hub::kQueryRequest, payload);
-    ASSERT_EQ(messages.size(), 1u);
-    EXPECT_EQ(messages[0].bytes, expected);
-    EXPECT_THAT(TakeMessages(), ElementsAre("2@31"));
+    Query(0x1F, payload);
+    EXPECT_EQ(messages.back().bytes,
+              (Bytes{0x08, 0x00, 0x08, 0x06, 0x08, 0x11, 0x08, 0x0F, 0x08, 0x12}));
   }
-  EXPECT_FALSE(audio());
-  EXPECT_THAT(TakeLog(), ElementsAre("I Result of sending query response: 1",
-                                     "I Result of sending query response: 1"));
-  for (const uint32_t type : {0u, 2u, 7u}) Send(0x1F, type, {1, 2, 3});
+  EXPECT_THAT(TakeMessages(), ElementsAre("2@31", "2@31"));
+  const std::string result = "I Result of sending query response: 1";
+  EXPECT_THAT(TakeLog(), ElementsAre(result, result));
+  for (const uint32_t type : {0u, 2u, 7u}) hub.SendFromHost(0x1F, type, {1, 2, 3});
   EXPECT_THAT(messages, IsEmpty());
-  EXPECT_THAT(runtime.log, ElementsAre(StartsWith("I Got message"), StartsWith("I Got message"),
-                                       MatchesRegex("I Got message from host with type 7 size 3 "
-                                                    "data @ 0x[0-9a-f]+ hostEndpoint 0x1f")));
+  EXPECT_EQ(log.size(), 3u);
+  EXPECT_THAT(log.back(), MatchesRegex("I Got message from host with type 7 size 3 data @ "
+                                       "0x[0-9a-f]+ hostEndpoint 0x1f"));
 }
 
-TEST_F(HostClients, EnableStartsAndTheLastDisableStops) {
-  Start();
+TEST_F(HostClients, TheMicrophoneIsHeldFromTheFirstClientOfAnyKindToTheLast) {
+  const uint32_t nanoapp = RegisterClientNanoapp();
   Enable(0x10, 5);
-  EXPECT_THAT(TakeLog(),
-              ElementsAre("I Add host end point: 16", "I Start", "I Found suitable audio source",
-                          "I Enabling audio", "I Requested audio from handle 0, status: 1",
-                          "I Result of sending enable response: 1",
-                          "I audio sampling change for handle 0, suspended: 0"));
   Enable(0x11, 6);
-  EXPECT_THAT(TakeMessages(), ElementsAre("4@16", "4@17"));
+  hub.SetAudioSuspended(true);
+  Unregister(nanoapp);
   // From another endpoint than its own: the answer goes where the request came from.
   Disable(0x1F, 5);
-  EXPECT_THAT(TakeMessages(), ElementsAre("6@31"));
   EXPECT_TRUE(audio());
-  TakeLog();
   Disable(0x11, 6);
-  EXPECT_THAT(TakeLog(),
-              ElementsAre("I is_audio_enabled_ = 1; HostCount = 0; hasInternalClient = 0", "I Stop",
-                          "I Disabling audio", "I Result of sending disable respones: 1"));
-  EXPECT_THAT(TakeMessages(), ElementsAre("6@17"));
   EXPECT_FALSE(audio());
+  EXPECT_EQ(hub.sources()[0].buffer_ns + hub.sources()[0].interval_ns, 0u);
   Disable(0x11, 6);
-  EXPECT_THAT(TakeLog(), ElementsAre("W Unregistered client ID for disable request: 6"));
+  EXPECT_THAT(TakeMessages(), ElementsAre("4@16", "4@17", "6@31", "6@17"));
+  EXPECT_THAT(
+      TakeLog(),
+      ElementsAre("I SoundService: registerClient 257", "I Start", "I Found suitable audio source",
+                  "I Enabling audio", "I Requested audio from handle 0, status: 1",
+                  "I audio sampling change for handle 0, suspended: 0", "I Add host end point: 16",
+                  "I Result of sending enable response: 1", "I Add host end point: 17",
+                  "I Result of sending enable response: 1",
+                  "I audio sampling change for handle 0, suspended: 1",
+                  "I SoundService: unregisterClient 257",
+                  "I is_audio_enabled_ = 1; HostCount = 2; hasInternalClient = 0",
+                  "I is_audio_enabled_ = 1; HostCount = 1; hasInternalClient = 0",
+                  "I Result of sending disable respones: 1",
+                  "I is_audio_enabled_ = 1; HostCount = 0; hasInternalClient = 0", "I Stop",
+                  "I Disabling audio", "I Result of sending disable respones: 1",
+                  "W Unregistered client ID for disable request: 6"));
 }
 
-TEST_F(HostClients, AClientNanoappKeepsTheAudioOfTheLastHostClient) {
-  Start();
+TEST_F(HostClients, AClientNanoappKeepsTheAudioUntilItLeaves) {
   Enable(0x10, 1);
-  const uint32_t client = RegisterClientNanoapp();
+  const uint32_t first = RegisterClientNanoapp();
+  const uint32_t second = RegisterClientNanoapp();
   Disable(0x10, 1);
+  Unregister(first);
+  EXPECT_EQ(TakeLog().back(), "I is_audio_enabled_ = 1; HostCount = 0; hasInternalClient = 1");
+  // One that is stopped is forgotten, but the audio goes on.
+  hub.StopClientNanoapp(second);
+  EXPECT_EQ(TakeLog().back(), "I SoundService: unregisterClient 258");
   EXPECT_TRUE(audio());
-  Enable(0x10, 1);
-  hub().SendFromClientNanoapp(client, hub::kUnregisterEvent);
-  EXPECT_TRUE(audio());
+  Unregister(second);
+  EXPECT_FALSE(audio());
+  EXPECT_THAT(TakeLog(), Contains("E SoundService: not registered"));
 }
 
-TEST_F(HostClients, TheMapRefusesWhatWouldNotBeUnique) {
-  Start();
-  Enable(0x11, 3);
-  TakeLog();
-  Enable(0x10, 3);
-  EXPECT_THAT(TakeLog(),
-              ElementsAre("I Duplicate enable request received from client ID: 3",
-                          "I Add host end point: 16", "I Result of sending enable response: 1"));
-  EXPECT_THAT(TakeMessages(), ElementsAre("4@17", "4@16"));
-  Enable(0x10, 4);
-  EXPECT_THAT(TakeLog(),
-              ElementsAre("I Add host end point: 16", "W Host endpoint 16 is already used.",
-                          "W Unable to serve new host endpoint 16"));
-  Enable(0xFFFF, 3);
-  EXPECT_THAT(TakeLog(),
-              ElementsAre("I Duplicate enable request received from client ID: 3",
-                          "I Add host end point: 65535", "W Invalid host endpoint: 65535",
-                          "W Unable to serve new host endpoint 65535"));
-  EXPECT_THAT(TakeMessages(), IsEmpty());
-  // The old pairing of client 3 stays removed: its endpoint is free.
-  Enable(0x10, 4);
-  EXPECT_THAT(TakeMessages(), ElementsAre("4@16"));
-}
-
-TEST_F(HostClients, ANinthClientIsRefusedAndTheEightAreServedInOrder) {
-  Start();
+TEST_F(HostClients, TheMapServesEightAndRefusesWhatWouldNotBeUnique) {
   for (uint16_t i = 0; i < 8; ++i) Enable(static_cast<uint16_t>(0x10 + i), 100u + i);
   TakeLog();
   Enable(0x18, 108);
+  Enable(0x11, 100);
+  Enable(0xFFFF, 102);
   EXPECT_THAT(TakeLog(),
               ElementsAre("I Add host end point: 24", "W Client id and host endpoint map is full!",
-                          "W Unable to serve new host endpoint 24"));
-  Enable(0x1A, 100);  // moves to the end, to a new endpoint
-  TakeMessages();
-  PlayDetection();
-  EXPECT_THAT(TakeMessages(),
-              ElementsAre("7@17", "7@18", "7@19", "7@20", "7@21", "7@22", "7@23", "7@26"));
-}
-
-TEST_F(HostClients, ADetectionReachesEveryHostAndNoNanoapp) {
-  Start();
-  for (uint16_t i = 0; i < 3; ++i) Enable(static_cast<uint16_t>(0x10 + i), i);
+                          "W Unable to serve new host endpoint 24",
+                          "I Duplicate enable request received from client ID: 100",
+                          "I Add host end point: 17", "W Host endpoint 17 is already used.",
+                          "W Unable to serve new host endpoint 17",
+                          "I Duplicate enable request received from client ID: 102",
+                          "I Add host end point: 65535", "W Invalid host endpoint: 65535",
+                          "W Unable to serve new host endpoint 65535"));
+  // The old pairing of client 100 stays removed: its endpoint is free.
+  Enable(0x10, 109);
+  Enable(0x1A, 101);  // moves to the end, to a new endpoint
+  Enable(0x1B, 110);
+  Enable(0x1C, 111);  // one too many
+  EXPECT_EQ(TakeLog().back(), "W Unable to serve new host endpoint 28");
+  hub.DisconnectHostEndpoint(0x13);
   RegisterClientNanoapp();
-  hub().DisconnectHostEndpoint(0x11);
   TakeMessages();
-  PlayDetection();
-  ASSERT_EQ(messages.size(), 2u);
-  EXPECT_EQ(messages[0].bytes, messages[1].bytes);
-  const auto report = hub::DecodeSoundReport(messages[0].bytes.data(), messages[0].bytes.size());
+  PlayRun(kDetected);
+  ASSERT_EQ(messages.size(), 7u);
+  const Bytes bytes = messages[0].bytes;
+  for (const Received& message : messages) EXPECT_EQ(message.bytes, bytes);
+  EXPECT_THAT(TakeMessages(), ElementsAre("7@20", "7@21", "7@22", "7@23", "7@16", "7@26", "7@27"));
+  const auto report = hub::DecodeSoundReport(bytes.data(), bytes.size());
   ASSERT_TRUE(report.has_value());
   EXPECT_EQ(report->model_version, 202208271u);
-  EXPECT_EQ(report->timestamp_ns, hub().TimeNs() + 500);
+  EXPECT_EQ(report->timestamp_ns, hub.TimeNs() + 500);
   ASSERT_EQ(report->results.size(), 2u);
   EXPECT_EQ(report->results[1].category, 18u);
   EXPECT_EQ(report->results[1].confidence, 0.625f);
+  // A client nanoapp hears of no detection.
   for (const Received& event : events) EXPECT_EQ(event.type, hub::kReportEvent);
 }
 
 TEST_F(HostClients, RawAudioReachesEveryHost) {
-  Start();
   Enable(0x10, 1);
   Enable(0x11, 2);
-  TakeMessages();
   const uint8_t audio_bytes[] = {0xAA, 0xBB, 0xCC};
   tarn::contexthub::sound::RawAudioInfo info{3, audio_bytes};
   auto* manager = chre::Singleton<tarn::contexthub::sound::AppManager>::get();
   manager->OnRawAudioTransmissibleSegment(1, 2, &info);
-  hub().DeliverToNanoapp(0, CHRE_EVENT_NANOAPP_STARTED, nullptr);
-  ASSERT_EQ(messages.size(), 2u);
-  EXPECT_EQ(messages[1].type, hub::kRawAudioSegment);
-  EXPECT_EQ(messages[1].bytes, (Bytes{0x08, 1, 0x10, 2, 0x1A, 3, 0xAA, 0xBB, 0xCC}));
+  hub.DeliverToNanoapp(0, CHRE_EVENT_NANOAPP_STARTED, nullptr);
+  EXPECT_EQ(messages.back().bytes, (Bytes{0x08, 1, 0x10, 2, 0x1A, 3, 0xAA, 0xBB, 0xCC}));
+  EXPECT_THAT(TakeMessages(), ElementsAre("4@16", "4@17", "8@16", "8@17"));
   TakeLog();
-  hub().fault_plan().refuse_host_messages = true;
-  manager->OnRawAudioTransmissibleSegment(1, 2, &info);
-  const std::string failed = "E Failed to send RAW_AUDIO_SEGMENT message to host client.";
-  EXPECT_THAT(TakeLog(), ElementsAre(failed, failed));
-}
 
-TEST_F(HostClients, FailedSendsAreLoggedAndNothingElseChanges) {
-  Start();
-  Enable(0x10, 1);
-  Enable(0x11, 2);
-  hub().fault_plan().refuse_host_messages = true;
-  TakeLog();
-  Send(0x12, hub::kQueryRequest, {});
+  // Every way to send fails, is logged, and changes nothing else.
+  hub.fault_plan().refuse_host_messages = true;
+  manager->OnRawAudioTransmissibleSegment(1, 2, &info);
+  Query(0x12);
   Enable(0x12, 3);
   Disable(0x12, 3);
-  EXPECT_THAT(TakeLog(), IsSupersetOf({"I Result of sending query response: 0",
-                                       "I Result of sending enable response: 0",
-                                       "I Result of sending disable respones: 0"}));
-  PlayDetection();
+  PlayRun(kDetected);
+  const std::string raw_failed = "E Failed to send RAW_AUDIO_SEGMENT message to host client.";
   const std::string failed = "E Failed to send SOUND_EVENT_DETECTION message to host.";
-  EXPECT_THAT(TakeLog(), ElementsAre(failed, failed));
+  EXPECT_THAT(TakeLog(),
+              ElementsAre(raw_failed, raw_failed, "I Result of sending query response: 0",
+                          "I Add host end point: 18", "I Result of sending enable response: 0",
+                          "I is_audio_enabled_ = 1; HostCount = 2; hasInternalClient = 0",
+                          "I Result of sending disable respones: 0", failed, failed));
 }
 
 TEST_F(HostClients, HostilePayloadsEndInALogLine) {
-  Start();
   Random random(20220827);
-  int refused = 0;
   for (int i = 0; i < 20000; ++i) {
     const Bytes payload = random.Fill<uint8_t>(static_cast<size_t>(random.Between(0, 40)), 0, 255);
     const auto type = static_cast<uint32_t>(random.Between(0, 9));
-    Send(static_cast<uint16_t>(random.Between(0x10, 0x1F)), type, payload);
-    for (const std::string& line : TakeLog())
-      refused += line.find("Unable to decode") != std::string::npos;
+    hub.SendFromHost(static_cast<uint16_t>(random.Between(0x10, 0x1F)), type, payload);
   }
-  EXPECT_GT(refused, 1000);
+  const std::vector<std::string> lines = TakeLog();
+  EXPECT_THAT(lines, Contains(HasSubstr("Unable to decode message SoundDetectionEnableRequest,")));
+  EXPECT_THAT(lines, Contains(HasSubstr("Unable to decode message, ")));
   const Bytes oversized(100'000, 0x08);
-  Send(0x10, hub::kEnableRequest, oversized);
-  Send(0x10, hub::kDisableRequest, oversized);
+  hub.SendFromHost(0x10, hub::kEnableRequest, oversized);
+  hub.SendFromHost(0x10, hub::kDisableRequest, oversized);
   for (uint32_t id = 0; id < 256; ++id) Disable(0x10, id);
   EXPECT_FALSE(audio());
   TakeMessages();
   Enable(0x10, 1);
-  EXPECT_THAT(TakeMessages(), ElementsAre("4@16"));
-  PlayDetection();
-  EXPECT_THAT(TakeMessages(), Contains("7@16"));
+  PlayRun(kDetected);
+  EXPECT_THAT(TakeMessages(), ElementsAre("4@16", "7@16"));
+}
+
+// Nothing leaks, nothing is freed twice, the log says which work was dropped, and the next good
+// request works.
+TEST_F(HostClients, EveryRefusedAllocationDropsItsWorkAlone) {
+  std::set<std::string> errors;
+  uint64_t refusals = 0;
+  for (bool refused = true; refused; ++refusals) {
+    ASSERT_LT(refusals, 100u);
+    Start();
+    hub.heap().RefuseNth(refusals + 1);
+    Query(0x10);
+    Enable(0x10, 1);
+    Enable(0x11, 2);
+    uint32_t clients[3];
+    for (uint32_t& client : clients) client = RegisterClientNanoapp();
+    PlayRun(kDetected);
+    for (const uint32_t client : clients) Unregister(client);
+    Disable(0x10, 1);
+    Disable(0x11, 2);
+    refused = hub.heap().refused();
+    hub.heap().RefuseNth(0);
+    size_t lines = 0;
+    for (const std::string& line : TakeLog()) {
+      if (line[0] != 'E' || line.find("not registered") != std::string::npos) continue;
+      errors.insert(line.substr(0, line.find('#')));
+      ++lines;
+    }
+    EXPECT_EQ(lines > 0, refused) << "refusal " << refusals;
+    messages.clear();
+    Query(0x10);
+    EXPECT_EQ(messages.size(), 1u);
+    hub.End();
+    EXPECT_EQ(hub.heap().live_blocks(), 0u) << "refusal " << refusals;
+  }
+  EXPECT_THAT(
+      errors,
+      testing::IsSupersetOf(
+          {"E OOM at app_manager.cc:174", "E SoundService: failed to register",
+           "E OOM at sound_detection_proto_helper.cc:155",
+           "E Failed to encode detection response message.", "E Unable to encode response message",
+           "E Failed to send SOUND_EVENT_DETECTION message to host.",
+           "E Failed to allocate output buffer of size 39h for publishing eventto client "}));
 }
 
 }  // namespace

@@ -1,10 +1,9 @@
 #include "hub.h"
 
 #include <gmock/gmock.h>
-#include <gtest/gtest.h>
 
 #include "messages.h"
-#include "test_hub.h"
+#include "nanoapp_record.h"
 
 namespace qz::hub {
 namespace {
@@ -21,11 +20,7 @@ TEST(Heap, RemembersMisuseAndRefusesExactlyTheOrderedAllocation) {
   EXPECT_TRUE(heap.refused());
   void* block = heap.Allocate(20);
   EXPECT_EQ(heap.SizeOf(block), 20u);
-  heap.Free(block);
-  heap.Free(nullptr);
-  EXPECT_THAT(heap.faults(), IsEmpty());
-  heap.Free(block);
-  heap.Free(&heap);
+  for (void* each : std::vector<void*>{block, nullptr, block, &heap}) heap.Free(each);
   EXPECT_THAT(heap.faults(),
               ElementsAre(HasSubstr("which was freed before"), HasSubstr("which is no block")));
   EXPECT_EQ(heap.live_blocks(), 1u);
@@ -33,25 +28,11 @@ TEST(Heap, RemembersMisuseAndRefusesExactlyTheOrderedAllocation) {
   EXPECT_EQ(heap.live_blocks(), 0u);
 }
 
-chreNslNanoappInfo GoodInfo() {
-  chreNslNanoappInfo info = {};
-  info.magic = CHRE_NSL_NANOAPP_INFO_MAGIC;
-  info.structMinorVersion = CHRE_NSL_NANOAPP_INFO_STRUCT_MINOR_VERSION;
-  info.targetApiVersion = CHRE_API_VERSION_1_9;
-  info.vendor = "vendor";
-  info.name = "name";
-  info.start = [] { return true; };
-  info.handleEvent = [](uint32_t, uint16_t, const void*) {};
-  info.end = [] {};
-  info.appPermissions = CHRE_PERMS_AUDIO;
-  return info;
-}
+constexpr chreNslNanoappInfo kGoodRecord =
+    test::NanoappRecord([] { return true; }, [](uint32_t, uint16_t, const void*) {}, [] {});
 
 TEST(NanoappInfo, EveryWrongFieldIsNamed) {
-  const struct {
-    void (*spoil)(chreNslNanoappInfo& info);
-    const char* sentence;
-  } cases[] = {
+  const std::pair<void (*)(chreNslNanoappInfo & info), const char*> cases[] = {
       {[](auto& info) { info.magic = 1; }, "magic is 0x00000001, should be 0x50e69977"},
       {[](auto& info) { info.targetApiVersion = 0x01100000; }, "API version is 0x01100000"},
       {[](auto& info) { info.targetApiVersion = 0x00090000; }, "API version is 0x00090000"},
@@ -59,27 +40,25 @@ TEST(NanoappInfo, EveryWrongFieldIsNamed) {
       {[](auto& info) { info.handleEvent = nullptr; }, "event entry point is null"},
       {[](auto& info) { info.end = nullptr; }, "end entry point is null"},
       {[](auto& info) { info.name = nullptr; }, "name is null"},
+      {[](auto& info) { info.vendor = nullptr; }, "name is null"},
       {[](auto& info) { info.structMinorVersion = 2; }, "record version 2"},
       {[](auto& info) { info.appPermissions = 0; }, "permissions are 0x00000000"},
       {[](auto& info) { info.appPermissions = 3; }, "permissions are 0x00000003"},
       {[](auto& info) { info.start = [] { return false; }; }, "start entry point failed"},
   };
-  for (const auto& wrong : cases) {
+  for (const auto& [spoil, sentence] : cases) {
     Hub hub;
-    chreNslNanoappInfo info = GoodInfo();
-    wrong.spoil(info);
+    chreNslNanoappInfo info = kGoodRecord;
+    spoil(info);
     LoadFailure failure;
     EXPECT_FALSE(hub.StartLinked(info, &failure));
     EXPECT_EQ(failure.kind, LoadFailure::Kind::kRefused);
-    EXPECT_THAT(failure.sentence, HasSubstr(wrong.sentence));
+    EXPECT_THAT(failure.sentence, HasSubstr(sentence));
   }
-  chreNslNanoappInfo older = GoodInfo();
-  older.targetApiVersion = 0x01080000;
-  EXPECT_EQ(CheckNanoappInfo(older), "");
 }
 
-// A nanoapp that leaks a block at its end and answers every event with two events and two messages,
-// one each to nobody.
+// A nanoapp that leaks a block at its end and answers every event, and the end, with two events and
+// two messages, one each to nobody.
 int freed = 0;
 void SendThings(uint32_t sender, uint16_t, const void*) {
   for (const uint32_t target : {sender, uint32_t{0xBAD}}) {
@@ -98,28 +77,24 @@ TEST(Hub, DeliversInOrderFreesEverythingOnceAndFindsTheLeak) {
     freed = 0;
     hub.fault_plan() = {refuse, refuse};
     std::vector<std::string> delivered;
-    hub.ConnectHostEndpoint(1, [&](uint32_t type, const uint8_t*, size_t size) {
-      delivered.push_back("message " + std::to_string(type) + " size " + std::to_string(size) +
-                          " freed " + std::to_string(freed));
-    });
-    const uint32_t client = hub.AddClientNanoapp([&](uint16_t type, const void*, size_t size) {
-      delivered.push_back("event " + std::to_string(type) + " size " + std::to_string(size) +
-                          " freed " + std::to_string(freed));
-    });
-    chreNslNanoappInfo info = GoodInfo();
+    const auto record = [&](uint32_t type, const void*, size_t size) {
+      delivered.push_back(std::to_string(type) + " size " + std::to_string(size) + " freed " +
+                          std::to_string(freed));
+    };
+    hub.ConnectHostEndpoint(1, record);
+    const uint32_t client = hub.AddClientNanoapp(record);
+    chreNslNanoappInfo info = kGoodRecord;
+    info.targetApiVersion = 0x01080000;  // an older one is fine
     info.handleEvent = SendThings;
-    info.end = [] { chreHeapAlloc(1); };
+    info.end = [] { chreHeapAlloc(1), SendThings(0xBAD, 0, nullptr); };
     LoadFailure failure;
     ASSERT_TRUE(hub.StartLinked(info, &failure));
     hub.SendFromClientNanoapp(client, 5);
     EXPECT_EQ(freed, 4);
-    EXPECT_EQ(hub.heap().live_blocks(), 0u);
     EXPECT_EQ(hub.counts().undeliverable, refuse ? 0u : 2u);
-    if (refuse) {
-      EXPECT_THAT(delivered, IsEmpty());
-    } else {
-      EXPECT_THAT(delivered, ElementsAre("event 7 size 4 freed 0", "message 9 size 8 freed 2"));
-    }
+    EXPECT_EQ(delivered, refuse
+                             ? std::vector<std::string>()
+                             : (std::vector<std::string>{"7 size 4 freed 0", "9 size 8 freed 2"}));
     EXPECT_THAT(hub.Faults(), IsEmpty());
     hub.End();
     EXPECT_THAT(hub.Faults(), ElementsAre(HasSubstr("1 heap blocks still held")));
@@ -127,13 +102,13 @@ TEST(Hub, DeliversInOrderFreesEverythingOnceAndFindsTheLeak) {
 }
 
 TEST(Messages, DamagedFramesAreNoReports) {
-  const std::vector<uint8_t> good = {4, 0, 0, 0, 0x08, 0x05, 0x20, 0x07};
-  EXPECT_TRUE(DecodeFramedSoundReport(good.data(), good.size()).has_value());
-  for (size_t size = 0; size < good.size(); ++size) {
-    EXPECT_FALSE(DecodeFramedSoundReport(good.data(), size).has_value()) << size;
+  // A whole frame and one byte more.
+  const uint8_t good[] = {4, 0, 0, 0, 0x08, 0x05, 0x20, 0x07, 0x08};
+  for (size_t size = 0; size <= sizeof(good); ++size) {
+    EXPECT_EQ(DecodeFramedSoundReport(good, size).has_value(), size == 8) << size;
   }
-  const std::vector<uint8_t> broken = {2, 0, 0, 0, 0x08, 0xFF};
-  EXPECT_FALSE(DecodeFramedSoundReport(broken.data(), broken.size()).has_value());
+  const uint8_t broken[] = {2, 0, 0, 0, 0x08, 0xFF};
+  EXPECT_FALSE(DecodeFramedSoundReport(broken, sizeof(broken)).has_value());
 }
 
 }  // namespace

@@ -1,9 +1,3 @@
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <string>
-#include <vector>
-
 #include "messages.h"
 #include "sound_detection_proto_helper.h"
 #include "test_hub.h"
@@ -17,31 +11,26 @@ using Bytes = std::vector<uint8_t>;
 
 class Codec : public testing::Test {
  protected:
-  // Empty when there is no buffer.
-  Bytes EncodeReport(const std::vector<ConfidenceEvent>& list, uint32_t model_version,
-                     bool prefix) {
+  // Encoders; empty when there is no buffer.
+  Bytes EncodeReport(bool prefix) {
     ConfidenceEvents events;
-    for (const ConfidenceEvent& event : list) events.push_back(event);
-    const ChreBuffer buffer = EncodeDetectionResponseMessage(
-        GetDetectionEventResponse(&events, model_version, 1'000'000'000), prefix, &size_);
-    return buffer ? Bytes(buffer.get(), buffer.get() + size_) : Bytes();
+    events.push_back({6, 0.25f});
+    events.push_back({15, 0.5f});
+    return Contents(EncodeDetectionResponseMessage(
+        GetDetectionEventResponse(&events, 202208270, 1'000'000'000), prefix, &size_));
   }
   Bytes EncodeRaw(const Bytes& audio) {
     RawAudioInfo info{static_cast<uint16_t>(audio.size()), audio.data()};
-    const ChreBuffer buffer = EncodeRawAudioSegment(GetRawAudioSegment(1, 2, &info), &size_);
+    return Contents(EncodeRawAudioSegment(GetRawAudioSegment(1, 2, &info), &size_));
+  }
+  Bytes Contents(const ChreBuffer& buffer) const {
     return buffer ? Bytes(buffer.get(), buffer.get() + size_) : Bytes();
   }
   // The client ID of a request, or -1.
-  int DecodeEnable(const Bytes& bytes) {
-    sound_detection_SoundDetectionEnableRequest request = {};
-    const auto size = static_cast<uint32_t>(bytes.size());
-    const bool fine = DecodeSoundDetectionEnableRequestMessage(bytes.data(), size, &request);
-    return fine ? request.client_id : -1;
-  }
-  int DecodeDisable(const Bytes& bytes) {
-    sound_detection_SoundDetectionDisableRequest request = {};
-    const auto size = static_cast<uint32_t>(bytes.size());
-    const bool fine = DecodeSoundDetectionDisableRequestMessage(bytes.data(), size, &request);
+  template <typename Request>
+  static int ClientId(bool (*decode)(const uint8_t*, uint32_t, Request*), const Bytes& bytes) {
+    Request request = {};
+    const bool fine = decode(bytes.data(), static_cast<uint32_t>(bytes.size()), &request);
     return fine ? request.client_id : -1;
   }
 
@@ -55,73 +44,48 @@ TEST_F(Codec, AReportHasTheKnownBytes) {
                           0x12, 0x07, 0x08, 0x06, 0x15, 0x00, 0x00, 0x80, 0x3E, 0x12,
                           0x07, 0x08, 0x0F, 0x15, 0x00, 0x00, 0x00, 0x3F, 0x18, 0x80,
                           0xA8, 0xD6, 0xB9, 0x07, 0x20, 0x8E, 0xE8, 0xB5, 0x60};
-  EXPECT_EQ(EncodeReport({{6, 0.25f}, {15, 0.5f}}, 202208270, true), expected);
-  EXPECT_EQ(EncodeReport({{6, 0.25f}, {15, 0.5f}}, 202208270, false),
-            Bytes(expected.begin() + 4, expected.end()));
-  EXPECT_EQ(runtime_.hub.heap().live_blocks(), 0u);
-}
-
-TEST_F(Codec, ReportsOfEverySizeReachTheOtherImplementation) {
-  std::vector<ConfidenceEvent> list;
-  for (size_t count = 0; count <= kSoundCategoryCount; ++count) {
-    const Bytes bytes = EncodeReport(list, 202208271, true);
-    const auto report = qz::hub::DecodeFramedSoundReport(bytes.data(), bytes.size());
-    ASSERT_TRUE(report.has_value()) << count;
-    EXPECT_EQ(report->model_version, 202208271u);
-    ASSERT_EQ(report->results.size(), count);
-    for (size_t i = 0; i < count; ++i) {
-      EXPECT_EQ(report->results[i].category, list[i].category);
-      EXPECT_EQ(report->results[i].confidence, list[i].confidence);
-    }
-    // Zero values stay present, and a category uses its eight bits.
-    list.push_back({static_cast<uint8_t>(count == 0 ? 0 : 250 + count), 0.125f * count});
-  }
+  EXPECT_EQ(EncodeReport(/*prefix=*/true), expected);
+  EXPECT_EQ(EncodeReport(/*prefix=*/false), Bytes(expected.begin() + 4, expected.end()));
 }
 
 TEST_F(Codec, ARawAudioSegmentHasTheKnownBytes) {
   EXPECT_EQ(EncodeRaw({0xAA, 0xBB, 0xCC}), (Bytes{0x08, 1, 0x10, 2, 0x1A, 3, 0xAA, 0xBB, 0xCC}));
-  EXPECT_EQ(EncodeRaw({}), (Bytes{0x08, 1, 0x10, 2, 0x1A, 0}));
   EXPECT_EQ(EncodeRaw(Bytes(65535, 0x5A)).size(), 4u + 4u + 65535u);
 }
 
-TEST_F(Codec, TheQueryResponseHasTheKnownBytesAndNeedsThemAll) {
-  Bytes buffer(16, 0xEE);
-  size_ = 9;
-  EXPECT_FALSE(EncodeQueryResponseMessage(buffer.data(), size_));
-  EXPECT_EQ(size_, 9u);
-  EXPECT_FALSE(EncodeQueryResponseMessage(nullptr, size_));
-  EXPECT_THAT(runtime_.TakeLog(), ElementsAre("E Failed to encode query response message.",
-                                              "E OOM at sound_detection_proto_helper.cc:175"));
-  size_ = 10;
-  ASSERT_TRUE(EncodeQueryResponseMessage(buffer.data(), size_));
-  buffer.resize(size_);
-  EXPECT_EQ(buffer, (Bytes{0x08, 0x00, 0x08, 0x06, 0x08, 0x11, 0x08, 0x0F, 0x08, 0x12}));
-}
-
-TEST_F(Codec, ARefusedBufferIsLoggedWithItsSite) {
+TEST_F(Codec, AMissingOrSmallBufferIsLogged) {
   runtime_.hub.heap().RefuseNth(1);
-  EXPECT_THAT(EncodeReport({{6, 0.25f}}, 1, true), IsEmpty());
-  EXPECT_EQ(size_, 4u + 6u + 9u + 2u + 2u);
+  EXPECT_THAT(EncodeReport(/*prefix=*/true), IsEmpty());
+  EXPECT_EQ(size_, 4u + 6u + 9u + 9u + 5u + 2u);
   runtime_.hub.heap().RefuseNth(1);
   EXPECT_THAT(EncodeRaw({}), IsEmpty());
+  uint8_t small[9];
+  size_ = sizeof(small);
+  EXPECT_FALSE(EncodeQueryResponseMessage(nullptr, size_));
+  EXPECT_FALSE(EncodeQueryResponseMessage(small, size_));
+  EXPECT_EQ(size_, 9u);
   EXPECT_THAT(runtime_.TakeLog(), ElementsAre("E OOM at sound_detection_proto_helper.cc:155",
-                                              "E OOM at sound_detection_proto_helper.cc:124"));
+                                              "E OOM at sound_detection_proto_helper.cc:124",
+                                              "E OOM at sound_detection_proto_helper.cc:175",
+                                              "E Failed to encode query response message."));
 }
 
 TEST_F(Codec, RequestsOfTheOtherImplementationAreRead) {
-  for (const uint32_t id : {0u, 127u, 128u, 255u}) {
-    EXPECT_EQ(DecodeEnable(qz::hub::EncodeEnableRequest(id, {6, 300, 15})), static_cast<int>(id));
-    EXPECT_EQ(DecodeDisable(qz::hub::EncodeDisableRequest(id)), static_cast<int>(id));
+  const auto enable = DecodeSoundDetectionEnableRequestMessage;
+  const auto disable = DecodeSoundDetectionDisableRequestMessage;
+  for (const int id : {0, 127, 128, 255}) {
+    const auto number = static_cast<uint32_t>(id);
+    EXPECT_EQ(ClientId(enable, qz::hub::EncodeEnableRequest(number, {6, 300, 15})), id);
+    EXPECT_EQ(ClientId(disable, qz::hub::EncodeDisableRequest(number)), id);
   }
-  EXPECT_EQ(DecodeEnable({}), 0);
-  EXPECT_EQ(DecodeDisable({}), 0);
+  EXPECT_EQ(ClientId(enable, {}) + ClientId(disable, {}), 0);
   // An unknown field, before and behind the known one.
-  EXPECT_EQ(DecodeEnable({0x1A, 0x02, 0xFF, 0xFF, 0x10, 0x07, 0x20, 0x01}), 7);
+  EXPECT_EQ(ClientId(enable, {0x1A, 0x02, 0xFF, 0xFF, 0x10, 0x07, 0x20, 0x01}), 7);
   EXPECT_THAT(runtime_.log, IsEmpty());
 
-  EXPECT_EQ(DecodeEnable(qz::hub::EncodeEnableRequest(256)), -1);
-  EXPECT_EQ(DecodeEnable({0x10, 0x80}), -1);
-  EXPECT_EQ(DecodeDisable(qz::hub::EncodeDisableRequest(256)), -1);
+  EXPECT_EQ(ClientId(enable, qz::hub::EncodeEnableRequest(256)), -1);
+  EXPECT_EQ(ClientId(enable, {0x10, 0x80}), -1);
+  EXPECT_EQ(ClientId(disable, qz::hub::EncodeDisableRequest(256)), -1);
   EXPECT_THAT(
       runtime_.TakeLog(),
       ElementsAre("E Unable to decode message SoundDetectionEnableRequest, error integer too large",

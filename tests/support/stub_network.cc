@@ -4,30 +4,20 @@
 
 #include "mobilenet_backend.h"
 
-namespace qz::test {
 namespace {
 
-constexpr size_t kWindowBytes = 382 * 48;
-
-int8_t input[kWindowBytes];
+int8_t input[382 * 48];
 float output[5];
 
 }  // namespace
 
-StubNetwork stub_network;
-
-}  // namespace qz::test
-
-int8_t* const mobilenet_backend_input_ptr = qz::test::input;
-const float* const mobilenet_backend_output_ptr = qz::test::output;
+int8_t* const mobilenet_backend_input_ptr = input;
+const float* const mobilenet_backend_output_ptr = output;
 
 void mobilenet_backend_invoke() {
-  using qz::test::stub_network;
-  if (stub_network.keep_windows) {
-    stub_network.windows.emplace_back(std::begin(qz::test::input), std::end(qz::test::input));
-  }
-  const qz::test::Scores scores =
-      stub_network.scores ? stub_network.scores(stub_network.runs) : qz::test::Scores{};
-  ++stub_network.runs;
-  std::copy(scores.begin(), scores.end(), qz::test::output);
+  auto& network = qz::test::stub_network;
+  network.windows.emplace_back(std::begin(input), std::end(input));
+  const auto scores = network.scores ? network.scores(network.runs) : qz::test::Scores{};
+  ++network.runs;
+  std::copy(scores.begin(), scores.end(), output);
 }

@@ -16,10 +16,9 @@ struct StubNetwork {
   // Scores of run `run`, counted from 0 over all runs so far; zeros when unset.
   std::function<Scores(int run)> scores;
   int runs = 0;
-  bool keep_windows = false;
   std::vector<Window> windows;
 };
 
-extern StubNetwork stub_network;
+inline StubNetwork stub_network;
 
 }  // namespace qz::test

@@ -1,15 +1,24 @@
-// A hub that a suite looks into: its log, and the faults that must not be there at the end.
+// A hub that a suite looks into: its log, what its clients receive, and the faults that must not be
+// there at the end.
 #pragma once
 
-#include <gtest/gtest.h>
+#include <gmock/gmock.h>
 
+#include <memory>
 #include <string>
 #include <utility>
 #include <vector>
 
 #include "hub.h"
+#include "messages.h"
 
 namespace qz::test {
+
+struct Received {
+  uint32_t receiver;
+  uint32_t type;
+  std::vector<uint8_t> bytes;
+};
 
 // Lines stand in `log` as "E text", "W text" or "I text", without the nanoapp's prefix.
 class TestHub {
@@ -25,8 +34,6 @@ class TestHub {
     hub.End();
     for (const std::string& fault : hub.Faults()) ADD_FAILURE() << fault;
   }
-  TestHub(const TestHub&) = delete;
-  TestHub& operator=(const TestHub&) = delete;
 
   // The lines since the last call, less the one that announces each message of the host.
   std::vector<std::string> TakeLog() {
@@ -37,8 +44,50 @@ class TestHub {
     return lines;
   }
 
-  hub::Hub hub;
+  // "type@endpoint" of what host endpoints received since the last call.
+  std::vector<std::string> TakeMessages() {
+    std::vector<std::string> list;
+    for (const Received& message : std::exchange(messages, {})) {
+      list.push_back(std::to_string(message.type) + "@" + std::to_string(message.receiver));
+    }
+    return list;
+  }
+
+  // Host clients.
+  void Connect(uint16_t endpoint) {
+    hub.ConnectHostEndpoint(endpoint, [=](uint32_t type, const uint8_t* bytes, size_t size) {
+      messages.push_back({endpoint, type, {bytes, bytes + size}});
+    });
+  }
+  void Query(uint16_t endpoint, const std::vector<uint8_t>& payload = {}) {
+    hub.SendFromHost(endpoint, hub::kQueryRequest, payload);
+  }
+  void Enable(uint16_t endpoint, uint32_t client_id) {
+    hub.SendFromHost(endpoint, hub::kEnableRequest, hub::EncodeEnableRequest(client_id));
+  }
+  void Disable(uint16_t endpoint, uint32_t client_id) {
+    hub.SendFromHost(endpoint, hub::kDisableRequest, hub::EncodeDisableRequest(client_id));
+  }
+
+  // Client nanoapps.
+  uint32_t RegisterClientNanoapp() {
+    const auto id = std::make_shared<uint32_t>();
+    *id = hub.AddClientNanoapp([=](uint16_t type, const void* data, size_t size) {
+      const auto* bytes = static_cast<const uint8_t*>(data);
+      events.push_back({*id, type, {bytes, bytes + size}});
+    });
+    Register(*id);
+    return *id;
+  }
+  void Register(uint32_t client) { hub.SendFromClientNanoapp(client, hub::kRegisterEvent); }
+  void Unregister(uint32_t client) { hub.SendFromClientNanoapp(client, hub::kUnregisterEvent); }
+
+  // What host endpoints and client nanoapps received, in order; before the hub, which sends to its
+  // end.
+  std::vector<Received> messages;
+  std::vector<Received> events;
   std::vector<std::string> log;
+  hub::Hub hub;
 };
 
 }  // namespace qz::test

@@ -2,7 +2,7 @@
 // its start, frees a block twice, and answers a client's registration with a broken report.
 
 #include "chre.h"
-#include "chre_nanoapp_info.h"
+#include "nanoapp_record.h"
 
 namespace {
 
@@ -22,24 +22,8 @@ void HandleEvent(uint32_t sender, uint16_t type, const void*) {
   if (type == kRegister) chreSendEvent(kReport, broken_report, nullptr, sender);
 }
 
-void End() {}
-
 }  // namespace
 
-extern "C" __attribute__((visibility("default")))
-const chreNslNanoappInfo _chreNslDsoNanoappInfo = {FAULTY_MAGIC,
-                                                   CHRE_NSL_NANOAPP_INFO_STRUCT_MINOR_VERSION,
-                                                   0,
-                                                   0,
-                                                   0,
-                                                   0,
-                                                   CHRE_API_VERSION_1_9,
-                                                   "tests",
-                                                   "faulty",
-                                                   1,
-                                                   1,
-                                                   Start,
-                                                   HandleEvent,
-                                                   End,
-                                                   "faulty",
-                                                   CHRE_PERMS_AUDIO};
+extern "C" __attribute__((visibility("default"))) const chreNslNanoappInfo _chreNslDsoNanoappInfo =
+    qz::test::NanoappRecord(
+        Start, HandleEvent, [] {}, FAULTY_MAGIC);

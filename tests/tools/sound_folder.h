@@ -26,7 +26,6 @@ class SoundFolder : public TemporaryFolder {
     info.channels = channels;
     info.format = format;
     SNDFILE* file = sf_open(Path(name).c_str(), SFM_WRITE, &info);
-    if (file == nullptr) std::abort();
     const auto count = static_cast<sf_count_t>(samples.size());
     if constexpr (std::is_same_v<T, float>) {
       EXPECT_EQ(sf_write_float(file, samples.data(), count), count);
