@@ -79,6 +79,7 @@ TEST(AudioClassifier, CutsTheStreamIntoFramesAndWindows) {
     }
     ASSERT_EQ(frames[f], expected) << "frame " << f;
   }
+  ASSERT_EQ(network.windows.size(), 23u);
   for (size_t run = 0; run < network.windows.size(); ++run) {
     qz::test::Window expected;
     for (size_t f = 64 * run; f < 64 * run + 382; ++f) {
