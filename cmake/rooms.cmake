@@ -22,6 +22,9 @@ target_compile_options(
             -fno-asynchronous-unwind-tables
             $<$<COMPILE_LANGUAGE:CXX>:-fno-exceptions -fno-rtti -fno-threadsafe-statics>)
 
+set(QZ_KERNELS plain CACHE STRING "Whose kernels: plain (any processor's) or neon (AArch32)")
+set_property(CACHE QZ_KERNELS PROPERTY STRINGS plain neon)
+
 # qz_module_room(NAME SOURCES... LINKS... USES...): a room of the module, as a static library. Who links it
 # sees the rooms of LINKS too, which its headers include, but not those of USES.
 function(qz_module_room name)
@@ -29,6 +32,27 @@ function(qz_module_room name)
   add_library(${name} STATIC ${room_SOURCES})
   target_include_directories(${name} PUBLIC ${CMAKE_CURRENT_SOURCE_DIR})
   target_link_libraries(${name} PUBLIC ${room_LINKS} PRIVATE ${room_USES} qz_module_flags)
+endfunction()
+
+# qz_kernel_room(NAME TEXTS rows... TABLES sources...): a room of kernels. A row names a text, NAME.cc,
+# and then the processors for which there is another, PROCESSOR/NAME.cc, that gives the same bytes.
+# Two libraries: NAME holds what runs in this build; NAME_plain the plain texts, always, under names
+# with __plain behind them, for those who compare.
+function(qz_kernel_room name)
+  cmake_parse_arguments(room "" "" "TEXTS;TABLES" ${ARGN})
+  foreach(row IN LISTS room_TEXTS)
+    string(REGEX MATCHALL "[a-z0-9_]+" words "${row}")
+    list(POP_FRONT words text)
+    list(APPEND plain ${text}.cc)
+    if(QZ_KERNELS IN_LIST words)
+      list(APPEND running ${QZ_KERNELS}/${text}.cc)
+    else()
+      list(APPEND running ${text}.cc)
+    endif()
+  endforeach()
+  qz_module_room(${name} SOURCES ${running} ${room_TABLES})
+  qz_module_room(${name}_plain SOURCES ${plain} LINKS ${name})
+  target_compile_options(${name}_plain PRIVATE "SHELL:-include ${CMAKE_SOURCE_DIR}/kernels/plain_names.h")
 endfunction()
 
 # qz_room(NAME SOURCES... LINKS...): a room of the PC side, as a static library.

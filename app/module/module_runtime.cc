@@ -25,10 +25,18 @@ extern "C" {
 // A call of an abstract function: there is nobody to tell.
 void __cxa_pure_virtual() { __builtin_trap(); }
 
-// nanopb's library is built with stack checks, and can grow pointer fields, of which our messages
-// have none: the linker hands its calls of realloc and free to these.
+// nanopb's library is built with stack checks, which on some processors take the value that they
+// watch from here, and can grow pointer fields, of which our messages have none: the linker hands
+// its calls of realloc and free to these.
 void __stack_chk_fail() { __builtin_trap(); }
+extern const uintptr_t __stack_chk_guard;
+const uintptr_t __stack_chk_guard = 0xFF0A000D;
 void* __wrap_realloc(void*, size_t) { return nullptr; }
 void __wrap_free(void*) {}
+
+#ifdef __arm__
+// Where the compiler's division routines go that nanopb's library calls; nothing divides by zero.
+void __aeabi_idiv0() { __builtin_trap(); }
+#endif
 }
 #pragma GCC visibility pop

@@ -147,7 +147,7 @@ TEST(LoadedModule, ServesHostsAndNanoappsFromOneRecording) {
     const auto report = hub::DecodeFramedSoundReport(bytes.data(), bytes.size());
     ASSERT_TRUE(report.has_value());
     EXPECT_EQ(report->model_version, 202208270u);
-    EXPECT_EQ(report->response_time_ns, (pass + 1) * 2'000'000'000u);
+    EXPECT_EQ(report->response_time_ns, uint64_t{pass + 1} * 2'000'000'000);
     EXPECT_EQ(report->timestamp_ns, report->response_time_ns - 1000);
     for (const hub::SoundResult& result : report->results) seen.insert(result.confidence);
     // The window is not full in the first pass.

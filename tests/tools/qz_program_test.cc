@@ -25,7 +25,7 @@ class QzProgram : public testing::Test, protected SoundFolder {
   // err_.
   int Run(const std::string& line) {
     const std::string script = WriteBytes("script", line);
-    const int status = std::system(("QZ=" QZ_PROGRAM " bash " + script + " >" + Path("out") +
+    const int status = std::system(("QZ='" QZ_PROGRAM "' bash " + script + " >" + Path("out") +
                                     " 2>" + Path("err") + " </dev/null")
                                        .c_str());
     out_ = Contents("out");
