@@ -36,7 +36,8 @@ endfunction()
 
 # qz_kernel_room(NAME TEXTS rows... TABLES sources...): a room of kernels. A row names a text, NAME.cc,
 # and then the processors for which there is another, PROCESSOR/NAME.cc, that gives the same bytes.
-# Two libraries: NAME holds what runs in this build; NAME_plain the plain texts, always, under names
+# Two libraries: NAME holds what runs in this build (its property VECTOR_TEXTS lists the texts that are
+# not plain); NAME_plain the plain texts, always, under names
 # with __plain behind them, for those who compare.
 function(qz_kernel_room name)
   cmake_parse_arguments(room "" "" "TEXTS;TABLES" ${ARGN})
@@ -46,11 +47,13 @@ function(qz_kernel_room name)
     list(APPEND plain ${text}.cc)
     if(QZ_KERNELS IN_LIST words)
       list(APPEND running ${QZ_KERNELS}/${text}.cc)
+      list(APPEND vector_texts ${text})
     else()
       list(APPEND running ${text}.cc)
     endif()
   endforeach()
   qz_module_room(${name} SOURCES ${running} ${room_TABLES})
+  set_property(TARGET ${name} PROPERTY VECTOR_TEXTS "${vector_texts}")
   qz_module_room(${name}_plain SOURCES ${plain} LINKS ${name})
   target_compile_options(${name}_plain PRIVATE "SHELL:-include ${CMAKE_SOURCE_DIR}/kernels/plain_names.h")
 endfunction()

@@ -1,15 +1,7 @@
-// The whole system: the module as a loader sees it (what it exports, what it imports, what runs at
-// load, what it says of itself), then loaded as on a device, on a hub with several clients of both
-// kinds.
+// The whole system: the module, loaded as on a device, on a hub with several clients of both kinds.
 
-#include <dlfcn.h>
-
-#include <cstdio>
-#include <cstring>
-#include <memory>
 #include <set>
 
-#include "chre_nanoapp_info.h"
 #include "messages.h"
 #include "random.h"
 #include "test_hub.h"
@@ -19,64 +11,7 @@ namespace {
 
 using ::testing::Contains;
 using ::testing::ElementsAre;
-using ::testing::Not;
 using Bytes = std::vector<uint8_t>;
-
-// The words that a command of the shell prints.
-std::set<std::string> WordsOf(const std::string& command) {
-  const std::unique_ptr<FILE, int (*)(FILE*)> pipe(popen(command.c_str(), "r"), pclose);
-  std::set<std::string> words;
-  char word[256];
-  while (pipe != nullptr && fscanf(pipe.get(), "%255s", word) == 1) {
-    words.insert(word);
-  }
-  return words;
-}
-
-// Names of the dynamic symbols, without their versions.
-std::set<std::string> DynamicSymbols(const std::string& which) {
-  return WordsOf("nm -D --format=just-symbols " + which + " " QZ_MODULE " | cut -d@ -f1");
-}
-
-#ifndef QZ_SANITIZED
-TEST(ModuleFile, ImportsTheRuntimeAndLittleElseAndRunsNothingAtLoad) {
-  EXPECT_THAT(
-      DynamicSymbols("--undefined-only"),
-      ElementsAre("chreGetEstimatedHostTimeOffset", "chreGetTime", "chreHeapAlloc", "chreHeapFree",
-                  "chreLog", "chreSendEvent", "chreSendMessageToHostEndpoint",
-                  "chrexClockRateChangeRequest", "dlsym", "memcpy", "memmove", "memset"));
-  const std::set<std::string> sections = WordsOf("readelf -WS " QZ_MODULE);
-  EXPECT_THAT(sections, Contains(".text"));
-  for (const char* name : {".init", ".init_array", ".ctors", ".fini_array", ".data", ".tbss"}) {
-    EXPECT_THAT(sections, Not(Contains(name)));
-  }
-}
-#endif
-
-TEST(ModuleFile, ExportsTheRecordAndTheUnstableId) {
-  EXPECT_THAT(DynamicSymbols("--defined-only"),
-              ElementsAre("_chreNanoappUnstableId", "_chreNslDsoNanoappInfo"));
-}
-
-TEST(ModuleFile, SaysWhatItIs) {
-  EXPECT_THAT(WordsOf("readelf -p .unstable_id " QZ_MODULE),
-              Contains("nanoapp=qz@" QZ_BUILD_NUMBER "~" QZ_DEVICE));
-  void* module = dlopen(QZ_MODULE, RTLD_NOW | RTLD_LOCAL);
-  ASSERT_NE(module, nullptr) << dlerror();
-  const auto* info =
-      static_cast<const chreNslNanoappInfo*>(dlsym(module, CHRE_NSL_NANOAPP_INFO_SYMBOL));
-  ASSERT_NE(info, nullptr);
-  // Magic, version 3, no flag, nothing in the reserved and padding bytes, API 1.9.
-  const uint8_t first_bytes[12] = {0x77, 0x99, 0xE6, 0x50, 3, 0, 0, 0, 0, 0, 9, 1};
-  EXPECT_EQ(memcmp(info, first_bytes, sizeof(first_bytes)), 0);
-  EXPECT_STREQ(info->vendor, "Tamrex");
-  EXPECT_STREQ(info->name, "QZ");
-  EXPECT_EQ(info->appId, 0x54616D7265001030u);
-  EXPECT_EQ(info->appVersion, 18u);
-  EXPECT_EQ(info->appVersionString, dlsym(module, "_chreNanoappUnstableId"));
-  EXPECT_EQ(info->appPermissions, 1u);
-  dlclose(module);
-}
 
 constexpr uint32_t kBufferSamples = 32000;
 

@@ -1,0 +1,128 @@
+// The module as a loader sees it, read back from the file: what it exports and imports, what it
+// says of itself, what of it is constant, and that nothing runs at load.
+
+#include <gmock/gmock.h>
+
+#include "chre_nanoapp_info.h"
+#include "elf_file.h"
+
+namespace qz::test {
+namespace {
+
+using ::testing::ElementsAre;
+using ::testing::IsEmpty;
+using ::testing::UnorderedElementsAre;
+
+class ModuleFile : public testing::Test {
+ protected:
+  // Dynamic symbols that the module defines, or those that it does not.
+  std::set<std::string> DynamicSymbols(bool defined) const {
+    std::set<std::string> names;
+    for (const auto& [name, symbol] : file_.Symbols(".dynsym")) {
+      if ((symbol.st_shndx != SHN_UNDEF) == defined) names.insert(name);
+    }
+    return names;
+  }
+  ElfFile::Symbol Defined(const std::string& name) const {
+    const auto symbols = file_.Symbols(".symtab");
+    const auto found = symbols.find(name);
+    return found == symbols.end() ? ElfFile::Symbol{} : found->second;
+  }
+  ElfFile::Address Place(const std::string& name) const { return Defined(name).st_value; }
+
+  const ElfFile file_{QZ_MODULE};
+};
+
+TEST_F(ModuleFile, ExportsTheRecordAndTheUnstableId) {
+  EXPECT_THAT(DynamicSymbols(true),
+              ElementsAre("_chreNanoappUnstableId", "_chreNslDsoNanoappInfo"));
+}
+
+TEST_F(ModuleFile, HoldsTheUnstableIdInASectionOfItsOwn) {
+  const std::string id = "nanoapp=qz@" QZ_BUILD_NUMBER "~" QZ_DEVICE;
+  const ElfFile::Section& section = file_.sections.at(".unstable_id");
+  EXPECT_EQ(file_.Loaded(section.sh_addr, section.sh_size), id + '\0');
+  EXPECT_EQ(section.sh_flags, ElfW(Word){SHF_ALLOC});
+  EXPECT_EQ(Place("_chreNanoappUnstableId"), section.sh_addr);
+}
+
+TEST_F(ModuleFile, SaysWhatItIs) {
+  const ElfFile::Address at = Place("_chreNslDsoNanoappInfo");
+  constexpr size_t kVendor = offsetof(chreNslNanoappInfo, vendor);
+  constexpr size_t kAppId = offsetof(chreNslNanoappInfo, appId);
+  constexpr size_t kStart = offsetof(chreNslNanoappInfo, start);
+#if __SIZEOF_POINTER__ == 4
+  // The layout that loaders of hubs know, with four bytes of padding before the app ID.
+  EXPECT_EQ(kVendor, 12u);
+  EXPECT_EQ(file_.Loaded(at + 20, 4), std::string(4, '\0'));
+  EXPECT_EQ(kAppId, 24u);
+  EXPECT_EQ(kStart, 36u);
+  EXPECT_EQ(Defined("_chreNslDsoNanoappInfo").st_size, 56u);
+#endif
+  // Magic, version 3, no flag, nothing in the reserved and padding bytes, API 1.9.
+  EXPECT_EQ(file_.Loaded(at, 12), std::string("\x77\x99\xE6\x50\3\0\0\0\0\0\x09\1", 12));
+  // "Tamre" and 0x001030, then version 18.
+  EXPECT_EQ(file_.Loaded(at + kAppId, 12), std::string("\x30\x10\0ermaT\x12\0\0\0", 12));
+
+  constexpr size_t kPointer = sizeof(void*);
+  EXPECT_EQ(file_.LoadedString(file_.Pointer(at + kVendor)), "Tamrex");
+  EXPECT_EQ(file_.LoadedString(file_.Pointer(at + kVendor + kPointer)), "QZ");
+  EXPECT_EQ(file_.Pointer(at + kStart), Place("nanoappStart"));
+  EXPECT_EQ(file_.Pointer(at + kStart + kPointer), Place("nanoappHandleEvent"));
+  EXPECT_EQ(file_.Pointer(at + kStart + 2 * kPointer), Place("nanoappEnd"));
+  EXPECT_EQ(file_.Pointer(at + kStart + 3 * kPointer), Place("_chreNanoappUnstableId"));
+  EXPECT_EQ(file_.Loaded(at + kStart + 4 * kPointer, 4), std::string("\1\0\0\0", 4));
+}
+
+// Sanitizers bring libraries, constructors and tables of their own.
+#ifndef QZ_SANITIZED
+
+TEST_F(ModuleFile, ImportsTheRuntimeAndLittleElse) {
+  EXPECT_THAT(
+      DynamicSymbols(false),
+      ElementsAre("chreGetEstimatedHostTimeOffset", "chreGetTime", "chreHeapAlloc", "chreHeapFree",
+                  "chreLog", "chreSendEvent", "chreSendMessageToHostEndpoint",
+                  "chrexClockRateChangeRequest", "dlsym", "memcpy", "memmove", "memset"));
+  EXPECT_THAT(file_.Needed(), ElementsAre("libc.so.6", "libchre_runtime.so"));
+}
+
+TEST_F(ModuleFile, RunsNothingAtLoad) {
+  for (const char* name : {".init", ".init_array", ".preinit_array", ".ctors", ".fini",
+                           ".fini_array", ".tdata", ".tbss"}) {
+    EXPECT_EQ(file_.sections.count(name), 0u) << name;
+  }
+}
+
+TEST_F(ModuleFile, KeepsAllButItsStateReadOnly) {
+  const auto relro =
+      std::find_if(file_.segments.begin(), file_.segments.end(),
+                   [](const ElfFile::Segment& s) { return s.p_type == PT_GNU_RELRO; });
+  ASSERT_NE(relro, file_.segments.end());
+  std::set<std::string> writable;
+  for (const auto& [name, section] : file_.sections) {
+    const bool after_load = section.sh_addr < relro->p_vaddr ||
+                            section.sh_addr + section.sh_size > relro->p_vaddr + relro->p_memsz;
+    if ((section.sh_flags & SHF_WRITE) != 0 && after_load) writable.insert(name);
+  }
+  EXPECT_THAT(writable, ElementsAre(".bss"));
+
+  const ElfFile::Section& bss = file_.sections.at(".bss");
+  std::multiset<std::string> state;
+  for (const auto& [name, symbol] : file_.Symbols(".symtab")) {
+    const bool object = ELF32_ST_TYPE(symbol.st_info) == STT_OBJECT;
+    if (!object || symbol.st_value - bss.sh_addr >= bss.sh_size) continue;
+    state.insert(name.substr(name.rfind(':') + 1));
+  }
+  EXPECT_THAT(state, UnorderedElementsAre(
+                         // The front end's and the network's; a noise estimate; the classifier's.
+                         "arena", "arena", "state", "state_initialized", "sample_count",
+                         "frontend_input_buffer", "feature_count", "inference_input_buffer",
+                         // The application's one object, and what it has bound of the runtime.
+                         "sObject", "sIsInitialized", "lookupPerformed", "lookupPerformed",
+                         "funcPtr", "funcPtr"));
+}
+
+#endif
+
+}  // namespace
+}  // namespace qz::test
