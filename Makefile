@@ -8,19 +8,19 @@ AUDIO ?= $(CLIP)
 # Parallelism is the builds' own; two set-ups at a time would fight over dpkg's lock.
 .NOTPARALLEL:
 
-.PHONY: help run test bench lint setup clean configure-host build-host clip
+.PHONY: help run test bench lint setup clean configure-host build-host build-target clip
 
 help:
 	@echo 'make run               build, then run the detector on a clip of recorded sound'
 	@echo 'make run AUDIO=FILE    the same on a sound file of your own'
-	@echo 'make test              build and test, then once more under the sanitizers'
+	@echo 'make test              build and test for this PC, for the device, under the sanitizers'
 	@echo 'make bench             time the kernels, the graphs and the whole program'
 	@echo 'make lint              check formatting and the rules of clang-tidy'
 	@echo 'make setup             install what is missing of the Debian packages for all this'
 	@echo 'make clean             remove everything that was built'
 
 setup:
-	@scripts/setup-debian.sh build clip lint
+	@scripts/setup-debian.sh build clip lint target
 
 configure-host:
 	@scripts/setup-debian.sh build
@@ -28,6 +28,13 @@ configure-host:
 
 build-host: configure-host
 	cmake --build --preset host --parallel $(JOBS)
+
+# The device's processor, AArch32 with NEON; what is built runs under qemu-arm.
+build-target:
+	@scripts/setup-debian.sh target
+	@scripts/make-sysroot.sh build/sysroot-armhf
+	cmake --preset target
+	cmake --build --preset target --parallel $(JOBS)
 
 run: configure-host $(if $(filter $(CLIP),$(AUDIO)),clip)
 	cmake --build --preset host --parallel $(JOBS) --target qz
@@ -37,8 +44,10 @@ clip:
 	@scripts/setup-debian.sh clip
 	@test -e $(CLIP) || scripts/make-clip.sh $(CLIP)
 
-test: build-host
+test: build-host build-target clip
 	ctest --preset host
+	ctest --preset target
+	build/host/bin/qz prove $(CLIP) build/host build/target
 	cmake --preset host-asan
 	cmake --build --preset host-asan --parallel $(JOBS)
 	ctest --preset host-asan

@@ -10,6 +10,10 @@ packages=(libc6-dev libstdc++6 libprotobuf-dev libnanopb-dev libsndfile1-dev lib
   nlohmann-json3-dev libgtest-dev libgmock-dev)
 
 folder=$1
+command -v apt-get >/dev/null || {
+  echo "make-sysroot.sh: not a Debian system; $folder needs its armhf packages: ${packages[*]}" >&2
+  exit 1
+}
 # The list of packages is written last: a set-up that was cut off, or of other packages, begins anew.
 [ "$(cat "$folder/packages" 2>/dev/null)" != "${packages[*]}" ] || exit 0
 echo "make-sysroot.sh: fetching ${packages[*]} for armhf" >&2
