@@ -5,6 +5,7 @@
 #include "arena_plan.h"
 #include "logistic_table.h"
 #include "model_weights.h"
+#include "operators.h"
 #include "quantised_kernels.h"
 
 namespace {
@@ -100,26 +101,36 @@ void Dequantise(Tensor in, Tensor out) {
 constexpr int8_t* mobilenet_backend_input_ptr = arena.bytes + kInput.offset;
 constexpr const float* mobilenet_backend_output_ptr = arena.floats + kScores.offset / sizeof(float);
 
+namespace qz {
+
+// Operator 16 has nothing to do: the one row left is read as a vector where it lies.
+constexpr Operator kOperators[kOperatorCount] = {
+    {[] { Depthwise(ind0.data(), w0, kOut0, 15); }, kOut0},
+    {[] { Pointwise(kOut0, w1, kOut1); }, kOut1},
+    {[] { MaxPool(kOut1, ind2.data(), kOut2); }, kOut2},
+    {[] { Depthwise(ind3.data(), w3, kOut3, 36); }, kOut3},
+    {[] { Pointwise(kOut3, w4, kOut4); }, kOut4},
+    {[] { MaxPool(kOut4, ind5.data(), kOut5); }, kOut5},
+    {[] { Convolution(kOut5, ind6.data(), w6, kOut6); }, kOut6},
+    {[] { MaxPool(kOut6, ind7.data(), kOut7); }, kOut7},
+    {[] { Convolution(kOut7, ind8.data(), w8, kOut8); }, kOut8},
+    {[] { MaxPool(kOut8, ind9.data(), kOut9); }, kOut9},
+    {[] { Convolution(kOut9, ind10.data(), w10, kOut10); }, kOut10},
+    {[] { MaxPool(kOut10, ind11.data(), kOut11); }, kOut11},
+    {[] { Convolution(kOut11, ind12.data(), w12, kOut12); }, kOut12},
+    {[] { Convolution(kOut12, ind13.data(), w13, kOut13); }, kOut13},
+    {[] { MaxPool(kOut13, ind14.data(), kOut14); }, kOut14},
+    {[] { Convolution(kOut14, ind15.data(), w15, kOut15); }, kOut15},
+    {[] {}, kOut15},
+    // The factors 0.0207705330 and 0.0022462329.
+    {[] { FullyConnected(kOut15, w17, kOut17, 1427340160, -5, kFromZero); }, kOut17},
+    {[] { FullyConnected(kOut17, w18, kOut18, 1234879616, -8, 82); }, kOut18},
+    {[] { Logistic(kOut18); }, kOut18},
+    {[] { Dequantise(kOut18, kScores); }, kScores},
+};
+
+}  // namespace qz
+
 void mobilenet_backend_invoke(void) {
-  Depthwise(ind0.data(), w0, kOut0, 15);
-  Pointwise(kOut0, w1, kOut1);
-  MaxPool(kOut1, ind2.data(), kOut2);
-  Depthwise(ind3.data(), w3, kOut3, 36);
-  Pointwise(kOut3, w4, kOut4);
-  MaxPool(kOut4, ind5.data(), kOut5);
-  Convolution(kOut5, ind6.data(), w6, kOut6);
-  MaxPool(kOut6, ind7.data(), kOut7);
-  Convolution(kOut7, ind8.data(), w8, kOut8);
-  MaxPool(kOut8, ind9.data(), kOut9);
-  Convolution(kOut9, ind10.data(), w10, kOut10);
-  MaxPool(kOut10, ind11.data(), kOut11);
-  Convolution(kOut11, ind12.data(), w12, kOut12);
-  Convolution(kOut12, ind13.data(), w13, kOut13);
-  MaxPool(kOut13, ind14.data(), kOut14);
-  Convolution(kOut14, ind15.data(), w15, kOut15);
-  // Operator 16 has nothing to do: the one row left is read as a vector where it lies.
-  FullyConnected(kOut15, w17, kOut17, 1427340160, -5, kFromZero);  // factor 0.0207705330
-  FullyConnected(kOut17, w18, kOut18, 1234879616, -8, 82);         // factor 0.0022462329
-  Logistic(kOut18);
-  Dequantise(kOut18, kScores);
+  for (const Operator& each : kOperators) each.run();
 }

@@ -1,6 +1,4 @@
-// The network against its plain evaluation from the packed model, tensor by tensor.
-
-#include "mobilenet_backend.h"
+// The network against its plain evaluation from the packed model, operator by operator.
 
 #include <gtest/gtest.h>
 
@@ -10,9 +8,9 @@
 #include <set>
 #include <vector>
 
-#include "arena_plan.h"
 #include "logistic_table.h"
 #include "model_files.h"
+#include "operators.h"
 #include "random.h"
 #include "reference_network.h"
 #include "synthetic_features.h"
@@ -20,32 +18,40 @@
 namespace qz::test {
 namespace {
 
-// The places of the outputs of operators 0 to 19, but for operator 16, which has none of its own.
-const Tensor kPlaces[] = {kOut0,  kOut1,  kOut2,  kOut3,  kOut4,  kOut5,  kOut6,
-                          kOut7,  kOut8,  kOut9,  kOut10, kOut11, kOut12, kOut13,
-                          kOut14, kOut15, kOut15, kOut17, kOut18, kOut18};
+int8_t* Arena() { return mobilenet_backend_input_ptr - kInput.offset; }
 
 // All of the arena is compared, so that a byte written beside its tensor shows as well.
+size_t FirstUnexpectedByte(const std::vector<int8_t>& expected) {
+  return static_cast<size_t>(std::mismatch(expected.begin(), expected.end(), Arena()).first -
+                             expected.begin());
+}
+
 TEST(Network, EqualsThePlainEvaluationWhateverTheArenaHeld) {
   const model::PackedModel packed = model::ReadModelFile(QZ_PACKED_MODEL);
   Random random(1);
-  int8_t* const arena = mobilenet_backend_input_ptr - kInput.offset;
   std::set<std::array<float, 5>> different;
   for (uint64_t i = 0; i < 40; ++i) {
     model::Tensor input = model::SyntheticWindow(i);
     if (i % 8 == 0) input.values = random.Fill<int8_t>(kInput.Bytes(), -128, 127);
     std::vector<int8_t> expected = random.Fill<int8_t>(kArenaBytes, -128, 127);
     std::copy(input.values.begin(), input.values.end(), &expected[kInput.offset]);
-    std::copy(expected.begin(), expected.end(), arena);
-    mobilenet_backend_invoke();
-
+    const std::vector<int8_t> before = expected;
+    std::copy(before.begin(), before.end(), Arena());
     const model::NetworkRun run = model::RunNetwork(packed, input);
-    for (size_t op = 0; op < run.outputs.size(); ++op) {
-      const std::vector<int8_t>& output = run.outputs[op].values;
-      std::copy(output.begin(), output.end(), &expected[kPlaces[op].offset]);
+    for (size_t op = 0; op < kOperatorCount; ++op) {
+      const Tensor& output = kOperators[op].output;
+      const bool scores = op == run.outputs.size();
+      ASSERT_EQ(output.Bytes(), scores ? sizeof run.scores : run.outputs[op].values.size());
+      const void* values =
+          scores ? static_cast<const void*>(run.scores.data()) : run.outputs[op].values.data();
+      std::memcpy(&expected[output.offset], values, output.Bytes());
+      kOperators[op].run();
+      ASSERT_EQ(FirstUnexpectedByte(expected), kArenaBytes)
+          << "of window " << i << ", operator " << op;
     }
-    std::memcpy(&expected[kScores.offset], run.scores.data(), sizeof run.scores);
-    ASSERT_EQ(std::vector<int8_t>(arena, arena + kArenaBytes), expected);
+    std::copy(before.begin(), before.end(), Arena());
+    mobilenet_backend_invoke();
+    ASSERT_EQ(FirstUnexpectedByte(expected), kArenaBytes) << "of window " << i;
     different.insert(run.scores);
   }
   EXPECT_GT(different.size(), 2u) << "too dull a model to tell anything";
@@ -54,8 +60,7 @@ TEST(Network, EqualsThePlainEvaluationWhateverTheArenaHeld) {
 TEST(Network, KeepsItsPlaces) {
   EXPECT_EQ(static_cast<const void*>(mobilenet_backend_output_ptr), mobilenet_backend_input_ptr);
   // Row 3 of a tile with two real rows meets the same row as the last of these, at every tap.
-  const int8_t* const arena = mobilenet_backend_input_ptr - kInput.offset;
-  EXPECT_EQ(TileList<2>(arena, kOut12)[12 + 2 * 4 + 3], arena + kOut12.offset + 7 * 60);
+  EXPECT_EQ(TileList<2>(Arena(), kOut12)[12 + 2 * 4 + 3], Arena() + kOut12.offset + 7 * 60);
 }
 
 TEST(Network, LogisticTableIsTheRoundedFunction) {
