@@ -1,51 +1,26 @@
 #include "audio_input.h"
 
 #include <fcntl.h>
-#include <stdlib.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstring>
 #include <vector>
 
 #include "file_descriptor.h"
 #include "interrupt.h"
 #include "raw_input.h"
 #include "sound_file_input.h"
+#include "temporary_file.h"
 
 namespace qz::tools {
 namespace {
 
 constexpr size_t kCopyBlockBytes = 65536;
 
-[[noreturn]] void ThrowSystemError(const std::string& name, const char* what) {
-  const int error = errno;
-  throw AudioError(name + ": " + what + ": " + std::strerror(error));
-}
-
-FileDescriptor OpenTemporary() {
-  const char* folder = getenv("TMPDIR");
-  std::string path = std::string(folder != nullptr ? folder : "/tmp") + "/qz-XXXXXX";
-  FileDescriptor file(mkostemp(path.data(), O_CLOEXEC));
-  if (file.get() < 0) ThrowSystemError(path, "can't make a temporary file");
-  unlink(path.c_str());
-  return file;
-}
-
-void WriteAll(const std::string& name, int fd, const char* bytes, size_t count) {
-  while (count > 0) {
-    const ssize_t written = write(fd, bytes, count);
-    if (written < 0 && errno == EINTR) continue;
-    if (written < 0) ThrowSystemError(name, "can't be copied to a temporary file");
-    bytes += written;
-    count -= static_cast<size_t>(written);
-  }
-}
-
 // Some containers need seeking, which a pipe can't do.
 FileDescriptor CopyToTemporary(const std::string& name, const FileDescriptor& source) {
-  FileDescriptor copy = OpenTemporary();
+  FileDescriptor copy = OpenTemporaryFile();
   std::vector<char> block(kCopyBlockBytes);
   while (WaitReadable(source.get())) {
     const ssize_t got = read(source.get(), block.data(), block.size());
@@ -55,7 +30,7 @@ FileDescriptor CopyToTemporary(const std::string& name, const FileDescriptor& so
       if (lseek(copy.get(), 0, SEEK_SET) != 0) ThrowSystemError(name, "can't rewind the copy");
       return copy;
     }
-    WriteAll(name, copy.get(), block.data(), static_cast<size_t>(got));
+    WriteToTemporaryFile(copy, block.data(), static_cast<size_t>(got));
   }
   throw AudioError(name + ": interrupted before its end; live sound needs --raw");
 }

@@ -10,10 +10,12 @@
 #include <string>
 #include <vector>
 
+#include "prove_command.h"
 #include "run_command.h"
 
 namespace {
 
+using qz::tools::ProveOptions;
 using qz::tools::RunOptions;
 
 constexpr int kMostClients = 64;
@@ -28,25 +30,36 @@ void OccupyStandardStreams() {
   }
 }
 
-// The module beside this program: bin/qz and lib/qz.so.
-std::string DefaultModulePath() {
-  const std::filesystem::path program = std::filesystem::read_symlink("/proc/self/exe");
-  return (program.parent_path().parent_path() / "lib" / "qz.so").string();
+// The build folder that this program, bin/qz, lies in.
+std::filesystem::path OwnBuild() {
+  return std::filesystem::read_symlink("/proc/self/exe").parent_path().parent_path();
+}
+
+// This build and the one for the hub's own processor beside it, as seen from here.
+std::vector<std::string> DefaultBuilds() {
+  const std::filesystem::path own = std::filesystem::proximate(OwnBuild());
+  const std::filesystem::path target =
+      std::filesystem::proximate(OwnBuild().parent_path() / "target");
+  return {own.string(), target.string()};
+}
+
+template <typename Options>
+void AddFileAndClients(CLI::App* command, Options* options, const std::string& about_file) {
+  command->add_option("FILE", options->file, about_file)->required();
+  command->add_option("--host-clients", options->host_clients, "Host clients to connect")
+      ->check(CLI::Range(0, kMostClients))
+      ->capture_default_str();
+  command->add_option("--client-nanoapps", options->client_nanoapps, "Client nanoapps to register")
+      ->check(CLI::Range(0, kMostClients))
+      ->capture_default_str();
 }
 
 CLI::App* AddRun(CLI::App* app, RunOptions* options, std::string* log_level) {
   CLI::App* run =
       app->add_subcommand("run", "Play a sound file to the detector, print its reports");
-  run->add_option("FILE", options->file,
-                  "WAV, FLAC, OGG, ...; - is standard input, read to its end first unless --raw")
-      ->required();
+  AddFileAndClients(run, options,
+                    "WAV, FLAC, OGG, ...; - is standard input, read to its end first unless --raw");
   run->add_flag("--raw", options->raw, "FILE is headerless 16-bit little-endian mono at 16 kHz");
-  run->add_option("--host-clients", options->host_clients, "Host clients to connect")
-      ->check(CLI::Range(0, kMostClients))
-      ->capture_default_str();
-  run->add_option("--client-nanoapps", options->client_nanoapps, "Client nanoapps to register")
-      ->check(CLI::Range(0, kMostClients))
-      ->capture_default_str();
   run->add_option("--log-level", *log_level, "What to show of the detector's log")
       ->check(CLI::IsMember(kLogLevels))
       ->capture_default_str();
@@ -56,27 +69,46 @@ CLI::App* AddRun(CLI::App* app, RunOptions* options, std::string* log_level) {
   return run;
 }
 
+CLI::App* AddProve(CLI::App* app, ProveOptions* options) {
+  CLI::App* prove = app->add_subcommand(
+      "prove", "Play a sound file to the detector of two builds, compare all that they compute");
+  AddFileAndClients(prove, options, "WAV, FLAC, OGG, ...; - is standard input");
+  prove
+      ->add_option("BUILDS", options->builds,
+                   "Two build folders (default: this program's own, and target beside it)")
+      ->expected(2);
+  return prove;
+}
+
 int Main(int argc, char** argv) {
   CLI::App app("Sound event detector, run on a PC", "qz");
   app.set_version_flag("--version", "qz " QZ_VERSION);
-  app.failure_message([](const CLI::App*, const CLI::Error& error) {
-    return std::string("qz: ") + error.what() + " (see qz run --help)\n";
+  app.failure_message([](const CLI::App* parsed, const CLI::Error& error) {
+    const auto commands = parsed->get_subcommands();
+    const std::string command = commands.empty() ? "" : commands[0]->get_name() + " ";
+    return std::string("qz: ") + error.what() + " (see qz " + command + "--help)\n";
   });
   RunOptions options;
   std::string log_level = "warning";
   const CLI::App* run = AddRun(&app, &options, &log_level);
+  ProveOptions prove_options;
+  const CLI::App* prove = AddProve(&app, &prove_options);
   try {
     app.parse(argc, argv);
   } catch (const CLI::ParseError& error) {
     return app.exit(error) == 0 ? qz::tools::kFine : qz::tools::kUsage;
   }
+  if (prove->parsed()) {
+    if (prove_options.builds.empty()) prove_options.builds = DefaultBuilds();
+    return qz::tools::ProveCommand(prove_options);
+  }
   if (!run->parsed()) {
-    std::fprintf(stderr, "qz: no command, should be run (see qz --help)\n");
+    std::fprintf(stderr, "qz: no command, should be run or prove (see qz --help)\n");
     return qz::tools::kUsage;
   }
   options.log_level = static_cast<chreLogLevel>(
       std::find(kLogLevels.begin(), kLogLevels.end(), log_level) - kLogLevels.begin());
-  if (options.module_path.empty()) options.module_path = DefaultModulePath();
+  if (options.module_path.empty()) options.module_path = (OwnBuild() / "lib" / "qz.so").string();
   return qz::tools::RunCommand(options);
 }
 

@@ -7,7 +7,7 @@
 
 #include "audio_input.h"
 #include "buffer_cutter.h"
-#include "clients.h"
+#include "client_printer.h"
 #include "console.h"
 #include "hub.h"
 #include "interrupt.h"
@@ -39,7 +39,7 @@ class Run {
   explicit Run(const RunOptions& options)
       : options_(options),
         format_(options.json ? MakeJsonFormat() : MakeTextFormat(console_.data_on_terminal())),
-        clients_(&hub_, format_.get(), &console_) {}
+        printer_(format_.get(), &console_) {}
   // Whatever the module still sends at its end needs the clients.
   ~Run() { hub_.End(); }
 
@@ -57,7 +57,8 @@ class Run {
   Console console_;
   std::unique_ptr<ReportFormat> format_;
   hub::Hub hub_;
-  Clients clients_;
+  ClientPrinter printer_;
+  hub::Clients clients_{&hub_, &printer_};
   BufferCutter cutter_{[this](const int16_t* buffer) {
     hub_.PlayAudio(buffer, kBufferSamples);
     delivered_samples_ += kBufferSamples;
@@ -110,7 +111,7 @@ bool Run::StartModule(ExitCode* exit_code) {
   hub::LoadFailure failure;
   if (hub_.Start(options_.module_path, &failure)) return true;
   console_.Message("qz: " + failure.sentence);
-  *exit_code = failure.kind == hub::LoadFailure::Kind::kRefused ? kFaultFound : kModuleNotLoadable;
+  *exit_code = failure.kind == hub::LoadFailure::Kind::kRefused ? kFaultFound : kNotRunnable;
   return false;
 }
 
@@ -148,8 +149,8 @@ RunSummary Run::Summarise() const {
   summary.silent_samples = silent_samples_;
   summary.passes = counts.audio_buffers;
   summary.feature_frames = FramesOf(counts.audio_buffers * kBufferSamples);
-  summary.reports = clients_.reports();
-  summary.detections = clients_.detections();
+  summary.reports = printer_.reports();
+  summary.detections = printer_.detections();
   summary.host_clients_accepted = clients_.accepted_hosts();
   summary.host_clients = options_.host_clients;
   summary.client_nanoapps = options_.client_nanoapps;
@@ -160,7 +161,7 @@ RunSummary Run::Summarise() const {
 }
 
 ExitCode Run::Conclude() {
-  std::vector<std::string> faults = clients_.faults();
+  std::vector<std::string> faults = printer_.faults();
   for (const std::string& fault : hub_.Faults()) faults.push_back(fault);
 
   RunSummary summary = Summarise();

@@ -4,16 +4,9 @@
 #include <string>
 
 #include "chre.h"
+#include "exit_code.h"
 
 namespace qz::tools {
-
-enum ExitCode {
-  kFine = 0,
-  kFaultFound = 1,
-  kUsage = 2,
-  kUnreadableInput = 3,
-  kModuleNotLoadable = 4,
-};
 
 struct RunOptions {
   std::string file;  // "-": standard input

@@ -1,14 +1,10 @@
 // The program qz as a whole, run from a shell: its output, its messages, its exit codes.
 
+#include "qz_program.h"
+
 #include <gmock/gmock.h>
-#include <sys/wait.h>
 
 #include <algorithm>
-#include <cstdlib>
-#include <fstream>
-
-#include "random.h"
-#include "sound_folder.h"
 
 namespace qz::test {
 namespace {
@@ -16,34 +12,6 @@ namespace {
 using testing::HasSubstr;
 using testing::Not;
 using testing::StartsWith;
-
-constexpr size_t kSecond = 16000;
-
-class QzProgram : public testing::Test, protected SoundFolder {
- protected:
-  // Runs a line of bash, in which $QZ is the program; its exit code. The streams are in out_ and
-  // err_.
-  int Run(const std::string& line) {
-    const std::string script = WriteBytes("script", line);
-    const int status = std::system(("QZ='" QZ_PROGRAM "' bash " + script + " >" + Path("out") +
-                                    " 2>" + Path("err") + " </dev/null")
-                                       .c_str());
-    out_ = Contents("out");
-    err_ = Contents("err");
-    return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-  }
-  std::string Contents(const std::string& name) const {
-    std::ifstream file(Path(name), std::ios::binary);
-    return {std::istreambuf_iterator<char>(file), {}};
-  }
-  // The path of a headerless file with so many samples.
-  std::string Noise(size_t samples) const {
-    return WriteRaw("noise.raw", Random(3).Fill<int16_t>(samples, -8000, 8000));
-  }
-
-  std::string out_;
-  std::string err_;
-};
 
 TEST_F(QzProgram, JsonTellsWhatEveryClientReceived) {
   EXPECT_EQ(Run("$QZ run --raw --json --host-clients 3 --client-nanoapps 2 " + Noise(9 * kSecond)),

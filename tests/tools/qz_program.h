@@ -1,0 +1,43 @@
+// The program qz, run from a shell.
+#pragma once
+
+#include <sys/wait.h>
+
+#include <cstdlib>
+#include <fstream>
+#include <iterator>
+
+#include "random.h"
+#include "sound_folder.h"
+
+namespace qz::test {
+
+constexpr size_t kSecond = 16000;
+
+class QzProgram : public testing::Test, protected SoundFolder {
+ protected:
+  // Runs a line of bash, in which $QZ is the program; its exit code. The streams are in out_ and
+  // err_.
+  int Run(const std::string& line) {
+    const std::string script = WriteBytes("script", line);
+    const int status = std::system(("QZ='" QZ_PROGRAM "' bash " + script + " >" + Path("out") +
+                                    " 2>" + Path("err") + " </dev/null")
+                                       .c_str());
+    out_ = Contents("out");
+    err_ = Contents("err");
+    return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+  }
+  std::string Contents(const std::string& name) const {
+    std::ifstream file(Path(name), std::ios::binary);
+    return {std::istreambuf_iterator<char>(file), {}};
+  }
+  // The path of a headerless file with so many samples.
+  std::string Noise(size_t samples) const {
+    return WriteRaw("noise.raw", Random(3).Fill<int16_t>(samples, -8000, 8000));
+  }
+
+  std::string out_;
+  std::string err_;
+};
+
+}  // namespace qz::test

@@ -1,0 +1,34 @@
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "clients.h"
+#include "console.h"
+#include "report_format.h"
+
+namespace qz::tools {
+
+// Decodes and prints what clients receive.
+class ClientPrinter final : public hub::ClientListener {
+ public:
+  ClientPrinter(const ReportFormat* format, Console* console)
+      : format_(*format), console_(*console) {}
+
+  void OnHostMessage(uint16_t endpoint, uint32_t type, const uint8_t* bytes, size_t size) override;
+  void OnEvent(uint32_t nanoapp, uint16_t type, const void* data, size_t size) override;
+
+  uint64_t reports() const { return reports_; }
+  uint64_t detections() const { return detections_; }
+  // One sentence for each message or event that could not be decoded.
+  const std::vector<std::string>& faults() const { return faults_; }
+
+ private:
+  const ReportFormat& format_;
+  Console& console_;
+  uint64_t reports_ = 0;
+  uint64_t detections_ = 0;
+  std::vector<std::string> faults_;
+};
+
+}  // namespace qz::tools

@@ -1,0 +1,132 @@
+#include "prove_command.h"
+
+#include <algorithm>
+#include <cstdio>
+
+#include "audio_input.h"
+#include "buffer_cutter.h"
+#include "comparison.h"
+#include "console.h"
+#include "interrupt.h"
+#include "temporary_file.h"
+#include "traced_build.h"
+
+namespace qz::tools {
+namespace {
+
+using trace::Comparison;
+using trace::Kind;
+
+// The audio of a file as the builds get it: whole buffers, the last one filled up with silence.
+struct RawAudio {
+  FileDescriptor file;
+  uint64_t samples;
+};
+
+RawAudio Decode(AudioInput* input) {
+  RawAudio audio{OpenTemporaryFile(), 0};
+  BufferCutter cutter([&audio](const int16_t* buffer) {
+    WriteToTemporaryFile(audio.file, buffer, kBufferSamples * sizeof(int16_t));
+    audio.samples += kBufferSamples;
+  });
+  while (const size_t got = input->Read(cutter.room(), cutter.room_samples())) cutter.Commit(got);
+  cutter.Finish();
+  return audio;
+}
+
+std::string Grouped(uint64_t number) {
+  std::string text = std::to_string(number);
+  for (size_t place = text.size(); place > 3;) text.insert(place -= 3, ",");
+  return text;
+}
+
+std::string Line(const std::string& what, const trace::Tally& tally) {
+  char text[128];
+  std::snprintf(text, sizeof(text), "%-46s digest %016llx", what.c_str(),
+                static_cast<unsigned long long>(tally.digest));
+  return text;
+}
+
+void PrintTallies(const Comparison& comparison, Console* console) {
+  const auto print = [&](Kind kind, uint32_t nanoapp, const std::string& before,
+                         const std::string& after, uint64_t parts) {
+    const trace::Tally& tally = comparison.tally(nanoapp, kind);
+    console->Data(Line(before + Grouped(tally.records / parts) + after, tally));
+  };
+  print(Kind::kFeatures, trace::kLinkedNanoapp, "features of ", " frames", 1);
+  print(Kind::kOperatorOutput, trace::kLinkedNanoapp,
+        "outputs of " + std::to_string(trace::kOperatorsPerRun) + " operators in ", " network runs",
+        trace::kOperatorsPerRun);
+  print(Kind::kHostMessage, trace::kLoadedModule, "", " messages to hosts", 1);
+  print(Kind::kClientEvent, trace::kLoadedModule, "", " reports", 1);
+  print(Kind::kLogLine, trace::kLoadedModule, "", " log lines", 1);
+}
+
+// Reads both traces in step up to their ends or the first difference, which is returned.
+std::string FirstDifference(TracedBuild* first, TracedBuild* second, uint64_t samples,
+                            Comparison* comparison, Console* console) {
+  trace::Record first_record;
+  trace::Record second_record;
+  do {
+    first->Next(&first_record);
+    second->Next(&second_record);
+    std::string difference = comparison->Compare(first_record, second_record);
+    if (!difference.empty()) return difference;
+    // The audio is played to two nanoapps, one after the other.
+    console->Progress(comparison->buffers_played() * kBufferSamples / 2, samples);
+  } while (first_record.kind != Kind::kEnd);
+  return {};
+}
+
+ExitCode Conclude(const Comparison& comparison, const ProveOptions& options, Console* console) {
+  const std::string apart = comparison.NanoappsDiffer();
+  if (!apart.empty()) {
+    console->Data("the builds give the same, but what was loaded and what was observed do not: " +
+                  apart);
+    return kFaultFound;
+  }
+  if (comparison.tally(trace::kLinkedNanoapp, Kind::kFeatures).records == 0) {
+    console->Message("qz: nothing was computed: no client, so the detector took no audio");
+    return kFaultFound;
+  }
+  if (comparison.tally(trace::kLinkedNanoapp, Kind::kOperatorOutput).records == 0) {
+    console->Message("no network run happened: the audio is too short");
+  }
+  PrintTallies(comparison, console);
+  console->Data(options.builds[0] + " and " + options.builds[1] + " give the same");
+  const std::string output_fault = console->OutputFault();
+  if (!output_fault.empty()) console->Message("qz: " + output_fault);
+  return output_fault.empty() ? kFine : kFaultFound;
+}
+
+ExitCode Compare(const ProveOptions& options, const RawAudio& audio, Console* console) {
+  TracedBuild first(options.builds[0], audio.file, options.host_clients, options.client_nanoapps);
+  TracedBuild second(options.builds[1], audio.file, options.host_clients, options.client_nanoapps);
+  Comparison comparison(options.builds[0], options.builds[1]);
+  const std::string difference =
+      FirstDifference(&first, &second, audio.samples, &comparison, console);
+  if (difference.empty()) return Conclude(comparison, options, console);
+  console->Data("first difference: " + difference);
+  return kFaultFound;
+}
+
+}  // namespace
+
+ExitCode ProveCommand(const ProveOptions& options) {
+  CatchInterrupt();
+  Console console;
+  try {
+    const std::unique_ptr<AudioInput> input = OpenAudio(options.file, /*raw=*/false);
+    console.Message(input->Description());
+    return Compare(options, Decode(input.get()), &console);
+  } catch (const AudioError& error) {
+    console.Message(std::string("qz: ") + error.what());
+    return kUnreadableInput;
+  } catch (const BuildError& error) {
+    console.Message(Interrupted() ? "qz: interrupted before both traces were compared"
+                                  : std::string("qz: ") + error.what());
+    return kNotRunnable;
+  }
+}
+
+}  // namespace qz::tools
