@@ -8,13 +8,14 @@ AUDIO ?= $(CLIP)
 # Parallelism is the builds' own; two set-ups at a time would fight over dpkg's lock.
 .NOTPARALLEL:
 
-.PHONY: help run test bench lint setup clean configure-host build-host build-target clip
+.PHONY: help run test bench footprint lint setup clean configure-host build-host build-target clip
 
 help:
 	@echo 'make run               build, then run the detector on a clip of recorded sound'
 	@echo 'make run AUDIO=FILE    the same on a sound file of your own'
 	@echo 'make test              build and test for this PC, for the device, under the sanitizers'
 	@echo 'make bench             time the kernels, the graphs and the whole program'
+	@echo 'make footprint         measure bytes, stack and instructions; compare with docs/footprint.md'
 	@echo 'make lint              check formatting and the rules of clang-tidy'
 	@echo 'make setup             install what is missing of the Debian packages for all this'
 	@echo 'make clean             remove everything that was built'
@@ -54,6 +55,11 @@ test: build-host build-target clip
 
 bench: build-host clip
 	scripts/bench.sh
+
+# UPDATE=1 commits to what is measured: rewrites docs/footprint.md.
+footprint: configure-host build-target
+	cmake --build --preset host --parallel $(JOBS) --target instruction_counter
+	scripts/footprint/footprint.py $(if $(UPDATE),--update)
 
 lint: build-host
 	@scripts/setup-debian.sh lint

@@ -6,6 +6,10 @@ find_package(Python3 REQUIRED COMPONENTS Interpreter)
 # Flags of everything: floats exactly as written, no warning let through.
 add_library(qz_flags INTERFACE)
 target_compile_options(qz_flags INTERFACE -ffp-contract=off -Wall -Wextra -Wshadow -Wundef -Werror)
+if(CMAKE_SYSTEM_PROCESSOR MATCHES "^arm")
+  # Nothing built here meets what compilers of ten years ago have built.
+  target_compile_options(qz_flags INTERFACE -Wno-psabi)
+endif()
 if(QZ_SANITIZE)
   # vptr checks need RTTI, which the module does without.
   set(sanitizers -fsanitize=address,undefined -fno-sanitize=vptr -fno-sanitize-recover=all)
@@ -21,6 +25,10 @@ target_compile_options(
   INTERFACE -fvisibility=hidden -fno-stack-protector -U_FORTIFY_SOURCE -fno-math-errno
             -fno-asynchronous-unwind-tables
             $<$<COMPILE_LANGUAGE:CXX>:-fno-exceptions -fno-rtti -fno-threadsafe-statics>)
+if(CMAKE_CROSSCOMPILING)
+  # Each function's stack and calls, in a file beside the object, for scripts/footprint.
+  target_compile_options(qz_module_flags INTERFACE -fcallgraph-info=su)
+endif()
 
 set(QZ_KERNELS plain CACHE STRING "Whose kernels: plain (any processor's) or neon (AArch32)")
 set_property(CACHE QZ_KERNELS PROPERTY STRINGS plain neon)

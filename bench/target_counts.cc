@@ -1,0 +1,157 @@
+// Runs a frame, a run of the network, a pass and a whole audio event on the device's processor,
+// each between two marks, for the instruction counter; scripts/footprint makes averages of them.
+// Prints a line for each kind, in the order of the marks: its name and how many pairs of marks it
+// has.
+//
+// The module's rooms are linked in, over a runtime that does next to nothing, so that its own
+// instructions hardly count.
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <cstdio>
+#include <cstring>
+#include <vector>
+
+#include "audio_classifier.h"
+#include "audio_frontend.h"
+#include "chre.h"
+#include "chrex.h"
+#include "instruction_mark.h"
+#include "mobilenet_backend.h"
+#include "nanoapp.h"
+#include "random.h"
+#include "sound_service.h"
+
+namespace {
+
+// The most that is held at a time: a message and a copy of it, and the list of clients.
+alignas(8) unsigned char heap[4][1024];
+bool taken[4];
+uint32_t reports;
+
+}  // namespace
+
+extern "C" {
+
+void chreLog(chreLogLevel, const char*, ...) {}
+void* chreHeapAlloc(uint32_t bytes) {
+  for (size_t i = 0; i < 4; ++i) {
+    if (taken[i] || bytes > sizeof heap[i]) continue;
+    taken[i] = true;
+    return heap[i];
+  }
+  return nullptr;
+}
+void chreHeapFree(void* block) {
+  for (size_t i = 0; i < 4; ++i) {
+    if (block == heap[i]) taken[i] = false;
+  }
+}
+uint64_t chreGetTime(void) { return 1; }
+int64_t chreGetEstimatedHostTimeOffset(void) { return 0; }
+bool chreSendEvent(uint16_t type, void* data, chreEventCompleteFunction* free_callback, uint32_t) {
+  ++reports;
+  free_callback(type, data);
+  return true;
+}
+bool chreSendMessageToHostEndpoint(void*, size_t, uint32_t, uint16_t, chreMessageFreeFunction*) {
+  return true;
+}
+bool chreAudioGetSource(uint32_t, chreAudioSource*) { return false; }
+bool chreAudioConfigureSource(uint32_t, bool, uint64_t, uint64_t) { return true; }
+bool chrexClockRateChangeRequest(uint32_t) { return true; }
+}
+
+namespace {
+
+using qz::frontend::kFrameSamples;
+using qz::test::Mark;
+
+constexpr size_t kPassSamples = 32000;
+constexpr size_t kWindowBytes = 382 * 48;
+// Whole periods of the cadence: 200 frames a pass and a run every 64 frames make 25 runs in 8.
+constexpr int kPasses = 8;
+constexpr int kFrames = 200;
+constexpr int kRuns = 8;
+
+// Noise that swells from silence to full scale and drops again twice a second, always the same:
+// what a frame costs depends a little on how loud it is.
+std::vector<int16_t> Sound() {
+  constexpr size_t kPeriod = 8000;
+  qz::test::Random random(1);
+  std::vector<int16_t> samples(kPassSamples * kPasses);
+  for (size_t i = 0; i < samples.size(); ++i) {
+    const int64_t peak = static_cast<int64_t>(i % kPeriod) * 32767 / kPeriod;
+    samples[i] = static_cast<int16_t>(random.Between(-peak, peak));
+  }
+  return samples;
+}
+
+template <typename Prepare, typename Work>
+void Count(const char* name, int times, Prepare prepare, Work work) {
+  for (int i = 0; i < times; ++i) {
+    prepare(i);
+    Mark();
+    work(i);
+    Mark();
+  }
+  std::printf("%s %d\n", name, times);
+}
+
+}  // namespace
+
+int main() {
+  const std::vector<int16_t> sound = Sound();
+  const auto nothing = [](int) {};
+  Mark();
+  Mark();  // the first marks pay for what is looked up once
+  Count("nothing", 1, nothing, nothing);
+
+  const auto fill_frame = [&](int i) {
+    std::memcpy(audio_frontend_input_ptr, sound.data() + i * 160, kFrameSamples * sizeof(int16_t));
+  };
+  const auto frame = [](int) { audio_frontend_invoke(); };
+  for (int i = 0; i < kFrames; ++i) {
+    fill_frame(i);
+    frame(i);
+  }
+  Count("frame", kFrames, fill_frame, frame);
+
+  const auto window = qz::test::Random(2).Fill<int8_t>(kWindowBytes, -128, 127);
+  const auto fill_window = [&](int) {
+    std::memcpy(mobilenet_backend_input_ptr, window.data(), kWindowBytes);
+  };
+  const auto run = [](int) { mobilenet_backend_invoke(); };
+  fill_window(0);
+  run(0);
+  Count("network_run", kRuns, fill_window, run);
+
+  tarn::contexthub::sound::AudioClassifier classifier;
+  const auto pass = [&](int i) {
+    tarn::contexthub::sound::ConfidenceEvent report[2] = {};
+    uint32_t version = 0;
+    classifier.Classify(sound.data() + i * kPassSamples, report, 2, &version);
+  };
+  for (int i = 0; i < kPasses; ++i) pass(i);
+  Count("pass", kPasses, nothing, pass);
+
+  // One client nanoapp, which gets a report an event.
+  nanoappStart();
+  nanoappHandleEvent(1, tarn::contexthub::sound::kSoundServiceRegisterEvent, nullptr);
+  const auto event = [&](int i) {
+    chreAudioDataEvent data = {};
+    data.sampleCount = kPassSamples;
+    data.samplesS16 = sound.data() + i * kPassSamples;
+    nanoappHandleEvent(0, CHRE_EVENT_AUDIO_DATA, &data);
+  };
+  for (int i = 0; i < kPasses; ++i) event(i);
+  reports = 0;
+  Count("event", kPasses, nothing, event);
+  nanoappEnd();
+  if (reports != kPasses) {
+    std::fprintf(stderr, "target_counts: %u reports, should be %d\n", reports, kPasses);
+    return 1;
+  }
+  return 0;
+}

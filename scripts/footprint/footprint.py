@@ -1,0 +1,142 @@
+#!/usr/bin/env python3
+"""Measures what the module takes of the device and holds it against the committed figures.
+
+Usage: footprint.py [--update] [--build FOLDER] [--counter FILE] [--page FILE]
+Exit code: 0 nothing grew, 1 something did or could not be measured."""
+
+import argparse
+import pathlib
+import subprocess
+import sys
+import tempfile
+
+sys.dont_write_bytecode = True
+
+import goals
+import page
+import stack
+from module_file import (CHANGING, CODE, CONSTANTS, Failure, ZERO, bytes_by_room, dynamic_symbols)
+
+ROOT = pathlib.Path(__file__).resolve().parents[2]
+PASS_S = 2
+FRAMES_A_PASS = 200
+RUNS_A_PASS = 25 / 8
+
+
+def instructions(build, counter):
+    """{what: instructions on average}, the marks' own taken off."""
+    counts = {}
+    with tempfile.TemporaryDirectory() as folder:
+        marks = pathlib.Path(folder, "marks")
+        program = ["qemu-arm", "-plugin", f"{counter},out={marks}", str(build / "bin/target_counts")]
+        printed = subprocess.run(program, check=True, text=True, stdout=subprocess.PIPE).stdout
+        counted = [int(line) for line in marks.read_text().split()]
+    spans = [b - a for a, b in zip(counted[2::2], counted[3::2])]
+    for line in printed.splitlines():
+        name, times = line.split()
+        own, spans = spans[:int(times)], spans[int(times):]
+        if len(own) != int(times):
+            raise Failure(f"{name}: {len(own)} spans between marks, should be {times}")
+        counts[name] = round(sum(own) / len(own) - counts.get("nothing", 0))
+    if spans or counts.keys() != {"nothing", "frame", "network_run", "pass", "event"}:
+        raise Failure(f"target_counts tells of {sorted(counts)} and {len(spans)} spans more")
+    return counts
+
+
+def short_table(total, counts, stacks):
+    def against(name, figure, limit):
+        return [name, figure, limit, "yes" if figure <= limit else "**no**"]
+
+    clock_khz = round(counts["pass"] / PASS_S / 1000)
+    data = total[CHANGING] + total[ZERO]
+    return page.Table(page.HEADLINE, ["Figure", "Now", "At most", "Reached"], [
+        against("Instructions a run of the network", counts["network_run"], goals.RUN_INSTRUCTIONS),
+        against("Instructions a frame of the front end", counts["frame"], goals.FRAME_INSTRUCTIONS),
+        ["Instructions a pass (2 s of sound)", counts["pass"], "", ""],
+        against("Clock for always-on use, kHz", clock_khz, goals.CLOCK_KHZ),
+        against("Code, bytes", total[CODE], goals.CODE_BYTES),
+        against("Constants, bytes", total[CONSTANTS], goals.CONSTANTS_BYTES),
+        against("Changing and zero data, bytes", data, goals.DATA_BYTES),
+        against("Stack of nanoappHandleEvent, bytes", stacks["nanoappHandleEvent"][0],
+                goals.STACK_BYTES),
+    ], "The clock is that of a processor that executes one instruction a cycle. A run of the network "
+       "would take\n930,000 instructions if each were 4 multiply-accumulates and nothing else were "
+       "to do.")
+
+
+def room_table(by_room, total):
+    rows = [[room, *figures.values()] for room, figures in by_room.items()]
+    return page.Table(
+        "Bytes by room", ["Room", *total], [*rows, ["**All**", *total.values()]],
+        "Changing data has values at load, zero data has none. nanopb and the compiler's library come "
+        "without\nsources; the stubs are those through which the runtime is called.")
+
+
+def linking_table(linking, imports, exports):
+    return page.Table("Dynamic linking", ["What", "Bytes", "Number"], [
+        ["Tables for the loader", linking, ""],
+        ["Imported functions", "", len(imports)],
+        ["Exported symbols", "", len(exports)],
+    ], "Loaded besides what the rooms bring.")
+
+
+def stack_table(stacks):
+    rows = [[name, size, " → ".join(path)] for name, (size, path) in stacks.items()]
+    return page.Table(
+        "Stack by entry point", ["Entry point", "Bytes", "Deepest way down"], rows,
+        "At most: the compiler's frames along the calls. Functions of the runtime count 0, for what they "
+        "use is\ntheir own.")
+
+
+def instruction_table(counts):
+    rest = counts["pass"] - FRAMES_A_PASS * counts["frame"] - RUNS_A_PASS * counts["network_run"]
+    return page.Table("Instructions", ["What", "Executed"], [
+        ["A frame of the front end", counts["frame"]],
+        ["A run of the network", counts["network_run"]],
+        ["A classification pass", counts["pass"]],
+        ["Of it, besides frames and runs", round(rest)],
+        ["A whole audio event, with the report to one client", counts["event"]],
+    ], "Averages over 200 frames, 8 runs, 8 passes (25 runs) and 8 events, after as many to warm up, with "
+       "what the\nC library executes for them.")
+
+
+def measure(build, counter):
+    module = build / "lib/qz.so"
+    map_text = (build / "lib/qz.map").read_text()
+    by_room, linking = bytes_by_room(module, map_text)
+    total = {kind: sum(figures[kind] for figures in by_room.values())
+             for kind in (CODE, CONSTANTS, CHANGING, ZERO)}
+    stacks = stack.measure(build, ROOT, module, map_text)
+    counts = instructions(build, counter)
+    return [short_table(total, counts, stacks), room_table(by_room, total),
+            linking_table(linking, *dynamic_symbols(module)), stack_table(stacks),
+            instruction_table(counts)]
+
+
+def main():
+    parser = argparse.ArgumentParser(description=__doc__.splitlines()[0])
+    parser.add_argument("--update", action="store_true", help="rewrite the page")
+    parser.add_argument("--build", type=pathlib.Path, default=ROOT / "build/target")
+    parser.add_argument("--counter", type=pathlib.Path,
+                        default=ROOT / "build/host/lib/instruction_counter.so")
+    parser.add_argument("--page", type=pathlib.Path, default=ROOT / "docs/footprint.md")
+    options = parser.parse_args()
+    try:
+        tables = measure(options.build.resolve(), options.counter.resolve())
+    except (Failure, OSError, subprocess.CalledProcessError) as failure:
+        sys.exit(f"footprint: {failure}")
+    text = page.render(tables)
+    print(text.removeprefix(page.INTRODUCTION).strip())
+    if options.update:
+        options.page.write_text(text)
+    committed = page.read(options.page.read_text()) if options.page.exists() else {}
+    faults = [*page.compare(committed, page.read(text)),
+              *page.check_copy((ROOT / "README.md").read_text(), committed, "README.md")]
+    for fault in faults:
+        print(f"footprint: {fault}", file=sys.stderr)
+    if faults:
+        sys.exit(1)
+
+
+if __name__ == "__main__":
+    main()
