@@ -56,15 +56,27 @@ uint32_t NormalisingShift(uint16_t peak) {
   return leading_zeros >= 17 ? static_cast<uint32_t>(leading_zeros - 17) : 0;
 }
 
+void CopyComplex(int16_t* to, const int16_t* from) { std::memcpy(to, from, kComplexBytes); }
+
 // Loads the 16 FFT entries from `first` on. Entry i receives complex value r of the frame, the four
-// base-4 digits of i in reverse order, and 0 where r lies past the frame's 200 values.
+// base-4 digits of i in reverse order, and 0 where r lies past the frame's 200 values. The last
+// digit of i weighs 64 in r and the one before it 16, so that of the entries whose last digit is 3
+// only the first of a block can lie inside.
 void LoadDigitReversed(const int16_t* frame, size_t first, int16_t* block) {
+  static_assert(kFrameSamples / 2 > 128 + 63 && kFrameSamples / 2 <= 192 + 16);
   const size_t low_digits = (first / 64) + (first / 16 % 4) * 4;
-  for (size_t i = 0; i < 16; ++i) {
-    const size_t r = (i % 4) * 64 + (i / 4) * 16 + low_digits;
-    const bool inside = 2 * r < kFrameSamples;
-    block[2 * i] = inside ? frame[2 * r] : int16_t{0};
-    block[2 * i + 1] = inside ? frame[2 * r + 1] : int16_t{0};
+  const int16_t* values = frame + 2 * low_digits;
+  for (size_t digit = 0; digit < 4; ++digit) {
+    CopyComplex(block, values);
+    CopyComplex(block + 2, values + 2 * 64);
+    CopyComplex(block + 4, values + 2 * 128);
+    if (digit == 0 && 192 + low_digits < kFrameSamples / 2) {
+      CopyComplex(block + 6, values + 2 * 192);
+    } else {
+      std::memset(block + 6, 0, kComplexBytes);
+    }
+    values += 2 * 16;
+    block += 8;
   }
 }
 

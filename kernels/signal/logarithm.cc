@@ -12,10 +12,10 @@ constexpr uint64_t kLn2 = 45426;  // ln 2, Q16
 // the step to the segment's other end, 512 further (9 would interpolate): the results are defined
 // that way.
 inline uint32_t Log2(uint32_t y) {
-  const uint32_t exponent = 31 - static_cast<uint32_t>(__builtin_clz(y));
-  const uint32_t mantissa = y - (1u << exponent);
-  const uint32_t fraction =
-      exponent < 16 ? mantissa << (16 - exponent) : mantissa >> (exponent - 16);
+  const uint32_t leading_zeros = static_cast<uint32_t>(__builtin_clz(y));
+  const uint32_t exponent = 31 - leading_zeros;
+  // The 16 bits behind the leading one, which the second shift drops.
+  const uint32_t fraction = (y << leading_zeros << 1) >> 16;
   const uint32_t segment = fraction >> 9;
   const int32_t offset = static_cast<int32_t>(fraction & 511);
   const int32_t low = vrd_table_vlog[segment];

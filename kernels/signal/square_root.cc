@@ -18,20 +18,15 @@ inline uint32_t Truncated(double x) {
 
 // r is the root of v when r^2 - r < v <= r^2 + r. The truncated root t is at most one step away;
 // the differences are taken modulo 2^64 and read as signed.
-inline uint64_t NearestRoot(uint64_t v) {
+inline uint32_t NearestRoot(uint64_t v) {
   if (v == 0) return 0;
-  const uint64_t t = Truncated(std::sqrt(ToDouble(v)));
-  const uint64_t excess = t * t - v;
-  uint64_t root = t;
+  const uint32_t t = Truncated(std::sqrt(ToDouble(v)));
+  const uint64_t excess = uint64_t{t} * t - v;
   if (static_cast<int64_t>(excess + t) < 0) {
-    root = t + 1;
-  } else if (static_cast<int64_t>(excess - t) >= 0) {
-    root = t - 1;
+    // Roots of 32-bit values stay within 16 bits, and all within 32.
+    return t == 65535 || t == UINT32_MAX ? t : t + 1;
   }
-  if (root > UINT32_MAX) return UINT32_MAX;
-  // The root of a 32-bit value stays within 16 bits, also where the nearest integer would be 65536.
-  if (root == 65536 && v <= UINT32_MAX) return 65535;
-  return root;
+  return static_cast<int64_t>(excess - t) >= 0 ? t - 1 : t;
 }
 
 }  // namespace
@@ -39,7 +34,7 @@ inline uint64_t NearestRoot(uint64_t v) {
 extern "C" void orra_u64_u32_vsqrtshift_ukernel__scalar_cvtu32_sqrt_cvtu32f64_x1(
     size_t bytes, const uint64_t* input, uint32_t* output, uint32_t shift) {
   for (size_t i = 0; i < bytes / sizeof(uint64_t); ++i) {
-    const uint32_t root = static_cast<uint32_t>(NearestRoot(input[i]));
+    const uint32_t root = NearestRoot(input[i]);
     output[i] = shift < 32 ? root >> shift : 0;
   }
 }
