@@ -8,7 +8,7 @@ AUDIO ?= $(CLIP)
 # Parallelism is the builds' own; two set-ups at a time would fight over dpkg's lock.
 .NOTPARALLEL:
 
-.PHONY: help run test bench footprint lint setup clean configure-host build-host build-target clip
+.PHONY: help run test bench footprint kernel-gains lint setup clean configure-host build-host build-target clip
 
 help:
 	@echo 'make run               build, then run the detector on a clip of recorded sound'
@@ -16,6 +16,7 @@ help:
 	@echo 'make test              build and test for this PC, for the device, under the sanitizers'
 	@echo 'make bench             time the kernels, the graphs and the whole program'
 	@echo 'make footprint         measure bytes, stack and instructions; compare with docs/footprint.md'
+	@echo 'make kernel-gains      instructions of each kernel: its plain text, and the one that runs'
 	@echo 'make lint              check formatting and the rules of clang-tidy'
 	@echo 'make setup             install what is missing of the Debian packages for all this'
 	@echo 'make clean             remove everything that was built'
@@ -61,7 +62,11 @@ footprint: configure-host build-target
 	cmake --build --preset host --parallel $(JOBS) --target instruction_counter
 	scripts/footprint/footprint.py $(if $(UPDATE),--update)
 
-lint: build-host
+kernel-gains: configure-host build-target
+	cmake --build --preset host --parallel $(JOBS) --target instruction_counter
+	scripts/kernel-gains.py
+
+lint: build-host build-target
 	@scripts/setup-debian.sh lint
 	scripts/lint.sh
 

@@ -34,6 +34,8 @@ static inline OutputRange RangeOf(const orra_fp32_requant_params& params) {
           static_cast<float>(std::clamp<int32_t>(INT16_MAX, low, high)), zero_point};
 }
 
+constexpr float kRoundingTerm = 12582912.0f;  // 1.5 * 2^23
+
 // Clamped first, the value lies within +-2^15 (or, by a zero point beyond int8, +-2^16), where
 // adding 1.5 * 2^23 rounds it to an integer, ties to even, as floats have a spacing of 1 there. The
 // sum's bits then count up from those of 1.5 * 2^23, of which the low byte is 0: the low byte of
@@ -42,7 +44,7 @@ static inline int8_t RequantiseFp32(uint32_t accumulator, float scale, OutputRan
   float value = static_cast<float>(static_cast<int32_t>(accumulator)) * scale;
   value = value > range.low ? value : range.low;
   value = value < range.high ? value : range.high;
-  const float rounded = value + 12582912.0f;
+  const float rounded = value + kRoundingTerm;
   int32_t bits;
   std::memcpy(&bits, &rounded, sizeof bits);
   return static_cast<int8_t>(bits + range.zero_point);

@@ -10,7 +10,6 @@ namespace qz::test {
 namespace {
 
 using ::testing::ElementsAre;
-using ::testing::IsEmpty;
 using ::testing::UnorderedElementsAre;
 
 class ModuleFile : public testing::Test {

@@ -25,7 +25,10 @@ inline ComplexLanes Load(const int16_t* four) {
   return {parts.val[0], parts.val[1]};
 }
 
-inline void Store(int16_t* four, ComplexLanes a) { vst2_s16(four, int16x4x2_t{{a.re, a.im}}); }
+inline void Store(int16_t* four, ComplexLanes a) {
+  const int16x4x2_t parts = {{a.re, a.im}};
+  vst2_s16(four, parts);
+}
 
 inline ComplexLanes Reversed(ComplexLanes a) { return {vrev64_s16(a.re), vrev64_s16(a.im)}; }
 

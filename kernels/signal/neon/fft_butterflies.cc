@@ -64,7 +64,8 @@ inline void FirstStageButterflies(int16_t* x) {
                                     vadd_s16(vget_high_s16(s1), vget_low_s16(s3)));
   const int16x8x2_t y02 = vzipq_s16(vaddq_s16(s0, s2), vsubq_s16(s0, s2));
   const int16x8x2_t y13 = vzipq_s16(y1, y3);
-  vst4q_s16(x, int16x8x4_t{{y02.val[0], y02.val[1], y13.val[0], y13.val[1]}});
+  const int16x8x4_t sums = {{y02.val[0], y02.val[1], y13.val[0], y13.val[1]}};
+  vst4q_s16(x, sums);
 }
 
 // Four twiddles that lie `stride` int16 apart.

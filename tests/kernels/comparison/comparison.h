@@ -30,7 +30,7 @@ struct Kernel {
 // `run` is a template over the function that it calls. The plain text has to be declared:
 // extern "C" { decltype(name) name__plain; }
 #define QZ_KERNEL(name, text, compare, run) \
-  { #name, text, compare, run < name>, run < name##__plain> }
+  { #name, text, compare, run < (name)>, run < (name##__plain)> }
 
 std::vector<Kernel> SignalKernels();
 std::vector<Kernel> QuantisedKernels();
