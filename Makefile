@@ -57,7 +57,7 @@ test: build-host build-target clip
 bench: build-host clip
 	scripts/bench.sh
 
-# UPDATE=1 commits to what is measured: rewrites docs/footprint.md.
+# UPDATE=1 commits to what is measured: rewrites docs/footprint.md and the README's table.
 footprint: configure-host build-target
 	cmake --build --preset host --parallel $(JOBS) --target instruction_counter
 	scripts/footprint/footprint.py $(if $(UPDATE),--update)

@@ -127,11 +127,13 @@ def main():
         sys.exit(f"footprint: {failure}")
     text = page.render(tables)
     print(text.removeprefix(page.INTRODUCTION).strip())
+    readme = ROOT / "README.md"
     if options.update:
         options.page.write_text(text)
+        readme.write_text(page.renew_copy(readme.read_text(), tables[0]))
     committed = page.read(options.page.read_text()) if options.page.exists() else {}
     faults = [*page.compare(committed, page.read(text)),
-              *page.check_copy((ROOT / "README.md").read_text(), committed, "README.md")]
+              *page.check_copy(readme.read_text(), committed, readme.name)]
     for fault in faults:
         print(f"footprint: {fault}", file=sys.stderr)
     if faults:

@@ -13,7 +13,8 @@ INTRODUCTION = """# Footprint
 What the module takes of the device: bytes, stack and instructions, of the build for the hub's own
 processor. `make footprint` measures all of it anew and fails when a figure is more than 2 % (and,
 of bytes, more than 16) above the one that stands here; `make footprint UPDATE=1` rewrites this page,
-which scripts/footprint made. Instructions are counted under emulation, the same on every machine.
+which scripts/footprint made, and the copy of its first table in the README. Instructions are counted
+under emulation, the same on every machine.
 """
 
 
@@ -79,6 +80,13 @@ def compare(committed, measured):
 
 
 BEGIN, END = "<!-- footprint -->", "<!-- end of footprint -->"
+
+
+def renew_copy(text, table):
+    """Another page with the short table as it is now between its two marks, if it has them."""
+    before, begin, rest = text.partition(BEGIN)
+    _, end, after = rest.partition(END)
+    return before + "\n".join([begin, *table.lines(), end]) + after if end else text
 
 
 def check_copy(text, committed, name):
