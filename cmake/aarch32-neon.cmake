@@ -8,6 +8,9 @@ set(CMAKE_SYSTEM_PROCESSOR armv8)
 # The folder is known to the first run only; nested ones, which try the compiler, are told.
 set(QZ_SYSROOT "${CMAKE_SOURCE_DIR}/build/sysroot-armhf" CACHE PATH "Libraries of the processor")
 list(APPEND CMAKE_TRY_COMPILE_PLATFORM_VARIABLES QZ_SYSROOT)
+if(NOT EXISTS "${QZ_SYSROOT}/packages")
+  message(FATAL_ERROR "${QZ_SYSROOT} is missing or not complete: run scripts/make-sysroot.sh \"${QZ_SYSROOT}\"")
+endif()
 set(CMAKE_SYSROOT ${QZ_SYSROOT})
 
 set(CMAKE_C_COMPILER arm-linux-gnueabihf-gcc)

@@ -25,7 +25,7 @@ target_compile_options(
   INTERFACE -fvisibility=hidden -fno-stack-protector -U_FORTIFY_SOURCE -fno-math-errno
             -fno-asynchronous-unwind-tables
             $<$<COMPILE_LANGUAGE:CXX>:-fno-exceptions -fno-rtti -fno-threadsafe-statics>)
-if(CMAKE_CROSSCOMPILING)
+if(CMAKE_CROSSCOMPILING AND CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
   # Each function's stack and calls, in a file beside the object, for scripts/footprint.
   target_compile_options(qz_module_flags INTERFACE -fcallgraph-info=su)
 endif()
@@ -50,7 +50,7 @@ endfunction()
 function(qz_kernel_room name)
   cmake_parse_arguments(room "" "" "TEXTS;TABLES" ${ARGN})
   foreach(row IN LISTS room_TEXTS)
-    string(REGEX MATCHALL "[a-z0-9_]+" words "${row}")
+    separate_arguments(words UNIX_COMMAND "${row}")
     list(POP_FRONT words text)
     list(APPEND plain ${text}.cc)
     if(QZ_KERNELS IN_LIST words)
@@ -63,7 +63,7 @@ function(qz_kernel_room name)
   qz_module_room(${name} SOURCES ${running} ${room_TABLES})
   set_property(TARGET ${name} PROPERTY VECTOR_TEXTS "${vector_texts}")
   qz_module_room(${name}_plain SOURCES ${plain} LINKS ${name})
-  target_compile_options(${name}_plain PRIVATE "SHELL:-include ${CMAKE_SOURCE_DIR}/kernels/plain_names.h")
+  target_compile_options(${name}_plain PRIVATE "SHELL:-include \"${CMAKE_SOURCE_DIR}/kernels/plain_names.h\"")
 endfunction()
 
 # qz_room(NAME SOURCES... LINKS...): a room of the PC side, as a static library.

@@ -106,7 +106,7 @@ def read_compiler_files(build, module, map_text):
         paths = [path for path in files[piece.object] if path.exists()]
         if len(paths) != 1:
             raise Failure(f"{len(paths)} files of stack figures for {' '.join(piece.object)}, "
-                          "should be one: was it compiled with -fcallgraph-info=su?")
+                          "should be one: compile it anew, with -fcallgraph-info=su")
         figures = read_compiler_file(paths[0].read_text())
         here = [f for f in functions if piece.address <= f.address < piece.address + piece.bytes]
         found.update((f.address, figures[f.name]) for f in here if f.name in figures)

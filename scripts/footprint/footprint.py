@@ -45,9 +45,13 @@ def instructions(build, counter):
 
 def short_table(total, counts, stacks):
     def against(name, figure, limit):
-        return [name, figure, limit, "yes" if figure <= limit else "**no**"]
+        if figure <= limit:
+            return [name, figure, limit, "yes"]
+        if name not in goals.MISSED:
+            raise Failure(f"{name}: {figure:,}, should be at most {limit:,}, or its reason in goals.MISSED")
+        return [name, figure, limit, f"no: {goals.MISSED[name]}"]
 
-    clock_khz = round(counts["pass"] / PASS_S / 1000)
+    clock_khz = round(counts["event"] / PASS_S / 1000)
     data = total[CHANGING] + total[ZERO]
     return page.Table(page.HEADLINE, ["Figure", "Now", "At most", "Reached"], [
         against("Instructions a run of the network", counts["network_run"], goals.RUN_INSTRUCTIONS),
@@ -59,9 +63,9 @@ def short_table(total, counts, stacks):
         against("Changing and zero data, bytes", data, goals.DATA_BYTES),
         against("Stack of nanoappHandleEvent, bytes", stacks["nanoappHandleEvent"][0],
                 goals.STACK_BYTES),
-    ], "The clock is that of a processor that executes one instruction a cycle. A run of the network "
-       "would take\n930,000 instructions if each were 4 multiply-accumulates and nothing else were "
-       "to do.")
+    ], "The clock is that of a processor that executes one instruction a cycle, whole audio events. A "
+       "run of the\nnetwork would take 930,000 instructions if each were 4 multiply-accumulates and "
+       "nothing else were to do.")
 
 
 def room_table(by_room, total):
@@ -96,7 +100,7 @@ def instruction_table(counts):
         ["A classification pass", counts["pass"]],
         ["Of it, besides frames and runs", round(rest)],
         ["A whole audio event, with the report to one client", counts["event"]],
-    ], "Averages over 200 frames, 8 runs, 8 passes (25 runs) and 8 events, after as many to warm up, with "
+    ], "Averages over 200 frames, 8 runs, 8 passes (25 runs) and 8 events, after some to warm up, with "
        "what the\nC library executes for them.")
 
 

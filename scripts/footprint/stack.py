@@ -48,20 +48,19 @@ class Functions:
         return found
 
 
-def stated_in_sources(places, source_root, functions, used):
+def stated_in_sources(places, functions, used):
     """What the indirect calls at these places of our sources reach."""
     reached = set()
     for place in places:
         path, line, _ = place.rsplit(":", 2)
-        inside = pathlib.Path(path).relative_to(source_root).as_posix()
         text = pathlib.Path(path).read_text().splitlines()[int(line) - 1]
         rows = [row for row in stated_calls.INDIRECT_IN_SOURCES
-                if row[0] == inside and row[1] in text]
+                if path.endswith("/" + row[0]) and row[1] in text]
         if len(rows) != 1:
-            raise Failure(f"{inside}:{line}: where does this indirect call go? It needs a row "
+            raise Failure(f"{path}:{line}: where does this indirect call go? It needs a row "
                           f"in INDIRECT_IN_SOURCES: {text.strip()}")
-        used.add(rows[0][:2])
-        for name in rows[0][2]:
+        used.setdefault(rows[0][:2], set()).add(place)
+        for name in rows[0][3]:
             table = name.removeprefix("table ")
             reached.update(functions.named(name) if table == name else functions.in_table(table))
     return reached
@@ -76,7 +75,7 @@ def stated_in_libraries(function, used):
     if len(rows) != 1:
         raise Failure(f"{function.name}: {function.indirect} indirect calls; where do they go? "
                       "They need a row in INDIRECT_IN_LIBRARIES")
-    used.add(rows[0][:2])
+    used[rows[0][:2]] = set()
     return rows[0][2]
 
 
@@ -106,13 +105,13 @@ def limits_of_recursion(proto_text, functions):
             for address in functions.named(name)}
 
 
-def call_graph(build, source_root, module, map_text):
+def call_graph(build, module, map_text):
     """{address: Node} of every function of the module, and Functions. Under the negative address the
     function stands alone: when nothing that it could call is called."""
     code = read_code(module)
     compiled = read_compiler_files(build, module, map_text)
     functions = Functions(module, code)
-    nodes, used = {}, set()
+    nodes, used = {}, {}  # used: {row: its places}
     for address, function in code.items():
         calls = {functions.holding(target) for target in function.targets} - {None, address}
         calls |= {address} & function.returning
@@ -123,7 +122,7 @@ def call_graph(build, source_root, module, map_text):
                 raise Failure(f"{function.name}: the compiler tells of {frame} bytes of stack and "
                               f"{len(places)} indirect calls, its code of {function.frame} and "
                               f"{function.indirect}")
-            calls |= stated_in_sources(places, source_root, functions, used)
+            calls |= stated_in_sources(places, functions, used)
         else:
             frame = function.frame
             for name in stated_in_libraries(function, used):
@@ -135,14 +134,17 @@ def call_graph(build, source_root, module, map_text):
         nodes[-address] = Node(name, frame, set())
     stated = {row[:2] for row in
               stated_calls.INDIRECT_IN_SOURCES + stated_calls.INDIRECT_IN_LIBRARIES}
-    if stale := stated - used:
+    if stale := stated - used.keys():
         raise Failure(f"stated indirect calls that the module does not have: {sorted(stale)}")
+    for *row, places, _ in stated_calls.INDIRECT_IN_SOURCES:
+        if len(used[tuple(row)]) != places:
+            raise Failure(f"{row[0]}: {row[1]}: {len(used[tuple(row)])} indirect calls, stated: {places}")
     return nodes, functions
 
 
 def measure(build, source_root, module, map_text):
     """{entry point: (bytes, [names along the deepest way down])}"""
-    nodes, functions = call_graph(build, source_root, module, map_text)
+    nodes, functions = call_graph(build, module, map_text)
     proto = pathlib.Path(source_root, "proto/sound_detection.proto").read_text()
     limits = limits_of_recursion(proto, functions)
     return {entry: deepest(nodes, functions.named(entry)[0], limits)

@@ -8,14 +8,14 @@ ENTRY_POINTS = ["nanoappStart", "nanoappHandleEvent", "nanoappEnd",
 # Imported functions run on the runtime's account: their stack counts 0 here.
 RUNTIME = []
 
-# In our own sources: file, text in the line of the call, functions that it may reach.
-# "table NAME" stands for every function in that constant table.
+# In our own sources: end of the file's path, text in the line of the call, in how many places it
+# stands, functions that it may reach. "table NAME" stands for every function in that constant table.
 INDIRECT_IN_SOURCES = [
-    ("app/audio_binding.cc", "funcPtr(", RUNTIME),
-    ("classifier/detection.cc", "listener_->OnSoundDetectionEvent(",
+    ("app/audio_binding.cc", "funcPtr(", 2, RUNTIME),
+    ("classifier/detection.cc", "listener_->OnSoundDetectionEvent(", 1,
      ["AppManager::OnSoundDetectionEvent"]),
-    ("network/mobilenet_backend.cc", ".run()", ["table kOperators"]),
-    ("platform/chre/singleton.h", "->~T()", ["AppManager::~AppManager"]),
+    ("network/mobilenet_backend.cc", "each.run()", 1, ["table kOperators"]),
+    ("chre/singleton.h", "->~T()", 1, ["AppManager::~AppManager"]),
 ]
 
 # The three functions that our messages give to nanopb. They only encode: no message that is decoded
