@@ -45,21 +45,31 @@ endfunction()
 # qz_kernel_room(NAME TEXTS rows... TABLES sources...): a room of kernels. A row names a text, NAME.cc,
 # and then the processors for which there is another, PROCESSOR/NAME.cc, that gives the same bytes.
 # Two libraries: NAME holds what runs in this build (its property VECTOR_TEXTS lists the texts that are
-# not plain); NAME_plain the plain texts, always, under names
-# with __plain behind them, for those who compare.
+# not plain); NAME_plain holds the plain texts, always, under names with __plain behind them, for those
+# who compare.
 function(qz_kernel_room name)
   cmake_parse_arguments(room "" "" "TEXTS;TABLES" ${ARGN})
+  file(GLOB unnamed RELATIVE ${CMAKE_CURRENT_SOURCE_DIR} */*.cc)
   foreach(row IN LISTS room_TEXTS)
-    separate_arguments(words UNIX_COMMAND "${row}")
-    list(POP_FRONT words text)
+    separate_arguments(processors UNIX_COMMAND "${row}")
+    list(POP_FRONT processors text)
+    foreach(processor IN LISTS processors)
+      if(NOT ${processor}/${text}.cc IN_LIST unnamed)
+        message(FATAL_ERROR "${name}: the row '${row}' names ${processor}/${text}.cc, which does not exist")
+      endif()
+      list(REMOVE_ITEM unnamed ${processor}/${text}.cc)
+    endforeach()
     list(APPEND plain ${text}.cc)
-    if(QZ_KERNELS IN_LIST words)
+    if(QZ_KERNELS IN_LIST processors)
       list(APPEND running ${QZ_KERNELS}/${text}.cc)
       list(APPEND vector_texts ${text})
     else()
       list(APPEND running ${text}.cc)
     endif()
   endforeach()
+  if(unnamed)
+    message(FATAL_ERROR "${name}: no row names ${unnamed}")
+  endif()
   qz_module_room(${name} SOURCES ${running} ${room_TABLES})
   set_property(TARGET ${name} PROPERTY VECTOR_TEXTS "${vector_texts}")
   qz_module_room(${name}_plain SOURCES ${plain} LINKS ${name})
