@@ -4,7 +4,6 @@
 #include <cxxabi.h>
 #include <link.h>
 
-#include <algorithm>
 #include <cstdlib>
 #include <cstring>
 #include <fstream>
@@ -51,15 +50,23 @@ class ElfFile {
     return symbols;
   }
 
-  // Names of the libraries that it asks for.
-  std::set<std::string> Needed() const {
+  // What the loader is told under a tag such as DT_NEEDED, of those that name a file or folder.
+  std::set<std::string> Told(int tag) const {
     const Section& section = sections.at(".dynamic");
     std::set<std::string> names;
     for (size_t i = 0; i < section.sh_size / sizeof(ElfW(Dyn)); ++i) {
       const auto entry = At<ElfW(Dyn)>(section.sh_offset + i * sizeof(ElfW(Dyn)));
-      if (entry.d_tag == DT_NEEDED) names.insert(String(sections.at(".dynstr"), entry.d_un.d_val));
+      if (entry.d_tag == tag) names.insert(String(sections.at(".dynstr"), entry.d_un.d_val));
     }
     return names;
+  }
+
+  // The one segment of a type; an empty one if there is none.
+  Segment SegmentOf(unsigned type) const {
+    for (const Segment& segment : segments) {
+      if (segment.p_type == type) return segment;
+    }
+    return {};
   }
 
   // `size` bytes of the file that are loaded at an address.

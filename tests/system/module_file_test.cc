@@ -82,25 +82,25 @@ TEST_F(ModuleFile, ImportsTheRuntimeAndLittleElse) {
       ElementsAre("chreGetEstimatedHostTimeOffset", "chreGetTime", "chreHeapAlloc", "chreHeapFree",
                   "chreLog", "chreSendEvent", "chreSendMessageToHostEndpoint",
                   "chrexClockRateChangeRequest", "dlsym", "memcpy", "memmove", "memset"));
-  EXPECT_THAT(file_.Needed(), ElementsAre("libc.so.6", "libchre_runtime.so"));
+  EXPECT_THAT(file_.Told(DT_NEEDED), ElementsAre("libc.so.6", "libchre_runtime.so"));
+  // No folder of the machine that built it.
+  EXPECT_THAT(file_.Told(DT_RUNPATH), ElementsAre("$ORIGIN"));
 }
 
-TEST_F(ModuleFile, RunsNothingAtLoad) {
+TEST_F(ModuleFile, RunsNothingAtLoadAndUnwindsNothing) {
   for (const char* name : {".init", ".init_array", ".preinit_array", ".ctors", ".fini",
-                           ".fini_array", ".tdata", ".tbss"}) {
+                           ".fini_array", ".tdata", ".tbss", ".gcc_except_table", ".ARM.exidx"}) {
     EXPECT_EQ(file_.sections.count(name), 0u) << name;
   }
 }
 
 TEST_F(ModuleFile, KeepsAllButItsStateReadOnly) {
-  const auto relro =
-      std::find_if(file_.segments.begin(), file_.segments.end(),
-                   [](const ElfFile::Segment& s) { return s.p_type == PT_GNU_RELRO; });
-  ASSERT_NE(relro, file_.segments.end());
+  EXPECT_EQ(file_.SegmentOf(PT_GNU_STACK).p_flags, ElfW(Word){PF_R | PF_W});
+  const ElfFile::Segment relro = file_.SegmentOf(PT_GNU_RELRO);
   std::set<std::string> writable;
   for (const auto& [name, section] : file_.sections) {
-    const bool after_load = section.sh_addr < relro->p_vaddr ||
-                            section.sh_addr + section.sh_size > relro->p_vaddr + relro->p_memsz;
+    const bool after_load = section.sh_addr < relro.p_vaddr ||
+                            section.sh_addr + section.sh_size > relro.p_vaddr + relro.p_memsz;
     if ((section.sh_flags & SHF_WRITE) != 0 && after_load) writable.insert(name);
   }
   EXPECT_THAT(writable, ElementsAre(".bss"));
