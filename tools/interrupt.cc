@@ -29,6 +29,11 @@ void CatchInterrupt() {
   action.sa_handler = OnInterrupt;
   action.sa_flags = SA_RESETHAND;
   sigaction(SIGINT, &action, nullptr);
+  sigaction(SIGTERM, &action, nullptr);
+  // Who had it ignored wants the program to outlive its terminal.
+  struct sigaction before = {};
+  sigaction(SIGHUP, nullptr, &before);
+  if (before.sa_handler != SIG_IGN) sigaction(SIGHUP, &action, nullptr);
 }
 
 bool Interrupted() { return interrupted != 0; }

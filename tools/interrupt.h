@@ -1,4 +1,5 @@
-// Ctrl-C as a request to end: the first one asks, a second one kills.
+// Ctrl-C, a request to terminate and the loss of the terminal, as requests to end: the first of
+// each asks, a second one kills.
 #pragma once
 
 namespace qz::tools {

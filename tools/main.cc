@@ -44,13 +44,14 @@ std::vector<std::string> DefaultBuilds() {
 }
 
 template <typename Options>
-void AddFileAndClients(CLI::App* command, Options* options, const std::string& about_file) {
+void AddFileAndClients(CLI::App* command, Options* options, const std::string& about_file,
+                       int least_client_nanoapps) {
   command->add_option("FILE", options->file, about_file)->required();
   command->add_option("--host-clients", options->host_clients, "Host clients to connect")
       ->check(CLI::Range(0, kMostClients))
       ->capture_default_str();
   command->add_option("--client-nanoapps", options->client_nanoapps, "Client nanoapps to register")
-      ->check(CLI::Range(0, kMostClients))
+      ->check(CLI::Range(least_client_nanoapps, kMostClients))
       ->capture_default_str();
 }
 
@@ -58,7 +59,8 @@ CLI::App* AddRun(CLI::App* app, RunOptions* options, std::string* log_level) {
   CLI::App* run =
       app->add_subcommand("run", "Play a sound file to the detector, print its reports");
   AddFileAndClients(run, options,
-                    "WAV, FLAC, OGG, ...; - is standard input, read to its end first unless --raw");
+                    "WAV, FLAC, OGG, ...; - is standard input, read to its end first unless --raw",
+                    /*least_client_nanoapps=*/0);
   run->add_flag("--raw", options->raw, "FILE is headerless 16-bit little-endian mono at 16 kHz");
   run->add_option("--log-level", *log_level, "What to show of the detector's log")
       ->check(CLI::IsMember(kLogLevels))
@@ -71,8 +73,11 @@ CLI::App* AddRun(CLI::App* app, RunOptions* options, std::string* log_level) {
 
 CLI::App* AddProve(CLI::App* app, ProveOptions* options) {
   CLI::App* prove = app->add_subcommand(
-      "prove", "Play a sound file to the detector of two builds, compare all that they compute");
-  AddFileAndClients(prove, options, "WAV, FLAC, OGG, ...; - is standard input");
+      "prove",
+      "Play a sound file to the detector of two builds, compare all that they say and compute");
+  // Without any the detector takes no audio, and nothing is computed.
+  AddFileAndClients(prove, options, "WAV, FLAC, OGG, ...; - is standard input",
+                    /*least_client_nanoapps=*/1);
   prove
       ->add_option("BUILDS", options->builds,
                    "Two build folders (default: this program's own, and target beside it)")

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cstdio>
+#include <filesystem>
 
 #include "audio_input.h"
 #include "buffer_cutter.h"
@@ -19,19 +20,20 @@ using trace::Kind;
 
 // The audio of a file as the builds get it: whole buffers, the last one filled up with silence.
 struct RawAudio {
-  FileDescriptor file;
-  uint64_t samples;
+  NamedTemporaryFile file;
+  uint64_t buffers = 0;
 };
 
-RawAudio Decode(AudioInput* input) {
-  RawAudio audio{OpenTemporaryFile(), 0};
-  BufferCutter cutter([&audio](const int16_t* buffer) {
-    WriteToTemporaryFile(audio.file, buffer, kBufferSamples * sizeof(int16_t));
-    audio.samples += kBufferSamples;
+void Decode(AudioInput* input, RawAudio* audio) {
+  BufferCutter cutter([audio](const int16_t* buffer) {
+    WriteToTemporaryFile(audio->file.descriptor(), buffer, kBufferSamples * sizeof(int16_t));
+    ++audio->buffers;
   });
-  while (const size_t got = input->Read(cutter.room(), cutter.room_samples())) cutter.Commit(got);
+  while (const size_t got = input->Read(cutter.room(), cutter.room_samples())) {
+    if (Interrupted()) throw BuildError("interrupted");
+    cutter.Commit(got);
+  }
   cutter.Finish();
-  return audio;
 }
 
 std::string Grouped(uint64_t number) {
@@ -57,13 +59,15 @@ void PrintTallies(const Comparison& comparison, Console* console) {
   print(Kind::kOperatorOutput, trace::kLinkedNanoapp,
         "outputs of " + std::to_string(trace::kOperatorsPerRun) + " operators in ", " network runs",
         trace::kOperatorsPerRun);
+  print(Kind::kMemory, trace::kLoadedModule, "memory of the module after ", " buffers",
+        trace::kWatchedObjectCount);
   print(Kind::kHostMessage, trace::kLoadedModule, "", " messages to hosts", 1);
   print(Kind::kClientEvent, trace::kLoadedModule, "", " reports", 1);
   print(Kind::kLogLine, trace::kLoadedModule, "", " log lines", 1);
 }
 
 // Reads both traces in step up to their ends or the first difference, which is returned.
-std::string FirstDifference(TracedBuild* first, TracedBuild* second, uint64_t samples,
+std::string FirstDifference(TracedBuild* first, TracedBuild* second, uint64_t buffers,
                             Comparison* comparison, Console* console) {
   trace::Record first_record;
   trace::Record second_record;
@@ -73,12 +77,20 @@ std::string FirstDifference(TracedBuild* first, TracedBuild* second, uint64_t sa
     std::string difference = comparison->Compare(first_record, second_record);
     if (!difference.empty()) return difference;
     // The audio is played to two nanoapps, one after the other.
-    console->Progress(comparison->buffers_played() * kBufferSamples / 2, samples);
+    console->Progress(comparison->buffers_played() * kBufferSamples / 2, buffers * kBufferSamples);
   } while (first_record.kind != Kind::kEnd);
   return {};
 }
 
-ExitCode Conclude(const Comparison& comparison, const ProveOptions& options, Console* console) {
+// Of two traces that are equal.
+ExitCode Conclude(const Comparison& comparison, const ProveOptions& options, uint64_t buffers,
+                  Console* console) {
+  if (comparison.buffers_played() != 2 * buffers) {
+    console->Message("qz: the builds played " + Grouped(comparison.buffers_played()) +
+                     " buffers of audio each, should be " + Grouped(2 * buffers) +
+                     ": all of the file's, once to each nanoapp");
+    return kNotRunnable;
+  }
   const std::string apart = comparison.NanoappsDiffer();
   if (!apart.empty()) {
     console->Data("the builds give the same, but what was loaded and what was observed do not: " +
@@ -86,26 +98,28 @@ ExitCode Conclude(const Comparison& comparison, const ProveOptions& options, Con
     return kFaultFound;
   }
   if (comparison.tally(trace::kLinkedNanoapp, Kind::kFeatures).records == 0) {
-    console->Message("qz: nothing was computed: no client, so the detector took no audio");
+    console->Message("qz: nothing was computed: the detectors took none of " + Grouped(buffers) +
+                     " buffers of audio");
     return kFaultFound;
   }
   if (comparison.tally(trace::kLinkedNanoapp, Kind::kOperatorOutput).records == 0) {
-    console->Message("no network run happened: the audio is too short");
+    console->Message("qz: the network did not run in " + Grouped(buffers) +
+                     " buffers of 2 s of audio, should be from the second one on");
+    return kFaultFound;
   }
   PrintTallies(comparison, console);
   console->Data(options.builds[0] + " and " + options.builds[1] + " give the same");
-  const std::string output_fault = console->OutputFault();
-  if (!output_fault.empty()) console->Message("qz: " + output_fault);
-  return output_fault.empty() ? kFine : kFaultFound;
+  return kFine;
 }
 
 ExitCode Compare(const ProveOptions& options, const RawAudio& audio, Console* console) {
-  TracedBuild first(options.builds[0], audio.file, options.host_clients, options.client_nanoapps);
-  TracedBuild second(options.builds[1], audio.file, options.host_clients, options.client_nanoapps);
+  const std::string& path = audio.file.path();
+  TracedBuild first(options.builds[0], path, options.host_clients, options.client_nanoapps);
+  TracedBuild second(options.builds[1], path, options.host_clients, options.client_nanoapps);
   Comparison comparison(options.builds[0], options.builds[1]);
   const std::string difference =
-      FirstDifference(&first, &second, audio.samples, &comparison, console);
-  if (difference.empty()) return Conclude(comparison, options, console);
+      FirstDifference(&first, &second, audio.buffers, &comparison, console);
+  if (difference.empty()) return Conclude(comparison, options, audio.buffers, console);
   console->Data("first difference: " + difference);
   return kFaultFound;
 }
@@ -115,10 +129,22 @@ ExitCode Compare(const ProveOptions& options, const RawAudio& audio, Console* co
 ExitCode ProveCommand(const ProveOptions& options) {
   CatchInterrupt();
   Console console;
+  std::error_code missing;  // which is told later
+  if (std::filesystem::equivalent(options.builds[0], options.builds[1], missing)) {
+    console.Message("qz: " + options.builds[0] + " and " + options.builds[1] +
+                    " are one folder, should be two builds (see qz prove --help)");
+    return kUsage;
+  }
   try {
     const std::unique_ptr<AudioInput> input = OpenAudio(options.file, /*raw=*/false);
     console.Message(input->Description());
-    return Compare(options, Decode(input.get()), &console);
+    RawAudio audio;
+    Decode(input.get(), &audio);
+    const ExitCode result = Compare(options, audio, &console);
+    const std::string output_fault = console.OutputFault();
+    if (output_fault.empty()) return result;
+    console.Message("qz: " + output_fault);
+    return kFaultFound;
   } catch (const AudioError& error) {
     console.Message(std::string("qz: ") + error.what());
     return kUnreadableInput;

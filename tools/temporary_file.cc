@@ -14,18 +14,29 @@ namespace {
 
 std::string TemporaryFolder() {
   const char* folder = std::getenv("TMPDIR");
-  return folder != nullptr ? folder : "/tmp";
+  return folder != nullptr && folder[0] != '\0' ? folder : "/tmp";
+}
+
+// Fills in the last letters of the path.
+FileDescriptor MakeFile(std::string* path) {
+  *path = TemporaryFolder() + "/qz-XXXXXX";
+  FileDescriptor file(mkostemp(path->data(), O_CLOEXEC));
+  if (file.get() < 0) ThrowSystemError(*path, "can't make a temporary file");
+  return file;
 }
 
 }  // namespace
 
 FileDescriptor OpenTemporaryFile() {
-  std::string path = TemporaryFolder() + "/qz-XXXXXX";
-  FileDescriptor file(mkostemp(path.data(), O_CLOEXEC));
-  if (file.get() < 0) ThrowSystemError(path, "can't make a temporary file");
+  std::string path;
+  FileDescriptor file = MakeFile(&path);
   unlink(path.c_str());
   return file;
 }
+
+NamedTemporaryFile::NamedTemporaryFile() : descriptor_(MakeFile(&path_)) {}
+
+NamedTemporaryFile::~NamedTemporaryFile() { unlink(path_.c_str()); }
 
 void WriteToTemporaryFile(const FileDescriptor& file, const void* bytes, size_t count) {
   const char* rest = static_cast<const char*>(bytes);

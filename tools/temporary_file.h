@@ -1,4 +1,4 @@
-// Unnamed temporary files: nothing of them stays, however the program ends.
+// Temporary files, in the folder $TMPDIR or else /tmp.
 #pragma once
 
 #include <cstddef>
@@ -9,7 +9,26 @@
 namespace qz::tools {
 
 // All throw AudioError.
+
+// A file without a name: nothing of it stays, however the program ends.
 FileDescriptor OpenTemporaryFile();
+
+// A file with a name, for other programs; removed with the object.
+class NamedTemporaryFile {
+ public:
+  NamedTemporaryFile();
+  NamedTemporaryFile(const NamedTemporaryFile&) = delete;
+  NamedTemporaryFile& operator=(const NamedTemporaryFile&) = delete;
+  ~NamedTemporaryFile();
+
+  const std::string& path() const { return path_; }
+  const FileDescriptor& descriptor() const { return descriptor_; }
+
+ private:
+  std::string path_;
+  FileDescriptor descriptor_;
+};
+
 void WriteToTemporaryFile(const FileDescriptor& file, const void* bytes, size_t count);
 
 // Throws AudioError with what errno says: "NAME: WHAT: Reason".

@@ -29,7 +29,7 @@ std::vector<std::string> LauncherWords(const std::string& folder) {
 
 }  // namespace
 
-TracedBuild::TracedBuild(const std::string& folder, const FileDescriptor& raw_audio,
+TracedBuild::TracedBuild(const std::string& folder, const std::string& raw_audio,
                          uint32_t host_clients, uint32_t client_nanoapps)
     : program_(folder + "/bin/qz-trace"),
       reader_([this](uint8_t* bytes, size_t size) { return Read(bytes, size); }) {
@@ -37,15 +37,14 @@ TracedBuild::TracedBuild(const std::string& folder, const FileDescriptor& raw_au
     throw BuildError(program_ + ": " + std::strerror(errno) + ", should be a build's program");
   }
   std::vector<std::string> command = LauncherWords(folder);
-  // Opened anew from there, twice, each time from its beginning.
-  for (const std::string& word : {program_, std::string("/dev/stdin"), folder + "/lib/qz.so",
+  for (const std::string& word : {program_, raw_audio, folder + "/lib/qz.so",
                                   std::to_string(host_clients), std::to_string(client_nanoapps)}) {
     command.push_back(word);
   }
-  Start(command, raw_audio);
+  Start(command);
 }
 
-void TracedBuild::Start(const std::vector<std::string>& command, const FileDescriptor& raw_audio) {
+void TracedBuild::Start(const std::vector<std::string>& command) {
   int ends[2];
   if (pipe2(ends, O_CLOEXEC) != 0) throw BuildError(program_ + ": " + std::strerror(errno));
   pipe_ = FileDescriptor(ends[0]);
@@ -57,7 +56,7 @@ void TracedBuild::Start(const std::vector<std::string>& command, const FileDescr
   words.push_back(nullptr);
   posix_spawn_file_actions_t files;
   posix_spawn_file_actions_init(&files);
-  posix_spawn_file_actions_adddup2(&files, raw_audio.get(), STDIN_FILENO);
+  posix_spawn_file_actions_addopen(&files, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
   posix_spawn_file_actions_adddup2(&files, write_end.get(), STDOUT_FILENO);
   // A reader that leaves ends the program, which this one ignores for itself.
   sigset_t with_default;
@@ -66,7 +65,9 @@ void TracedBuild::Start(const std::vector<std::string>& command, const FileDescr
   posix_spawnattr_t attributes;
   posix_spawnattr_init(&attributes);
   posix_spawnattr_setsigdefault(&attributes, &with_default);
-  posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGDEF);
+  // A process group of its own, so that what a launcher has started can be killed with it.
+  posix_spawnattr_setpgroup(&attributes, 0);
+  posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGDEF | POSIX_SPAWN_SETPGROUP);
   const int error = posix_spawnp(&process_, words[0], &files, &attributes, words.data(), environ);
   posix_spawnattr_destroy(&attributes);
   posix_spawn_file_actions_destroy(&files);
@@ -77,7 +78,7 @@ void TracedBuild::Start(const std::vector<std::string>& command, const FileDescr
 
 TracedBuild::~TracedBuild() {
   if (process_ < 0) return;
-  kill(process_, SIGKILL);
+  kill(-process_, SIGKILL);
   AwaitEnd();
 }
 
@@ -111,6 +112,13 @@ size_t TracedBuild::Read(uint8_t* bytes, size_t size) {
 }
 
 std::string TracedBuild::AwaitEnd() {
+  // Until waitpid() the ended process keeps its number, and with it the group's.
+  siginfo_t ended;
+  do {
+    if (Interrupted()) kill(-process_, SIGKILL);
+  } while (waitid(P_PID, static_cast<id_t>(process_), &ended, WEXITED | WNOWAIT) < 0 &&
+           errno == EINTR);
+  kill(-process_, SIGKILL);
   int status = 0;
   while (waitpid(process_, &status, 0) < 0 && errno == EINTR) {
   }

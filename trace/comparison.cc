@@ -22,6 +22,7 @@ const KindWords& WordsOf(Kind kind) {
                                     {"event to client nanoapps", "receiver", "type"},
                                     {"features", "number", "type"},
                                     {"output of an operator", "operator", "channels"},
+                                    {"memory", "object", "channels"},
                                     {"end of the trace", "number", "type"}};
   return words[static_cast<size_t>(kind) - 1];
 }
@@ -113,6 +114,10 @@ std::string Comparison::BytesDiffer(const Record& first, const Record& second) c
     size = first.number == kScoresOperator ? 4 : 1;
     detail = ", row " + std::to_string(place / size / first.type) + ", channel " +
              std::to_string(place / size % first.type);
+  } else if (first.kind == Kind::kMemory && first.type > 0) {
+    size = 1;
+    detail = ", frame " + std::to_string(place / first.type) + ", channel " +
+             std::to_string(place % first.type);
   }
   if (size == 0 || first.bytes.size() % size != 0) {
     return Differ(Place(first, detail), std::to_string(first.bytes[place]),
@@ -129,6 +134,10 @@ std::string Comparison::Place(const Record& record, const std::string& detail) c
   } else if (record.kind == Kind::kOperatorOutput) {
     place = "network run " + std::to_string(seen(record.kind) / kOperatorsPerRun) + ", operator " +
             std::to_string(record.number);
+  } else if (record.kind == Kind::kMemory) {
+    place += " after buffer " + std::to_string(seen(record.kind) / kWatchedObjectCount) + ", ";
+    place += record.number < kWatchedObjectCount ? kWatchedObjects[record.number].name
+                                                 : "object " + std::to_string(record.number);
   } else if (record.kind != Kind::kEnd) {
     place += " " + std::to_string(seen(record.kind));
   }
@@ -138,7 +147,7 @@ std::string Comparison::Place(const Record& record, const std::string& detail) c
 }
 
 std::string Comparison::NanoappsDiffer() const {
-  for (const Kind kind : {Kind::kLogLine, Kind::kHostMessage, Kind::kClientEvent}) {
+  for (const Kind kind : {Kind::kLogLine, Kind::kHostMessage, Kind::kClientEvent, Kind::kMemory}) {
     const Tally& loaded = tally(kLoadedModule, kind);
     const Tally& linked = tally(kLinkedNanoapp, kind);
     if (loaded.records == linked.records && loaded.digest == linked.digest) continue;

@@ -15,7 +15,7 @@ struct Tally {
 };
 
 // Compares two traces record by record, up to the first difference. Counts from 0: frames, network
-// runs, rows, channels and bytes; lines, messages and events for each nanoapp.
+// runs, rows, channels, bytes and buffers; lines, messages and events for each nanoapp.
 class Comparison {
  public:
   // The names of the two builds in sentences.
@@ -26,8 +26,9 @@ class Comparison {
   // both values; nothing may be compared afterwards.
   std::string Compare(const Record& first, const Record& second);
 
-  // Empty when the module that was loaded and the nanoapp that was linked logged and sent the same,
-  // so that what was observed in the second holds for the first; else one sentence. At the end.
+  // Empty when the module that was loaded and the nanoapp that was linked logged and sent the same
+  // and left the same in memory after each buffer, so that what was observed in the second holds
+  // for the first; else one sentence. At the end.
   std::string NanoappsDiffer() const;
 
   // Of the kind's records so far, in both traces.

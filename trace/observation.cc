@@ -13,6 +13,9 @@ namespace {
 Recorder* recorder = nullptr;
 
 static_assert(kOperatorCount == kOperatorsPerRun);
+static_assert(kWatchedObjects[0].bytes == kInput.Bytes() &&
+              kWatchedObjects[0].channels == kInput.channels &&
+              kWatchedObjects[1].bytes == kArenaBytes);
 
 std::vector<uint8_t> ScoreBytes() {
   std::vector<uint8_t> bytes;

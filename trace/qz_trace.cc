@@ -1,5 +1,6 @@
-// qz-trace: plays a recording to the module and then, observed from inside, to the same nanoapp
-// linked into this program, and writes a trace of both to standard output.
+// qz-trace: plays a recording to the module and then to the same nanoapp linked into this program,
+// and writes a trace of both to standard output. Of both it shows what they log and send, and their
+// memory after each buffer; only of the linked one each frame and each operator.
 // Usage: qz-trace RAW_FILE MODULE HOST_CLIENTS CLIENT_NANOAPPS
 // RAW_FILE is headerless 16-bit mono at 16 kHz, in whole buffers of 32000 samples.
 
@@ -61,6 +62,12 @@ bool Trace(uint32_t nanoapp, const Options& options, Recorder* recorder) {
   if (nanoapp == kLoadedModule ? !hub.Start(options.module, &failure)
                                : !hub.StartLinked(_chreNslDsoNanoappInfo, &failure)) {
     return Complain(failure.sentence);
+  }
+  std::string wrong;
+  if (!recorder->WatchMemory(&wrong)) {
+    // So that the trace breaks off here: its further lines would be taken for a difference.
+    hub.SetLogHandler(nullptr);
+    return Complain(wrong);
   }
   clients.Connect(options.host_clients, options.client_nanoapps);
   bool fine = PlayFile(options.raw_file, &hub, recorder);

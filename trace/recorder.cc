@@ -2,6 +2,8 @@
 
 #include <utility>
 
+#include "object_in_memory.h"
+
 namespace qz::trace {
 namespace {
 
@@ -22,10 +24,25 @@ void Recorder::Begin(uint32_t nanoapp, hub::Hub* hub) {
   hub_ = hub;
   hub->SetLogHandler(
       [this](chreLogLevel level, uint64_t, const std::string& line) { OnLogLine(level, line); });
-  Played(0);
+  Write(Kind::kPlayed, nanoapp_, 0, {});
 }
 
-void Recorder::Played(uint32_t buffers) { Write(Kind::kPlayed, nanoapp_, buffers, {}); }
+bool Recorder::WatchMemory(std::string* wrong) {
+  for (uint32_t i = 0; i < kWatchedObjectCount; ++i) {
+    const WatchedObject& object = kWatchedObjects[i];
+    objects_[i] = FindObject(hub_->nanoapp(), object.name, object.bytes, wrong);
+    if (objects_[i] == nullptr) return false;
+  }
+  return true;
+}
+
+void Recorder::Played(uint32_t buffers) {
+  Write(Kind::kPlayed, nanoapp_, buffers, {});
+  for (uint32_t i = 0; i < kWatchedObjectCount; ++i) {
+    const WatchedObject& object = kWatchedObjects[i];
+    Write(Kind::kMemory, i, object.channels, {objects_[i], objects_[i] + object.bytes});
+  }
+}
 
 void Recorder::OnHostMessage(uint16_t endpoint, uint32_t type, const uint8_t* bytes, size_t size) {
   Write(Kind::kHostMessage, endpoint, type, {bytes, bytes + size});

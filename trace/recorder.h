@@ -18,6 +18,10 @@ class Recorder final : public hub::ClientListener {
   // What comes from now on is of this nanoapp, kLoadedModule or kLinkedNanoapp. `hub` stays alive
   // until the next call.
   void Begin(uint32_t nanoapp, hub::Hub* hub);
+  // Finds the watched objects of the nanoapp that runs; false with one sentence in `*wrong` if one
+  // isn't there.
+  bool WatchMemory(std::string* wrong);
+  // So many buffers were played since WatchMemory.
   void Played(uint32_t buffers);
 
   void OnHostMessage(uint16_t endpoint, uint32_t type, const uint8_t* bytes, size_t size) override;
@@ -33,6 +37,7 @@ class Recorder final : public hub::ClientListener {
   Writer& writer_;
   hub::Hub* hub_ = nullptr;
   uint32_t nanoapp_ = kLoadedModule;
+  const uint8_t* objects_[kWatchedObjectCount] = {};
 };
 
 // Tells `recorder` of every frame and every network run of the nanoapp that is linked into this

@@ -45,7 +45,8 @@ void Reader::Next(Record* record) {
   std::vector<uint8_t> head;
   Fill(&head, kHeadBytes);
   if (head[0] < 1 || head[0] > static_cast<uint8_t>(Kind::kEnd)) {
-    Fail("its kind is " + std::to_string(head[0]) + ", should be 1 to 7");
+    Fail("its kind is " + std::to_string(head[0]) + ", should be 1 to " +
+         std::to_string(static_cast<int>(Kind::kEnd)));
   }
   record->kind = static_cast<Kind>(head[0]);
   record->number = static_cast<uint32_t>(LittleEndian(head, 1, 4));

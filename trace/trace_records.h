@@ -21,13 +21,25 @@ enum class Kind : uint8_t {
   kClientEvent = 4,  // number: instance of the client nanoapp, type: of the event; bytes: its data
   kFeatures = 5,     // bytes: the features of a frame, 2 bytes each
   kOperatorOutput = 6,  // number: operator, type: channels; bytes: the rows, one after another
-  kEnd = 7,             // bytes: how many records of each kind before, from 1 on, 8 bytes each
+  kMemory = 7,          // number: object of kWatchedObjects, type: its channels; bytes: its values
+  kEnd = 8,             // bytes: how many records of each kind before, from 1 on, 8 bytes each
 };
-constexpr size_t kKindsBeforeEnd = 6;
+constexpr size_t kKindsBeforeEnd = 7;
 
 // Numbers of nanoapps: a kPlayed record with 0 buffers begins each one's run.
 constexpr uint32_t kLoadedModule = 0;
 constexpr uint32_t kLinkedNanoapp = 1;
+
+// What is shown of a nanoapp's memory after each buffer of audio: the classifier's window, and all
+// that the last run of the network left, the five scores included.
+struct WatchedObject {
+  const char* name;
+  uint32_t bytes;
+  uint32_t channels;  // 0: bytes of several tensors
+};
+constexpr WatchedObject kWatchedObjects[] = {{"inference_input_buffer", 18336, 48},
+                                             {"arena", 41040, 0}};
+constexpr uint32_t kWatchedObjectCount = 2;
 
 // Operators of a network run, in order. The values of the last, the scores, are floats of 4 bytes,
 // those of all others int8.
@@ -42,7 +54,7 @@ struct Record {
   std::vector<uint8_t> bytes;
 };
 
-// No record has more: the largest tensor has 22,800.
+// No record has more: the largest object has 41,040.
 constexpr size_t kMostRecordBytes = 65536;
 
 // Appends the `size` low bytes of `value`, the lowest first.

@@ -48,7 +48,8 @@ TEST_F(QzProgram, NobodyNeedsToListen) {
 
 TEST_F(QzProgram, AnInterruptOrAReaderThatLeavesEndsLiveInput) {
   const std::string live = "(cat " + Noise(3 * kSecond) + "; exec sleep 60)";
-  EXPECT_EQ(Run("timeout --preserve-status -k 9 -s INT 3 $QZ run --raw - < <" + live), 0);
+  EXPECT_EQ(Run("timeout --foreground --preserve-status -k 9 -s INT 3 $QZ run --raw - < <" + live),
+            0);
   EXPECT_THAT(err_, HasSubstr("interrupted"));
   EXPECT_THAT(out_, HasSubstr("4.00 s of audio (1.00 s of it silence), 2 passes"));
 

@@ -26,6 +26,7 @@ std::vector<Record> GoodTrace() {
       }
     }
     trace.push_back({Kind::kPlayed, nanoapp, 1, 2'000'000'000, {}});
+    trace.push_back({Kind::kMemory, 0, 48, 2'000'000'000, std::vector<uint8_t>(96)});
     trace.push_back({Kind::kClientEvent, 257, 0x8207, 2'000'000'000, {1, 0, 0, 0, 8}});
   }
   return trace;
@@ -106,7 +107,8 @@ TEST(Trace, IsWholeOrNone) {
 }
 
 TEST(Trace, FirstDifferenceIsNamed) {
-  constexpr size_t kLog = 1, kMessage = 2, kReport = 4, kSecondFeatures = 30, kSecondRun = 31;
+  constexpr size_t kLog = 1, kMessage = 2, kMemory = 4, kReport = 5, kSecondFeatures = 31,
+                   kSecondRun = 32;
   const auto with = [](size_t place, auto change) {
     std::vector<Record> trace = GoodTrace();
     change(trace[place]);
@@ -123,6 +125,9 @@ TEST(Trace, FirstDifferenceIsNamed) {
        "message to hosts 0, size" + in_first + "0 bytes in A, 1 bytes in B"},
       {with(kMessage, [](Record& r) { r.type = 6; }),
        "message to hosts 0, type" + in_first + "4 in A, 6 in B"},
+      {with(kMemory, [](Record& r) { r.bytes[50] = 0xFF; }),
+       "memory after buffer 0, inference_input_buffer, frame 1, channel 2 (the loaded module at "
+       "2.000 s): 0 in A, -1 in B"},
       {with(kReport, [](Record& r) { r.bytes[4] = 9; }),
        "event to client nanoapps 0, byte 4 (the loaded module at 2.000 s): 8 in A, 9 "
        "in B"},
