@@ -159,18 +159,6 @@ TEST(StandinModel, FollowsItsSeedAndNothingElse) {
   EXPECT_NE(Standin(UINT64_MAX), Standin(1));
 }
 
-// Width of the middle 98 % of a channel's bytes over time and windows: a pattern over channels that
-// stands still counts for nothing.
-int UsedRange(const std::vector<NetworkRun>& runs, size_t op, int channel) {
-  std::vector<int8_t> values;
-  for (const NetworkRun& run : runs) {
-    const Tensor& tensor = run.outputs[op];
-    for (int row = 0; row < tensor.rows; ++row) values.push_back(tensor.Row(row)[channel]);
-  }
-  std::sort(values.begin(), values.end());
-  return values[values.size() * 99 / 100] - values[values.size() / 100];
-}
-
 TEST(StandinModel, IsSoundAndAlive) {
   for (uint64_t seed : {uint64_t{1}, UINT64_MAX}) {
     SCOPED_TRACE(seed);
@@ -178,13 +166,6 @@ TEST(StandinModel, IsSoundAndAlive) {
     EXPECT_THAT(CheckWeights(model), ElementsAre());
     std::vector<NetworkRun> runs;  // on windows that the calibration did not see
     for (uint64_t s = 0; s < 40; ++s) runs.push_back(RunNetwork(model, SyntheticWindow(s)));
-    for (size_t op = 0; op < 19; ++op) {
-      // Logits live within 21 steps of the zero point; the depthwise outputs are not rectified.
-      const int least = op == 18 ? 30 : op == 0 || op == 3 ? 50 : 100;
-      for (int c = 0; c < runs[0].outputs[op].channels; ++c) {
-        EXPECT_GE(UsedRange(runs, op, c), least) << "operator " << op << ", channel " << c;
-      }
-    }
     for (size_t i = 0; i < kClasses; ++i) {
       int low = 0, middle = 0, high = 0;
       for (const NetworkRun& run : runs) {

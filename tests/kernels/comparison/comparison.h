@@ -5,10 +5,10 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>
-#include <initializer_list>
-#include <limits>
+#include <cstring>
 #include <string>
 #include <string_view>
+#include <type_traits>
 #include <utility>
 #include <vector>
 
@@ -16,124 +16,91 @@
 
 namespace qz::test {
 
-struct Kernel {
+// The two texts of a kernel: text[0], which runs in this build, and text[1], the plain one.
+template <typename Function>
+struct Texts {
+  constexpr Texts(std::string_view kernel, Function* running, Function* plain)
+      : name(kernel), text{running, plain} {}
   std::string_view name;
-  std::string_view text;  // its row in the room's CMakeLists.txt
-  // One comparison with arguments drawn from `random`: empty, or what differs and with what
-  // arguments.
-  std::string (*compare)(Random& random);
-  // One call as the graphs make it, always on the same data.
-  void (*run)();
-  void (*run_plain)();
+  Function* text[2];
 };
 
-// `run` is a template over the function that it calls. The plain text has to be declared:
-// extern "C" { decltype(name) name__plain; }
-#define QZ_KERNEL(name, text, compare, run) \
-  { #name, text, compare, run < (name)>, run < (name##__plain)> }
+// Defines a kernel's Texts and declares its plain text.
+#define QZ_TEXTS(texts, kernel)                \
+  extern "C" decltype(kernel) kernel##__plain; \
+  constexpr Texts texts { #kernel, kernel, kernel##__plain }
+
+// Random numbers of one comparison; a failure names those that were picked.
+class CaseRandom : public Random {
+ public:
+  using Random::Random;
+  size_t Pick(const char* name, size_t low, size_t high) {
+    picked_.emplace_back(name, Random::Pick(low, high));
+    return picked_.back().second;
+  }
+  std::string Picked() const {
+    std::string text;
+    for (const auto& [name, value] : picked_) text += ", " + (name + (" " + std::to_string(value)));
+    return text;
+  }
+
+ private:
+  std::vector<std::pair<const char*, size_t>> picked_;
+};
+
+struct Kernel {
+  Kernel(std::string_view kernel, std::string_view row) : name(kernel), text(row) {}
+  // `call` is a function of std::true_type for the plain text and std::false_type for the other,
+  // so that the choice costs no instruction.
+  template <typename Call>
+  Kernel(std::string_view kernel, std::string_view row, std::string (*comparison)(CaseRandom&),
+         Call call)
+      : name(kernel), text(row), compare(comparison), run(call), run_plain(call) {}
+
+  std::string_view name;
+  std::string_view text;  // its row in the room's CMakeLists.txt
+  // Null where no build has another text than the plain one. A comparison gives what differs, or
+  // nothing; a run is one call as the graphs make it, always on the same data.
+  std::string (*compare)(CaseRandom& random) = nullptr;
+  void (*run)(std::false_type) = nullptr;
+  void (*run_plain)(std::true_type) = nullptr;
+};
 
 std::vector<Kernel> SignalKernels();
 std::vector<Kernel> QuantisedKernels();
 
-// `count` values of [low, high] in one of six shapes: random, all lowest, all highest, both in
-// turn, a ramp (that wraps around), or all the value nearest to 0 but one extreme.
+// Where a page begins that can't be accessed, behind 64 KiB that nothing else uses until the next
+// comparison.
+uint8_t* EndOfFreePages(size_t bytes);
+
+// A kernel's input: a copy of values, with `readable` random bytes behind them. The page after
+// those can't be read: a text that reads further ends the program, which names kernel and seed.
 template <typename T>
-std::vector<T> ShapedFill(Random& random, size_t count, int64_t low = std::numeric_limits<T>::min(),
-                          int64_t high = std::numeric_limits<T>::max()) {
-  const auto width = static_cast<uint64_t>(high - low) + 1;
-  const uint64_t shape = random.Next() % 6, start = random.Next() % width;
-  const uint64_t step = 1 + random.Next() % 9;
-  if (shape == 0) return random.Fill<T>(count, low, high);
-  std::vector<T> values(count);
-  for (size_t i = 0; i < count; ++i) {
-    const bool is_high = shape == 2 || (shape == 3 && (start + i) % 2 == 0);
-    values[i] = static_cast<T>(is_high ? high : low);
-    if (shape == 4) {
-      values[i] = static_cast<T>(low + static_cast<int64_t>((start + i * step) % width));
-    } else if (shape == 5) {
-      values[i] = static_cast<T>(low > 0 ? low : (high < 0 ? high : 0));
-    }
-  }
-  if (shape == 5 && count > 0) {
-    values[random.Next() % count] = static_cast<T>(start % 2 ? low : high);
-  }
-  return values;
+const T* Place(Random& random, const std::vector<T>& values, size_t readable = 0) {
+  const size_t bytes = values.size() * sizeof(T);
+  uint8_t* const behind = EndOfFreePages(bytes + readable) - readable;
+  std::memcpy(behind - bytes, values.data(), bytes);
+  std::generate_n(behind, readable, [&] { return static_cast<uint8_t>(random.Next()); });
+  return reinterpret_cast<const T*>(behind - bytes);
 }
 
-// A readable copy of values and of `readable` random bytes behind them. The page after those can't
-// be read: a text that reads further ends the program, which names the kernel and the seed.
-class GuardedBytes {
- public:
-  GuardedBytes(Random& random, const void* values, size_t bytes, size_t readable);
-  GuardedBytes(const GuardedBytes&) = delete;
-  GuardedBytes& operator=(const GuardedBytes&) = delete;
-  ~GuardedBytes();
-  const uint8_t* data() const { return data_; }
-
- private:
-  uint8_t* page_end_;
-  uint8_t* data_;
-};
-
-// A kernel's input; `readable_bytes` is how far beyond the last value the kernel may read.
-template <typename T>
-class Input {
- public:
-  Input(Random& random, const std::vector<T>& values, size_t readable_bytes)
-      : bytes_(random, values.data(), values.size() * sizeof(T), readable_bytes) {}
-  const T* data() const { return reinterpret_cast<const T*>(bytes_.data()); }
-
- private:
-  GuardedBytes bytes_;
-};
-
-// Two equal buffers with guards around, one for each text. They start with the given contents, or
-// with random ones, so that whatever one text alone writes shows.
-template <typename T>
-class Outputs {
- public:
-  Outputs(Random& random, size_t count)
-      : count_(count),
-        running_(random.Fill<uint8_t>(Bytes() + 2 * kGuard, 0, 255)),
-        plain_(running_) {}
-  Outputs(Random& random, const std::vector<T>& contents) : Outputs(random, contents.size()) {
-    std::copy(contents.begin(), contents.end(), running());
-    std::copy(contents.begin(), contents.end(), plain());
-  }
-
-  T* running() { return reinterpret_cast<T*>(running_.data() + kGuard); }
-  T* plain() { return reinterpret_cast<T*>(plain_.data() + kGuard); }
-
-  // Empty, or the first byte that differs, counted from the output's first.
-  std::string Difference() const {
-    for (size_t i = 0; i < running_.size(); ++i) {
-      if (running_[i] == plain_[i]) continue;
-      const auto place = static_cast<ptrdiff_t>(i) - static_cast<ptrdiff_t>(kGuard);
-      return "byte " + std::to_string(place) + " of the output's " + std::to_string(Bytes()) +
-             " is " + std::to_string(running_[i]) + ", by the plain text " +
-             std::to_string(plain_[i]);
-    }
-    return "";
-  }
-
- private:
-  static constexpr size_t kGuard = 64;  // keeps the alignment that vectors have
-  size_t Bytes() const { return count_ * sizeof(T); }
-
-  size_t count_;
-  std::vector<uint8_t> running_;
-  std::vector<uint8_t> plain_;
-};
-
-// A difference with the arguments behind it; empty when there is none.
-inline std::string WithArguments(std::string difference,
-                                 std::initializer_list<std::pair<const char*, int64_t>> arguments) {
-  if (difference.empty()) return difference;
-  const char* separator = "; ";
-  for (const auto& [name, value] : arguments) {
-    difference += std::exchange(separator, ", ") + std::string(name) + " " + std::to_string(value);
-  }
-  return difference;
+// Calls both texts with an output each that holds `contents` between random values, so that
+// whatever one text alone writes shows. Empty, or the first value that differs, counted from the
+// output's first.
+template <typename Function, typename T, typename Call>
+std::string Difference(Random& random, const Texts<Function>& texts, const std::vector<T>& contents,
+                       const Call& call) {
+  constexpr ptrdiff_t kGuard = 64 / sizeof(T);
+  std::vector<T> running = RandomValues<T>(random, contents.size() + 2 * kGuard);
+  std::copy(contents.begin(), contents.end(), running.begin() + kGuard);
+  std::vector<T> plain = running;
+  call(texts.text[0], running.data() + kGuard);
+  call(texts.text[1], plain.data() + kGuard);
+  const auto [at, plain_at] = std::mismatch(running.begin(), running.end(), plain.begin());
+  if (at == running.end()) return "";
+  return "value " + std::to_string(at - running.begin() - kGuard) + " of the output's " +
+         std::to_string(contents.size()) + " is " + std::to_string(*at) + ", by the plain text " +
+         std::to_string(*plain_at);
 }
 
 }  // namespace qz::test

@@ -7,12 +7,12 @@
 #include <sys/mman.h>
 #include <unistd.h>
 
-#include <algorithm>
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
-#include <cstring>
+#include <iterator>
 #include <random>
+#include <set>
 #include <sstream>
 
 #include "comparison.h"
@@ -22,25 +22,10 @@ namespace qz::test {
 namespace {
 
 constexpr uint64_t kComparisons = 10000;  // of each kernel
-constexpr size_t kSlotBytes = size_t{1} << 20;
 
-// Slots that end at a page without access, kept for the next input.
-std::vector<uint8_t*> free_slot_ends;
-
-uint8_t* TakeSlot() {
-  if (free_slot_ends.empty()) {
-    const auto page = static_cast<size_t>(sysconf(_SC_PAGESIZE));
-    void* slot = mmap(nullptr, kSlotBytes + page, PROT_READ | PROT_WRITE,
-                      MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
-    if (slot == MAP_FAILED) std::abort();
-    uint8_t* end = static_cast<uint8_t*>(slot) + kSlotBytes;
-    if (mprotect(end, page, PROT_NONE) != 0) std::abort();
-    free_slot_ends.push_back(end);
-  }
-  uint8_t* end = free_slot_ends.back();
-  free_slot_ends.pop_back();
-  return end;
-}
+// Of the places that EndOfFreePages gives.
+std::vector<uint8_t*> ends_of_pages;
+size_t ends_in_use = 0;
 
 // What a fault's message says; filled in before each comparison.
 char comparison[256];
@@ -51,13 +36,6 @@ void OnFault(int signal) {
   written = write(STDERR_FILENO, comparison, strnlen(comparison, sizeof comparison));
   std::signal(signal, SIG_DFL);
   std::raise(signal);
-}
-
-std::vector<std::string> VectorTexts() {
-  std::istringstream words(QZ_VECTOR_TEXTS);
-  std::vector<std::string> texts;
-  for (std::string text; words >> text;) texts.push_back(text);
-  return texts;
 }
 
 std::vector<Kernel> AllKernels() {
@@ -71,11 +49,11 @@ bool CompareKernel(const Kernel& kernel, uint64_t first_seed) {
   for (uint64_t seed = first_seed; seed < first_seed + kComparisons; ++seed) {
     std::snprintf(comparison, sizeof comparison, "%s, --seed %llu\n", kernel.name.data(),
                   static_cast<unsigned long long>(seed));
-    Random random(seed);
+    CaseRandom random(seed);
+    ends_in_use = 0;
     const std::string difference = kernel.compare(random);
     if (difference.empty()) continue;
-    std::printf("differs: %s --seed %llu: %s\n", kernel.name.data(),
-                static_cast<unsigned long long>(seed), difference.c_str());
+    std::printf("%s%s%s\n", comparison, difference.c_str(), random.Picked().c_str());
     return false;
   }
   std::printf("%llu comparisons: %s\n", static_cast<unsigned long long>(kComparisons),
@@ -87,42 +65,47 @@ int CompareAll(uint64_t first_seed) {
   std::printf("--seed %llu\n", static_cast<unsigned long long>(first_seed));
   std::signal(SIGSEGV, OnFault);
   std::signal(SIGBUS, OnFault);
-  const std::vector<std::string> vector_texts = VectorTexts();
+  std::istringstream words(QZ_VECTOR_TEXTS);
+  const std::set<std::string> vector_texts(std::istream_iterator<std::string>(words), {});
+  std::set<std::string> unlisted_texts = vector_texts;
   const std::vector<Kernel> kernels = AllKernels();
-  bool passed = true;
-  for (const std::string& text : vector_texts) {
-    if (std::any_of(kernels.begin(), kernels.end(), [&](auto& k) { return k.text == text; })) {
-      continue;
-    }
-    std::printf("the vector text %s has no kernel in the lists: it would not be compared\n",
-                text.c_str());
-    passed = false;
-  }
+  bool passed = kernels.size() == QZ_KERNEL_COUNT;
   size_t compared = 0;
   for (const Kernel& kernel : kernels) {
-    if (std::find(vector_texts.begin(), vector_texts.end(), kernel.text) == vector_texts.end()) {
-      std::printf("plain text: nothing to compare: %s\n", kernel.name.data());
-      continue;
+    const std::string text(kernel.text);
+    unlisted_texts.erase(text);
+    if (vector_texts.count(text) == 0) {
+      std::printf("plain text, not compared: %s\n", kernel.name.data());
+    } else if (kernel.compare == nullptr) {
+      std::printf("vector text, but no comparison: %s\n", kernel.name.data());
+      passed = false;
+    } else {
+      passed &= CompareKernel(kernel, first_seed);
+      ++compared;
     }
-    passed &= CompareKernel(kernel, first_seed);
-    ++compared;
   }
-  std::printf("%zu of %zu kernels compared\n", compared, kernels.size());
-  return passed && compared > 0 ? EXIT_SUCCESS : EXIT_FAILURE;
+  for (const std::string& text : unlisted_texts) {
+    std::printf("the vector text %s has no kernel in the lists\n", text.c_str());
+  }
+  if (kernels.size() != QZ_KERNEL_COUNT) {
+    std::printf("the lists hold %zu kernels, should be %d\n", kernels.size(), QZ_KERNEL_COUNT);
+  }
+  std::printf("%zu of %d kernels compared\n", compared, QZ_KERNEL_COUNT);
+  return passed && unlisted_texts.empty() && compared > 0 ? EXIT_SUCCESS : EXIT_FAILURE;
 }
 
 // Two marks in a row first, for what a mark itself costs. Each text has run once before it counts.
 void CountAll() {
-  const std::vector<Kernel> kernels = AllKernels();
   Mark();
   Mark();
-  for (const Kernel& kernel : kernels) {
-    kernel.run_plain();
-    kernel.run();
+  for (const Kernel& kernel : AllKernels()) {
+    if (kernel.run == nullptr) continue;
+    kernel.run_plain({});
+    kernel.run({});
     Mark();
-    kernel.run_plain();
+    kernel.run_plain({});
     Mark();
-    kernel.run();
+    kernel.run({});
     Mark();
     std::printf("%s %s\n", kernel.text.data(), kernel.name.data());
   }
@@ -130,14 +113,19 @@ void CountAll() {
 
 }  // namespace
 
-GuardedBytes::GuardedBytes(Random& random, const void* values, size_t bytes, size_t readable)
-    : page_end_(TakeSlot()), data_(page_end_ - readable - bytes) {
-  if (bytes + readable > kSlotBytes) std::abort();
-  if (bytes > 0) std::memcpy(data_, values, bytes);
-  for (size_t i = 0; i < readable; ++i) data_[bytes + i] = static_cast<uint8_t>(random.Next());
+uint8_t* EndOfFreePages(size_t bytes) {
+  constexpr size_t kFreeBytes = 65536;
+  if (bytes > kFreeBytes) std::abort();
+  if (ends_in_use == ends_of_pages.size()) {
+    const auto page = static_cast<size_t>(sysconf(_SC_PAGESIZE));
+    void* pages = mmap(nullptr, kFreeBytes + page, PROT_READ | PROT_WRITE,
+                       MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+    if (pages == MAP_FAILED) std::abort();
+    ends_of_pages.push_back(static_cast<uint8_t*>(pages) + kFreeBytes);
+    if (mprotect(ends_of_pages.back(), page, PROT_NONE) != 0) std::abort();
+  }
+  return ends_of_pages[ends_in_use++];
 }
-
-GuardedBytes::~GuardedBytes() { free_slot_ends.push_back(page_end_); }
 
 }  // namespace qz::test
 

@@ -7,17 +7,12 @@
 
 #include <algorithm>
 #include <cmath>
-#include <tuple>
 #include <vector>
 
-#include "random.h"
+#include "random_layer.h"
 
 namespace qz::test {
 namespace {
-
-size_t Pick(Random& random, size_t low, size_t high) {
-  return low + random.Next() % (high - low + 1);
-}
 
 int64_t Saturate(int64_t value, int bits) {
   const int64_t limit = int64_t{1} << (bits - 1);
@@ -38,120 +33,51 @@ int8_t Requantise(int32_t sum, float scale, const orra_fp32_requant_params& para
 }
 
 int8_t Requantise(int32_t sum, const orra_rndnu_requant_params& params) {
-  const int32_t shift = params.pre_shift;
-  const int64_t shifted = shift < 0 ? sum >> -shift : sum * (int64_t{1} << shift);
+  // Further shifts change nothing any more.
+  const int32_t shift = std::clamp(params.pre_shift, -32, 32);
+  const int64_t shifted = shift < 0 ? int64_t{sum} >> -shift : sum * (int64_t{1} << shift);
   const int64_t product = Saturate((Saturate(shifted, 32) * params.multiplier) >> 31, 32);
   // One bit more than is kept, whose half goes upwards.
-  return AddZeroPointAndClamp(((product >> (-params.post_shift - 1)) + 1) >> 1, params);
+  return AddZeroPointAndClamp(((product >> (std::min(-params.post_shift, 60) - 1)) + 1) >> 1,
+                              params);
 }
 
-// Zero points are of int8, or now and then so far out that values beyond int16 would show.
-orra_fp32_requant_params RandomParams(Random& random) {
-  int64_t zero_point = random.Between(-128, 127);
-  if (random.Next() % 8 == 0) zero_point = zero_point < 0 ? INT16_MIN : INT16_MAX;
-  const auto low = static_cast<int8_t>(random.Between(-128, 0));
-  const auto high = static_cast<int8_t>(random.Between(low, 127));
-  return {static_cast<int16_t>(zero_point), low, high};
+int32_t Sum(const Layer& layer, size_t column, const int8_t* x) {
+  int64_t sum = layer.biases[column];
+  for (size_t i = 0; i < layer.inputs; ++i) sum += x[i] * layer.weights[i * layer.columns + column];
+  return static_cast<int32_t>(sum);
 }
-
-// Often with the factor whose product with the lowest sum saturates.
-orra_rndnu_requant_params RandomFixedParams(Random& random) {
-  const auto pre_shift = static_cast<int32_t>(random.Next() % 2 ? random.Between(-8, 31) : 0);
-  const auto factor = static_cast<int32_t>(random.Next() % 4 ? random.Next() : 1u << 31);
-  const auto post_shift = static_cast<int32_t>(random.Between(-31, -1));
-  const auto [zero_point, low, high] = RandomParams(random);
-  return {pre_shift, factor, post_shift, zero_point, low, high};
-}
-
-// weights[input][column]: the inputs are those of all taps, one tap after the other. Columns fill
-// up whole blocks, with no zeros, so that a use of those beyond the asked ones would show.
-struct Layer {
-  Layer(Random& random, size_t input_count, size_t column_count)
-      : inputs(input_count),
-        columns((column_count + 15) / 16 * 16),
-        weights(random.Fill<int8_t>(inputs * columns, -127, 127)) {
-    // Biases of any magnitude, with scales that bring them near int8, some beyond, some to halves.
-    for (size_t c = 0; c < columns; ++c) {
-      const int bits = static_cast<int>(random.Between(12, 31));
-      biases.push_back(static_cast<int32_t>(random.Between(INT32_MIN, INT32_MAX) >> (31 - bits)));
-      scales.push_back(std::ldexp(static_cast<float>(random.Between(1, 255)), -bits));
-      if (random.Next() % 4 == 0) MakeTelling(c, random.Next());
-    }
-  }
-
-  // Ties, a 1 that single precision loses, products beyond int32 and int16, sums that wrap: all
-  // but these with weights of 0.
-  void MakeTelling(size_t column, uint64_t choice) {
-    const std::pair<int32_t, float> kTelling[] = {
-        {1, 0.5f},      {3, 0.5f},          {(1 << 24) + 1, 0x1p-25f}, {INT32_MAX, 1e30f},
-        {-40000, 1.0f}, {INT32_MIN, 1e30f}, {INT32_MAX, 0x1p-24f},     {INT32_MIN, 0x1p-24f}};
-    std::tie(biases[column], scales[column]) = kTelling[choice % 8];
-    if (choice % 8 >= 6) return;
-    for (size_t i = 0; i < inputs; ++i) weights[i * columns + column] = 0;
-  }
-
-  int32_t Sum(size_t column, const int8_t* x) const {
-    int64_t sum = biases[column];
-    for (size_t i = 0; i < inputs; ++i) sum += x[i] * weights[i * columns + column];
-    return static_cast<int32_t>(sum);
-  }
-
-  std::vector<uint8_t> Pack(size_t block, bool with_scales) const {
-    std::vector<uint8_t> packed;
-    const auto append = [&](const auto* first) {
-      const auto* bytes = reinterpret_cast<const uint8_t*>(first);
-      packed.insert(packed.end(), bytes, bytes + block * sizeof *first);
-    };
-    for (size_t first = 0; first < columns; first += block) {
-      append(&biases[first]);
-      for (size_t i = 0; i < inputs; ++i) append(&weights[i * columns + first]);
-      if (with_scales) append(&scales[first]);
-    }
-    return packed;
-  }
-
-  size_t inputs, columns;
-  std::vector<int32_t> biases;
-  std::vector<int8_t> weights;
-  std::vector<float> scales;
-};
 
 // What versions for some processors may read, and none may use, behind a row.
 constexpr size_t kReadAhead = 16;
 constexpr int8_t kGuard = 0x5A;
 
-// A list names a row `offset` bytes before it, but the zero row as it is.
-const int8_t* Entry(const int8_t* row, const int8_t* zero, size_t offset) {
-  const uintptr_t distance = row == zero ? 0 : offset;
-  return reinterpret_cast<const int8_t*>(reinterpret_cast<uintptr_t>(row) - distance);
-}
-
 // Rows that hold all taps of a position one after the other give the plain kernels what the listed
 // rows of the taps give the indirect one.
 void CheckMatrixKernels(Random& random, size_t m, size_t n, size_t k) {
-  const size_t taps = Pick(random, 1, 4), inputs = taps * k, a_stride = inputs + Pick(random, 0, 9);
+  const size_t taps = random.Pick(1, 4), inputs = taps * k, a_stride = inputs + random.Pick(0, 9);
   const auto a = random.Fill<int8_t>(m * a_stride + kReadAhead, -128, 127);
-  const Layer layer(random, inputs, n);
-  const std::vector<uint8_t> packed = layer.Pack(8, true);
+  const Layer layer(random, inputs, n, 8);
+  const std::vector<uint8_t> packed = layer.Packed();
   const orra_fp32_requant_params params = RandomParams(random);
   const orra_rndnu_requant_params fixed_params = RandomFixedParams(random);
 
-  const size_t offset = 40000 * Pick(random, 0, 1);
-  const int8_t* const zero = &a[Pick(random, 0, taps - 1) * k];
+  const size_t offset = 40000 * random.Pick(0, 1);
+  const int8_t* const zero = &a[random.Pick(0, taps - 1) * k];
   std::vector<const int8_t*> list;
   for (size_t i = 0; i < 4 * taps; ++i) {
-    list.push_back(Entry(&a[std::min(i % 4, m - 1) * a_stride + i / 4 * k], zero, offset));
+    list.push_back(ListEntry(&a[std::min(i % 4, m - 1) * a_stride + i / 4 * k], zero, offset));
   }
 
-  const size_t block = 8 + Pick(random, 0, 3), stride = (n + 7) / 8 * block + Pick(random, 0, 5);
+  const size_t block = 8 + random.Pick(0, 3), stride = (n + 7) / 8 * block + random.Pick(0, 5);
   std::vector<int8_t> expected(4 * stride + 16, kGuard);
   std::vector<int8_t> direct = expected, indirect = expected, fixed = expected;
   std::vector<int8_t> expected_fixed = expected;
   for (size_t j = 0; j < n; ++j) {
     const size_t place = j / 8 * block + j % 8;
-    expected_fixed[place] = Requantise(layer.Sum(j, a.data()), fixed_params);
+    expected_fixed[place] = Requantise(Sum(layer, j, a.data()), fixed_params);
     for (size_t r = 0; r < m; ++r) {
-      const int32_t sum = layer.Sum(j, &a[r * a_stride]);
+      const int32_t sum = Sum(layer, j, &a[r * a_stride]);
       expected[r * stride + place] = Requantise(sum, layer.scales[j], params);
     }
   }
@@ -161,7 +87,7 @@ void CheckMatrixKernels(Random& random, size_t m, size_t n, size_t k) {
       m, n, k, list.size() * sizeof list[0], list.data(), packed.data(), indirect.data(), stride,
       block, offset, zero, &params);
   orra_qs8_gemm_minmax_rndnu_ukernel_1x8__asm_aarch32_neon_mlal_lane_cortex_a7(
-      1, n, inputs, a.data(), a_stride, layer.Pack(8, false).data(), fixed.data(), stride, block,
+      1, n, inputs, a.data(), a_stride, layer.Packed(false).data(), fixed.data(), stride, block,
       &fixed_params);
   EXPECT_EQ(direct, expected);
   EXPECT_EQ(indirect, expected);
@@ -171,7 +97,7 @@ void CheckMatrixKernels(Random& random, size_t m, size_t n, size_t k) {
 TEST(MatrixKernels, EqualPlainSums) {
   Random random(1);
   for (size_t i = 0; i < 800 && !HasFailure(); ++i) {
-    const size_t m = 1 + i % 4, n = 1 + i / 4 % 20, k = Pick(random, 1, 132);
+    const size_t m = 1 + i % 4, n = 1 + i / 4 % 20, k = random.Pick(1, 132);
     SCOPED_TRACE(testing::Message() << "m " << m << " n " << n << " k " << k);
     CheckMatrixKernels(random, m, n, k);
   }
@@ -180,27 +106,27 @@ TEST(MatrixKernels, EqualPlainSums) {
 TEST(Depthwise, EqualsPlainSums) {
   Random random(4);
   for (size_t i = 0; i < 300; ++i) {
-    const size_t channels = 1 + i % 60, stride = channels + Pick(random, 0, 5);
-    const size_t width = Pick(random, 1, 4), step = Pick(random, 1, 4);
-    const Layer layer(random, 3, channels);
+    const size_t channels = 1 + i % 60, stride = channels + random.Pick(0, 5);
+    const size_t width = random.Pick(1, 4), step = random.Pick(1, 4);
+    const Layer layer(random, 3, channels, 16);
     const orra_fp32_requant_params params = RandomParams(random);
     const auto in = random.Fill<int8_t>(10 * channels + kReadAhead, -128, 127);
-    const size_t offset = 40000 * Pick(random, 0, 1);
+    const size_t offset = 40000 * random.Pick(0, 1);
     std::vector<const int8_t*> rows, list;
     while (rows.size() < width * step + 3) {
-      rows.push_back(&in[channels * Pick(random, 0, 9)]);
-      list.push_back(Entry(rows.back(), in.data(), offset));
+      rows.push_back(&in[channels * random.Pick(0, 9)]);
+      list.push_back(ListEntry(rows.back(), in.data(), offset));
     }
     std::vector<int8_t> out(width * stride + 16, kGuard), expected = out;
     for (size_t p = 0; p < width; ++p) {
       for (size_t c = 0, first = p * step; c < channels; ++c) {
         const std::vector<int8_t> x = {rows[first][c], rows[first + 1][c], rows[first + 2][c]};
-        expected[p * stride + c] = Requantise(layer.Sum(c, x.data()), layer.scales[c], params);
+        expected[p * stride + c] = Requantise(Sum(layer, c, x.data()), layer.scales[c], params);
       }
     }
     orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35(
-        channels, width, list.data(), layer.Pack(16, true).data(), out.data(),
-        step * sizeof list[0], stride - channels, offset, in.data(), &params);
+        channels, width, list.data(), layer.Packed().data(), out.data(), step * sizeof list[0],
+        stride - channels, offset, in.data(), &params);
     ASSERT_EQ(out, expected) << channels << " channels";
   }
 }
@@ -210,8 +136,8 @@ TEST(Depthwise, EqualsPlainSums) {
 TEST(MaxPool, EqualsPlainMaximum) {
   Random random(7);
   for (size_t i = 0; i < 4 * 40; ++i) {
-    const size_t pool_size = 1 + i % 4, channels = 1 + i / 4, positions = Pick(random, 1, 3);
-    const size_t gap = Pick(random, 0, 2), stride = channels + Pick(random, 0, 5);
+    const size_t pool_size = 1 + i % 4, channels = 1 + i / 4, positions = random.Pick(1, 3);
+    const size_t gap = random.Pick(0, 2), stride = channels + random.Pick(0, 5);
     const auto low = static_cast<int8_t>(random.Between(-128, 0));
     const orra_s8_clamp_params params{low, static_cast<int8_t>(random.Between(low, 127))};
     const auto in = random.Fill<int8_t>(20 * channels + kReadAhead, -128, 127);
@@ -220,7 +146,7 @@ TEST(MaxPool, EqualsPlainMaximum) {
     for (size_t p = 0; p < positions; ++p) {
       std::fill_n(&expected[p * stride], channels, low);
       for (size_t e = 0; e < pool_size; ++e) {
-        entries.push_back(channels * Pick(random, 0, 19));
+        entries.push_back(channels * random.Pick(0, 19));
         for (size_t c = 0; c < channels; ++c) {
           int8_t& largest = expected[p * stride + c];
           largest = std::clamp(in[entries.back() + c], largest, params.output_max);
