@@ -49,6 +49,7 @@ clip:
 test: build-host build-target clip
 	ctest --preset host
 	ctest --preset target
+	@grep -E '^[0-9]+ comparisons: |not compared: |kernels compared$$' build/target/Testing/Temporary/LastTest.log
 	build/host/bin/qz prove $(CLIP) build/host build/target
 	cmake --preset host-asan
 	cmake --build --preset host-asan --parallel $(JOBS)

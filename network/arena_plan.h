@@ -62,8 +62,8 @@ static_assert(PlanHolds(),
               "every tensor aligned, inside the arena and apart from its operator's input");
 
 constexpr size_t kConvolutionTaps = 3;
-constexpr size_t kTileRows = 4;
-constexpr size_t kTileEntries = kConvolutionTaps * kTileRows;
+constexpr size_t kRowsPerTile = 4;
+constexpr size_t kTileEntries = kConvolutionTaps * kRowsPerTile;
 
 // Depthwise convolution: one address a row. Output row j uses entries j, j + 1 and j + 2.
 template <size_t kRows>
@@ -81,8 +81,8 @@ constexpr std::array<const int8_t*, kTiles * kTileEntries> TileList(const int8_t
   std::array<const int8_t*, kTiles * kTileEntries> list{};
   const size_t last_row = in.rows - kConvolutionTaps;
   for (size_t i = 0; i < list.size(); ++i) {
-    const size_t out_row = i / kTileEntries * kTileRows + i % kTileRows;
-    const size_t tap = i % kTileEntries / kTileRows;
+    const size_t out_row = i / kTileEntries * kRowsPerTile + i % kRowsPerTile;
+    const size_t tap = i % kTileEntries / kRowsPerTile;
     const size_t row = (out_row < last_row ? out_row : last_row) + tap;
     list[i] = arena + in.offset + row * in.channels;
   }
