@@ -1,6 +1,5 @@
 #include "prove_command.h"
 
-#include <algorithm>
 #include <cstdio>
 #include <filesystem>
 
