@@ -71,7 +71,12 @@ void TracedBuild::Start(const std::vector<std::string>& command) {
   const int error = posix_spawnp(&process_, words[0], &files, &attributes, words.data(), environ);
   posix_spawnattr_destroy(&attributes);
   posix_spawn_file_actions_destroy(&files);
-  if (error == 0) return;
+  if (error == 0) {
+    // As the program does for itself: whoever comes first, the group is there from now on, also
+    // where posix_spawn() returns before the program has begun.
+    setpgid(process_, process_);
+    return;
+  }
   process_ = -1;
   throw BuildError(program_ + ": can't be started by " + command[0] + ": " + std::strerror(error));
 }
