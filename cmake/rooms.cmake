@@ -30,8 +30,24 @@ if(CMAKE_CROSSCOMPILING AND CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
   target_compile_options(qz_module_flags INTERFACE -fcallgraph-info=su)
 endif()
 
-set(QZ_KERNELS plain CACHE STRING "Whose kernels: plain (any processor's) or neon (AArch32)")
-set_property(CACHE QZ_KERNELS PROPERTY STRINGS plain neon)
+# On a PC the loader chooses among texts for its processors (kernels/x86_64/choices.h); elsewhere the
+# build does.
+if(CMAKE_SYSTEM_PROCESSOR MATCHES "^(x86_64|AMD64)$")
+  set(own_kernels x86_64)
+else()
+  set(own_kernels plain)
+endif()
+set(QZ_KERNELS ${own_kernels} CACHE STRING
+    "Whose kernels: plain (any processor's), neon (AArch32) or x86_64 (a PC's, chosen by the loader)")
+set_property(CACHE QZ_KERNELS PROPERTY STRINGS plain neon x86_64)
+
+# The instruction sets for which the kernels of this build may have texts of their own.
+set(QZ_TEXT_SETS ${QZ_KERNELS})
+if(QZ_KERNELS STREQUAL "x86_64")
+  set(QZ_TEXT_SETS avx2 avx512vnni)
+endif()
+set(QZ_FLAGS_avx2 -mavx2)
+set(QZ_FLAGS_avx512vnni -mavx2 -mavx512f -mavx512bw -mavx512vl -mavx512vnni)
 
 # qz_module_room(NAME SOURCES... LINKS... USES...): a room of the module, as a static library. Who links it
 # sees the rooms of LINKS too, which its headers include, but not those of USES.
@@ -42,38 +58,67 @@ function(qz_module_room name)
   target_link_libraries(${name} PUBLIC ${room_LINKS} PRIVATE ${room_USES} qz_module_flags)
 endfunction()
 
+# qz_kernel_texts(NAME SET SOURCES...): texts under names with __SET behind them, as a library.
+function(qz_kernel_texts name set)
+  qz_module_room(${name}_${set} SOURCES ${ARGN} LINKS ${name})
+  target_compile_options(
+    ${name}_${set}
+    PRIVATE "SHELL:-D \"QZ_TEXT(kernel)=kernel##__${set}\""
+            "SHELL:-include \"${CMAKE_SOURCE_DIR}/kernels/text_names.h\"")
+endfunction()
+
 # qz_kernel_room(NAME TEXTS rows... TABLES sources...): a room of kernels. A row names a text, NAME.cc,
-# and then the processors for which there is another, PROCESSOR/NAME.cc, that gives the same bytes.
-# Two libraries: NAME holds what runs in this build (its property VECTOR_TEXTS lists the texts that are
-# not plain); NAME_plain holds the plain texts, always, under names with __plain behind them, for those
-# who compare.
+# and then the instruction sets for which there is another, SET/NAME.cc, that gives the same bytes.
+#
+# The library NAME holds what runs in this build, under the kernels' own names: those of QZ_KERNELS, else
+# the plain texts; or on a PC the choice among NAME_plain, NAME_avx2 and NAME_avx512vnni. NAME_plain holds the
+# plain texts, always, under names of their own, for those who compare. The global property QZ_VECTOR_TEXTS
+# lists SET/NAME of all texts that are not plain.
 function(qz_kernel_room name)
   cmake_parse_arguments(room "" "" "TEXTS;TABLES" ${ARGN})
   file(GLOB unnamed RELATIVE ${CMAKE_CURRENT_SOURCE_DIR} */*.cc)
   foreach(row IN LISTS room_TEXTS)
-    separate_arguments(processors UNIX_COMMAND "${row}")
-    list(POP_FRONT processors text)
-    foreach(processor IN LISTS processors)
-      if(NOT ${processor}/${text}.cc IN_LIST unnamed)
-        message(FATAL_ERROR "${name}: the row '${row}' names ${processor}/${text}.cc, which does not exist")
-      endif()
-      list(REMOVE_ITEM unnamed ${processor}/${text}.cc)
-    endforeach()
+    separate_arguments(sets UNIX_COMMAND "${row}")
+    list(POP_FRONT sets text)
     list(APPEND plain ${text}.cc)
-    if(QZ_KERNELS IN_LIST processors)
-      list(APPEND running ${QZ_KERNELS}/${text}.cc)
-      list(APPEND vector_texts ${text})
-    else()
-      list(APPEND running ${text}.cc)
-    endif()
+    foreach(set IN LISTS sets)
+      if(NOT ${set}/${text}.cc IN_LIST unnamed)
+        message(FATAL_ERROR "${name}: the row '${row}' names ${set}/${text}.cc, which does not exist")
+      endif()
+      list(REMOVE_ITEM unnamed ${set}/${text}.cc)
+      list(APPEND texts_${set} ${set}/${text}.cc)
+      if(set IN_LIST QZ_TEXT_SETS)
+        list(APPEND vector_texts ${set}/${text})
+      endif()
+    endforeach()
+    foreach(set ${QZ_KERNELS} avx2)
+      if(set IN_LIST sets)
+        list(APPEND all_${set} ${set}/${text}.cc)
+      else()
+        list(APPEND all_${set} ${text}.cc)
+      endif()
+    endforeach()
   endforeach()
   if(unnamed)
     message(FATAL_ERROR "${name}: no row names ${unnamed}")
   endif()
-  qz_module_room(${name} SOURCES ${running} ${room_TABLES})
-  set_property(TARGET ${name} PROPERTY VECTOR_TEXTS "${vector_texts}")
-  qz_module_room(${name}_plain SOURCES ${plain} LINKS ${name})
-  target_compile_options(${name}_plain PRIVATE "SHELL:-include \"${CMAKE_SOURCE_DIR}/kernels/plain_names.h\"")
+
+  if(QZ_KERNELS STREQUAL "x86_64")
+    string(REPLACE _kernels _choice choice ${name})
+    qz_module_room(${name} SOURCES ${CMAKE_SOURCE_DIR}/kernels/x86_64/${choice}.cc ${room_TABLES})
+    qz_kernel_texts(${name} avx2 ${all_avx2})
+    target_compile_options(${name}_avx2 PRIVATE ${QZ_FLAGS_avx2})
+    target_link_libraries(${name} PUBLIC x86_64_processor PRIVATE ${name}_plain ${name}_avx2)
+    if(texts_avx512vnni)
+      qz_kernel_texts(${name} avx512vnni ${texts_avx512vnni})
+      target_compile_options(${name}_avx512vnni PRIVATE ${QZ_FLAGS_avx512vnni})
+      target_link_libraries(${name} PRIVATE ${name}_avx512vnni)
+    endif()
+  else()
+    qz_module_room(${name} SOURCES ${all_${QZ_KERNELS}} ${room_TABLES})
+  endif()
+  set_property(GLOBAL APPEND PROPERTY QZ_VECTOR_TEXTS ${vector_texts})
+  qz_kernel_texts(${name} plain ${plain})
 endfunction()
 
 # qz_room(NAME SOURCES... LINKS...): a room of the PC side, as a static library.

@@ -50,19 +50,18 @@ void Depthwise(const int8_t* const* in_rows, const void* w, Tensor out, int16_t 
 
 void Pointwise(Tensor in, const void* w, Tensor out) {
   const orra_fp32_requant_params params{kFromZero, kMin, kMax};
-  for (size_t row = 0; row < out.rows; row += kRowsPerTile) {
+  for (size_t row = 0; row < out.rows; row += kMostRows) {
     orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
-        std::min(out.rows - row, kRowsPerTile), out.channels, in.channels,
-        At(in) + row * in.channels, in.channels, w, At(out) + row * out.channels, out.channels,
-        kBlockStride, &params);
+        std::min(out.rows - row, kMostRows), out.channels, in.channels, At(in) + row * in.channels,
+        in.channels, w, At(out) + row * out.channels, out.channels, kBlockStride, &params);
   }
 }
 
 void Convolution(Tensor in, const int8_t* const* in_tiles, const void* w, Tensor out) {
   const orra_fp32_requant_params params{kFromZero, kMin, kMax};
-  for (size_t row = 0; row < out.rows; row += kRowsPerTile) {
+  for (size_t row = 0; row < out.rows; row += kMostRows) {
     orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
-        std::min(out.rows - row, kRowsPerTile), out.channels, in.channels,
+        std::min(out.rows - row, kMostRows), out.channels, in.channels,
         kTileEntries * sizeof(const int8_t*), in_tiles + row / kRowsPerTile * kTileEntries, w,
         At(out) + row * out.channels, out.channels, kBlockStride, 0, nullptr, &params);
   }

@@ -10,6 +10,7 @@
 #include <string>
 #include <vector>
 
+#include "kernel_versions.h"
 #include "prove_command.h"
 #include "run_command.h"
 
@@ -87,7 +88,8 @@ CLI::App* AddProve(CLI::App* app, ProveOptions* options) {
 
 int Main(int argc, char** argv) {
   CLI::App app("Sound event detector, run on a PC", "qz");
-  app.set_version_flag("--version", "qz " QZ_VERSION);
+  app.set_version_flag("--version",
+                       [] { return "qz " QZ_VERSION "\n" + qz::tools::KernelVersions(); });
   app.failure_message([](const CLI::App* parsed, const CLI::Error& error) {
     const auto commands = parsed->get_subcommands();
     const std::string command = commands.empty() ? "" : commands[0]->get_name() + " ";

@@ -24,6 +24,14 @@
 #include <cstddef>
 #include <cstdint>
 
+// Rows that one call of the matrix kernels with float scales may have. On a hub's processor that is
+// one tile; a PC's texts take any number, so that they unpack the weights once for all rows.
+#ifdef QZ_KERNELS_X86_64
+constexpr size_t kMostRows = SIZE_MAX;
+#else
+constexpr size_t kMostRows = 4;
+#endif
+
 extern "C" {
 
 // Requantisation by a float scale per column: round(float(acc) * scale), ties to even, then + zero
@@ -64,20 +72,22 @@ static_assert(sizeof(orra_fp32_requant_params) == 4 && sizeof(orra_rndnu_requant
                   sizeof(orra_s8_clamp_params) == 2 && sizeof(orra_dequant_params) == 8,
               "records have no gaps");
 
-// Matrix product of up to 4 rows: for r < m and j < n,
+// Matrix product of a few rows: for r < m and j < n,
 //   c[r][j] = requantise_j(bias[j] + sum over i < k of a[r][i] * weight[i][j]).
 // a: [m][k] int8, rows a_stride bytes apart; w: GEMM blocks; c: [m][n] int8, rows c_stride bytes
-// apart, each block of 8 columns c_block_stride bytes after the one before (8: dense). m is 1 to 4.
+// apart, each block of 8 columns c_block_stride bytes after the one before (8: dense). m: 1 to
+// kMostRows.
 void orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
     size_t m, size_t n, size_t k, const int8_t* a, size_t a_stride, const void* w, int8_t* c,
     size_t c_stride, size_t c_block_stride, const orra_fp32_requant_params* params);
 
 // The same over listed rows, summed over taps: convolution without copying rows together.
 //   c[r][j] = requantise_j(bias[j] + sum over t and i < k of row(t, r)[i] * weight[t][i][j])
-// a_ptrs: [taps][4] row addresses, always 4 a tap (those of rows m to 3 readable, their results not
-// written); tap_bytes: size of that list, taps * 4 * sizeof(pointer). An entry equal to `zero` is
-// used as it stands (k bytes of the input zero point); a_offset bytes are added to every other. w:
-// indirect GEMM blocks; c, c_stride, c_block_stride, m: as above.
+// a_ptrs: [(m + 3) / 4][taps][4] row addresses, a list for each tile of 4 rows. The last one is
+// full too (the rows that it names in excess readable, their results not written); tap_bytes: size
+// of one list, taps * 4 * sizeof(pointer). An entry equal to `zero` is used as it stands (k bytes
+// of the input zero point); a_offset bytes are added to every other. w: indirect GEMM blocks; c,
+// c_stride, c_block_stride, m: as above.
 void orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
     size_t m, size_t n, size_t k, size_t tap_bytes, const int8_t* const* a_ptrs, const void* w,
     int8_t* c, size_t c_stride, size_t c_block_stride, size_t a_offset, const int8_t* zero,

@@ -1,5 +1,5 @@
-// What the lists of kernels are made of: the texts that run in this build are held against the
-// plain ones, byte for byte, and their instructions are counted side by side.
+// What the lists of kernels are made of: the texts for some processors are held against the plain
+// ones, byte for byte, and what they cost is measured side by side.
 #pragma once
 
 #include <algorithm>
@@ -16,24 +16,49 @@
 
 namespace qz::test {
 
-// The two texts of a kernel: text[0], which runs in this build, and text[1], the plain one.
+// The texts of a kernel that stand beside each other in this build.
+#ifdef QZ_KERNELS_X86_64
+enum Side { kPlain, kPlainForAvx2, kAvx2, kAvx512Vnni, kSides };
+// As rows in kernels/*/CMakeLists.txt name them; the second is the plain text, compiled for AVX2.
+constexpr const char* kSets[kSides] = {"", "", "avx2", "avx512vnni"};
+#else
+enum Side { kPlain, kRunning, kSides };
+constexpr const char* kSets[kSides] = {"", QZ_KERNELS};
+#endif
+
 template <typename Function>
 struct Texts {
-  constexpr Texts(std::string_view kernel, Function* running, Function* plain)
-      : name(kernel), text{running, plain} {}
   std::string_view name;
-  Function* text[2];
+  Function* text[kSides];  // null where there is none
 };
 
-// Defines a kernel's Texts and declares its plain text.
+// Defines a kernel's Texts and declares those that have a name of their own.
+#ifdef QZ_KERNELS_X86_64
+#define QZ_TEXTS(texts, kernel)                                                      \
+  extern "C" decltype(kernel) kernel##__plain, kernel##__avx2_plain, kernel##__avx2; \
+  constexpr Texts<decltype(kernel)> texts {                                          \
+#kernel, { kernel##__plain, kernel##__avx2_plain, kernel##__avx2, nullptr }      \
+  }
+#define QZ_TEXTS_AND_AVX512VNNI(texts, kernel)                                               \
+  extern "C" decltype(kernel) kernel##__plain, kernel##__avx2_plain, kernel##__avx2,         \
+      kernel##__avx512vnni;                                                                  \
+  constexpr Texts<decltype(kernel)> texts {                                                  \
+#kernel, { kernel##__plain, kernel##__avx2_plain, kernel##__avx2, kernel##__avx512vnni } \
+  }
+#else
 #define QZ_TEXTS(texts, kernel)                \
   extern "C" decltype(kernel) kernel##__plain; \
-  constexpr Texts texts { #kernel, kernel, kernel##__plain }
+  constexpr Texts<decltype(kernel)> texts {    \
+#kernel, { kernel##__plain, kernel }       \
+  }
+#define QZ_TEXTS_AND_AVX512VNNI(texts, kernel) QZ_TEXTS(texts, kernel)
+#endif
 
-// Random numbers of one comparison; a failure names those that were picked.
+// Random numbers of one comparison of a text with the plain one; a failure names those that were
+// picked.
 class CaseRandom : public Random {
  public:
-  using Random::Random;
+  CaseRandom(uint64_t seed, Side compared) : Random(seed), side(compared) {}
   size_t Pick(const char* name, size_t low, size_t high) {
     picked_.emplace_back(name, Random::Pick(low, high));
     return picked_.back().second;
@@ -44,26 +69,19 @@ class CaseRandom : public Random {
     return text;
   }
 
+  const Side side;
+
  private:
   std::vector<std::pair<const char*, size_t>> picked_;
 };
 
 struct Kernel {
-  Kernel(std::string_view kernel, std::string_view row) : name(kernel), text(row) {}
-  // `call` is a function of std::true_type for the plain text and std::false_type for the other,
-  // so that the choice costs no instruction.
-  template <typename Call>
-  Kernel(std::string_view kernel, std::string_view row, std::string (*comparison)(CaseRandom&),
-         Call call)
-      : name(kernel), text(row), compare(comparison), run(call), run_plain(call) {}
-
   std::string_view name;
   std::string_view text;  // its row in the room's CMakeLists.txt
   // Null where no build has another text than the plain one. A comparison gives what differs, or
   // nothing; a run is one call as the graphs make it, always on the same data.
   std::string (*compare)(CaseRandom& random) = nullptr;
-  void (*run)(std::false_type) = nullptr;
-  void (*run_plain)(std::true_type) = nullptr;
+  void (*run)(Side side) = nullptr;
 };
 
 std::vector<Kernel> SignalKernels();
@@ -88,17 +106,17 @@ const T* Place(Random& random, const std::vector<T>& values, size_t readable = 0
 // whatever one text alone writes shows. Empty, or the first value that differs, counted from the
 // output's first.
 template <typename Function, typename T, typename Call>
-std::string Difference(Random& random, const Texts<Function>& texts, const std::vector<T>& contents,
-                       const Call& call) {
+std::string Difference(CaseRandom& random, const Texts<Function>& texts,
+                       const std::vector<T>& contents, const Call& call) {
   constexpr ptrdiff_t kGuard = 64 / sizeof(T);
-  std::vector<T> running = RandomValues<T>(random, contents.size() + 2 * kGuard);
-  std::copy(contents.begin(), contents.end(), running.begin() + kGuard);
-  std::vector<T> plain = running;
-  call(texts.text[0], running.data() + kGuard);
-  call(texts.text[1], plain.data() + kGuard);
-  const auto [at, plain_at] = std::mismatch(running.begin(), running.end(), plain.begin());
-  if (at == running.end()) return "";
-  return "value " + std::to_string(at - running.begin() - kGuard) + " of the output's " +
+  std::vector<T> compared = RandomValues<T>(random, contents.size() + 2 * kGuard);
+  std::copy(contents.begin(), contents.end(), compared.begin() + kGuard);
+  std::vector<T> plain = compared;
+  call(texts.text[random.side], compared.data() + kGuard);
+  call(texts.text[kPlain], plain.data() + kGuard);
+  const auto [at, plain_at] = std::mismatch(compared.begin(), compared.end(), plain.begin());
+  if (at == compared.end()) return "";
+  return "value " + std::to_string(at - compared.begin() - kGuard) + " of the output's " +
          std::to_string(contents.size()) + " is " + std::to_string(*at) + ", by the plain text " +
          std::to_string(*plain_at);
 }

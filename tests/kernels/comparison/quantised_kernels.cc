@@ -145,29 +145,27 @@ constexpr auto kRowList = [] {
 std::vector<Kernel> QuantisedKernels() {
   return {
       {kGemm.name, "gemm", CompareGemm,
-       [](auto plain) {
-         kGemm.text[plain](4, kChannels, 48, in_rows, 48, weights, out_rows, kChannels, 8,
-                           &kParams);
+       [](Side side) {
+         kGemm.text[side](4, kChannels, 48, in_rows, 48, weights, out_rows, kChannels, 8, &kParams);
        }},
       {kIndirectGemm.name, "indirect_gemm", CompareIndirectGemm,
-       [](auto plain) {
-         kIndirectGemm.text[plain](4, kChannels, kChannels, 12 * sizeof kRowList[0],
-                                   kRowList.data(), weights, out_rows, kChannels, 8, 0, nullptr,
-                                   &kParams);
+       [](Side side) {
+         kIndirectGemm.text[side](4, kChannels, kChannels, 12 * sizeof kRowList[0], kRowList.data(),
+                                  weights, out_rows, kChannels, 8, 0, nullptr, &kParams);
        }},
       {kFixedPointGemm.name, "fixed_point_gemm", CompareFixedPointGemm,
-       [](auto plain) {
-         kFixedPointGemm.text[plain](1, 64, kChannels, in_rows, kChannels, weights, out_rows, 64, 8,
-                                     &kFixedParams);
+       [](Side side) {
+         kFixedPointGemm.text[side](1, 64, kChannels, in_rows, kChannels, weights, out_rows, 64, 8,
+                                    &kFixedParams);
        }},
       {kDepthwise.name, "depthwise", CompareDepthwise,
-       [](auto plain) {
-         kDepthwise.text[plain](48, 380, kRowList.data(), weights, out_rows, sizeof kRowList[0], 0,
-                                0, nullptr, &kParams);
+       [](Side side) {
+         kDepthwise.text[side](48, 380, kRowList.data(), weights, out_rows, sizeof kRowList[0], 0,
+                               0, nullptr, &kParams);
        }},
       {kMaxPool.name, "max_pool", CompareMaxPool,
-       [](auto plain) {
-         kMaxPool.text[plain](190, 2, kChannels, kRowList.data(), 0, out_rows, 0, 0, &kClamp);
+       [](Side side) {
+         kMaxPool.text[side](190, 2, kChannels, kRowList.data(), 0, out_rows, 0, 0, &kClamp);
        }},
       {"orra_qs8_f32_vcvt_ukernel__neon_x32", "conversion"},
       {"orra_x8_lut_ukernel__scalar_x2", "lookup"},

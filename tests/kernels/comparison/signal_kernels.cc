@@ -91,23 +91,23 @@ constexpr uint8_t kWidths[49] = {1, 1, 2, 1, 2, 1, 2, 2, 1, 2,  2,  2,  3,  2,  
 std::vector<Kernel> SignalKernels() {
   return {
       {kWindow.name, "window", CompareWindow,
-       [](auto plain) { kWindow.text[plain](1, 800, samples, table, samples, 12); }},
+       [](Side side) { kWindow.text[side](1, 800, samples, table, samples, 12); }},
       {"orra_s16_rmaxabs_ukernel__neon_x32", "peak"},
       {"orra_i16_vlshift_ukernel__neon_x32", "left_shift"},
       {kFirstStage.name, "fft_butterflies", CompareFirstStage,
-       [](auto plain) { kFirstStage.text[plain](4, 0, samples, nullptr, 0); }},
+       [](Side side) { kFirstStage.text[side](4, 0, samples, nullptr, 0); }},
       {kSecondStage.name, "fft_butterflies", CompareSecondStage,
-       [](auto plain) { kSecondStage.text[plain](4, 16, samples, nullptr, 0); }},
+       [](Side side) { kSecondStage.text[side](4, 16, samples, nullptr, 0); }},
       {kLaterStage.name, "fft_butterflies", CompareLaterStage,
-       [](auto plain) {
-         kLaterStage.text[plain](4, 64, samples, table, 16);
-         kLaterStage.text[plain](1, 256, samples, table, 4);
+       [](Side side) {
+         kLaterStage.text[side](4, 64, samples, table, 16);
+         kLaterStage.text[side](1, 256, samples, table, 4);
        }},
       {kSplit.name, "fft_real_split", CompareSplit,
-       [](auto plain) { kSplit.text[plain](256, samples, table); }},
+       [](Side side) { kSplit.text[side](256, samples, table); }},
       {"orra_cs16_vsquareabs_ukernel__neon_mlal_ld128_x8", "power_spectrum"},
       {kFilterbank.name, "filterbank", CompareFilterbank,
-       [](auto plain) { kFilterbank.text[plain](48, levels, kWidths, weights, energies); }},
+       [](Side side) { kFilterbank.text[side](48, levels, kWidths, weights, energies); }},
       {"orra_u64_u32_vsqrtshift_ukernel__scalar_cvtu32_sqrt_cvtu32f64_x1", "square_root"},
       {"orra_u32_filterbank_subtract_ukernel__scalar_x2", "noise_subtraction"},
       {"orra_u32_vlog_ukernel__scalar_x1", "logarithm"},

@@ -1,0 +1,16 @@
+// What the PC's processor can do, of what a kernel has a text for.
+#pragma once
+
+namespace qz {
+
+enum class InstructionSet {
+  kBaseline,    // what every x86-64 processor has: SSE2
+  kAvx2,        // 256-bit integers
+  kAvx512Vnni,  // kAvx2, and sums of byte products on 256-bit vectors (AVX512-VNNI, AVX512VL)
+};
+
+// The largest that both the processor and the operating system offer. Apart in a library, so that a
+// program can pretend to have less.
+InstructionSet BestInstructionSet();
+
+}  // namespace qz
