@@ -1,11 +1,20 @@
 #!/usr/bin/env bash
-# Runs every benchmark of build/host, then measures `qz run` on ten minutes of recorded sound.
+# Runs every benchmark of build/host, then measures `qz run` on an hour of recorded sound: as the
+# detector takes it, and as it must be decoded, mixed down and resampled.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 
 clip=build/host/clip.wav
-ten_minutes=build/host/ten_minutes.wav
-length_s=600
+length_s=3600
+
+# An hour of the clip over and over, in the format that the name's ending tells.
+make_hour() {
+  local out=$1 rate_hz=$2 channels=$3
+  [ ! -e "$out" ] || return 0
+  local part=${out%/*}/part-${out##*/}
+  sox -D -G "$clip" -b 16 "$part" rate "$rate_hz" channels "$channels" repeat - trim 0 "$length_s"
+  mv "$part" "$out"
+}
 
 ran=0
 for bench in build/host/bin/*_bench; do
@@ -16,11 +25,9 @@ for bench in build/host/bin/*_bench; do
 done
 [ "$ran" -gt 0 ] || { echo "bench.sh: no benchmark in build/host/bin" >&2; exit 1; }
 
-if [ ! -e "$ten_minutes" ]; then
-  # As the detector takes it, so that its own speed is measured.
-  sox -D -G "$clip" -b 16 "$ten_minutes.part.wav" rate 16000 channels 1 repeat - \
-    trim 0 "$length_s"
-  mv "$ten_minutes.part.wav" "$ten_minutes"
-fi
-echo "== qz run $ten_minutes"
-build/host/bin/qz run "$ten_minutes" 2>&1 | grep -E 'taken as it is|^summary|heap blocks|speed'
+make_hour build/host/hour.wav 16000 1
+make_hour build/host/hour.flac 44100 2
+for hour in build/host/hour.wav build/host/hour.flac; do
+  echo "== qz run $hour"
+  build/host/bin/qz run "$hour" 2>&1 | grep -E ' Hz, |^summary|heap blocks|speed'
+done

@@ -29,7 +29,10 @@ class SoundFileInput final : public AudioInput {
   };
 
   void CheckHeader() const;
+  bool TakenAsItIs() const;
   void ConvertBlock();
+  sf_count_t ReadBlock();
+  sf_count_t ReadAndConvertBlock();
   void CheckFinite(size_t frames) const;
   void CheckEnd() const;
   bool LengthKnown() const { return info_.frames < SF_COUNT_MAX; }

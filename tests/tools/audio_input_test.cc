@@ -73,17 +73,21 @@ TEST_F(AudioInputTest, Mono16BitAt16KhzPassesThroughBitForBit) {
 
 TEST_F(AudioInputTest, ChannelsAreAveraged) {
   // The sum would overflow 16 bits, a choice of one channel would show.
-  const std::vector<int16_t> frames = {32767, 32767, 32767, 3, 0, 0, -32768, -32768, -32765};
-  const std::string path = WriteSound("three.wav", kWav16, 16000, 3, frames);
+  const std::vector<int16_t> two = {32767, 32767, 3, 0, -32768, -32767, 5, 0, 0, 8};
+  EXPECT_EQ(ReadFile(WriteSound("two.wav", kWav16, 16000, 2, two)),
+            (std::vector<int16_t>{32767, 2, -32768, 2, 4}));
+  const std::vector<int16_t> three = {32767, 32767, 32767, 3, 0, 0, -32768, -32768, -32765};
+  const std::string path = WriteSound("three.wav", kWav16, 16000, 3, three);
   EXPECT_EQ(ReadFile(path), (std::vector<int16_t>{32767, 1, -32767}));
   EXPECT_THAT(OpenAudio(path, false)->Description(), HasSubstr("3 channels, mixed down to mono"));
 }
 
 TEST_F(AudioInputTest, FloatsSaturateAndRoundToEven) {
-  std::vector<float> values = {32768, 3e38f, -32768, -3e38f, 0.5f, 1.5f, -0.6f};
+  std::vector<float> values = {32768, 3e38f, -32768, -3e38f, 0.5f, 1.5f, -0.6f, 32766.5f, -2.5f};
   for (float& value : values) value /= 32768;
   const std::string path = WriteSound("f.wav", kWavFloat, 16000, 1, values);
-  EXPECT_EQ(ReadFile(path), (std::vector<int16_t>{32767, 32767, -32768, -32768, 0, 2, -1}));
+  EXPECT_EQ(ReadFile(path),
+            (std::vector<int16_t>{32767, 32767, -32768, -32768, 0, 2, -1, 32766, -2}));
   EXPECT_THAT(OpenAudio(path, false)->Description(), HasSubstr("rounded to 16 bits"));
 }
 
@@ -130,6 +134,8 @@ TEST_F(AudioInputTest, UnusableFilesAreNamedInOneLine) {
       {WriteSound<int16_t>("wide.wav", kWav16, 16000, 65, {}), "65 channels, should be 1 "},
       {WriteSound("nan.wav", kWavFloat, 16000, 2, frames),
        "frame 9000, channel 1: the sample is not a number"},
+      {WriteSound<float>("infinite.wav", kWavFloat, 16000, 1, {0, 0, 0, 0, -HUGE_VALF}),
+       "frame 4, channel 0: the sample is infinite"},
   };
   for (const auto& [path, wrong] : cases) {
     EXPECT_THAT(ErrorOf(path),
