@@ -5,16 +5,22 @@ JOBS ?= $(shell nproc)
 CLIP := build/host/clip.wav
 AUDIO ?= $(CLIP)
 
+# Which kernels the comparison has held against their plain texts, out of a log of CTest.
+SHOW_COMPARISONS := grep -E '^[0-9]+ comparisons: |not compared: |^[0-9]+ texts of [0-9]+ kernels '
+
 # Parallelism is the builds' own; two set-ups at a time would fight over dpkg's lock.
 .NOTPARALLEL:
 
-.PHONY: help run test bench footprint kernel-gains lint setup clean configure-host build-host build-target clip
+.PHONY: help run test bench bench-peers counts footprint kernel-gains lint setup clean configure-host build-host \
+        build-target clip
 
 help:
 	@echo 'make run               build, then run the detector on a clip of recorded sound'
 	@echo 'make run AUDIO=FILE    the same on a sound file of your own'
 	@echo 'make test              build and test for this PC, for the device, under the sanitizers'
 	@echo 'make bench             time the kernels, the graphs and the whole program'
+	@echo 'make bench-peers       time ours and the libraries that others would use, in one table'
+	@echo 'make counts            count instructions on this PC; compare with bench/instruction_counts.txt'
 	@echo 'make footprint         measure bytes, stack and instructions; compare with docs/footprint.md'
 	@echo 'make kernel-gains      instructions of each kernel: its plain text, and the one that runs'
 	@echo 'make lint              check formatting and the rules of clang-tidy'
@@ -22,7 +28,7 @@ help:
 	@echo 'make clean             remove everything that was built'
 
 setup:
-	@scripts/setup-debian.sh build clip lint target
+	@scripts/setup-debian.sh
 
 configure-host:
 	@scripts/setup-debian.sh build
@@ -48,8 +54,10 @@ clip:
 
 test: build-host build-target clip
 	ctest --preset host
+	@$(SHOW_COMPARISONS) build/host/Testing/Temporary/LastTest.log
+	ctest --preset host-without-avx2
 	ctest --preset target
-	@grep -E '^[0-9]+ comparisons: |not compared: |kernels compared$$' build/target/Testing/Temporary/LastTest.log
+	@$(SHOW_COMPARISONS) build/target/Testing/Temporary/LastTest.log
 	build/host/bin/qz prove $(CLIP) build/host build/target
 	cmake --preset host-asan
 	cmake --build --preset host-asan --parallel $(JOBS)
@@ -57,6 +65,17 @@ test: build-host build-target clip
 
 bench: build-host clip
 	scripts/bench.sh
+
+# The programs that time other libraries stand outside this tree, in the folder PEERS. UPDATE=1 rewrites
+# docs/performance.md.
+PEERS ?= ../shared/peers
+bench-peers: build-host
+	UPDATE=$(UPDATE) scripts/bench-peers.sh $(PEERS)
+
+# UPDATE=1 commits to what is counted.
+counts: build-host
+	@scripts/setup-debian.sh counts
+	scripts/instruction-counts.py $(if $(UPDATE),--update)
 
 # UPDATE=1 commits to what is measured: rewrites docs/footprint.md and the README's table.
 footprint: configure-host build-target

@@ -1,7 +1,8 @@
-// Runs a frame, a run of the network, a pass and a whole audio event on the device's processor,
-// each between two marks, for the instruction counter; scripts/footprint makes averages of them.
-// Prints a line for each kind, in the order of the marks: its name and how many pairs of marks it
-// has.
+// Runs a frame, a run of the network, a pass and a whole audio event, each between two marks, for
+// the emulator's instruction counter on the device's processor; scripts/footprint makes averages of
+// them. Prints a line for each kind, in the order of the marks: its name and how many pairs of
+// marks it has. On a PC scripts/instruction-counts.py runs it under callgrind, which needs no
+// marks.
 //
 // The module's rooms are linked in, over a runtime that does next to nothing, so that its own
 // instructions hardly count.
@@ -150,7 +151,7 @@ int main() {
   Count("event", kPasses, nothing, event);
   nanoappEnd();
   if (reports != kPasses) {
-    std::fprintf(stderr, "target_counts: %u reports, should be %d\n", reports, kPasses);
+    std::fprintf(stderr, "counts: %u reports, should be %d\n", reports, kPasses);
     return 1;
   }
   return 0;

@@ -129,11 +129,25 @@ function(qz_room name)
   target_link_libraries(${name} PUBLIC ${room_LINKS} PRIVATE qz_flags)
 endfunction()
 
-# qz_test(NAME SOURCES... LINKS...): one suite, run by CTest as one test that fails when it holds none.
+# qz_test(NAME SOURCES... LINKS... [STARTS_PROGRAMS]): one suite, run by CTest as one test that fails when it
+# holds none. On a PC it runs once more, under the label without_avx2, on an emulated processor; not so
+# where it STARTS_PROGRAMS, which would run on this one.
 function(qz_test name)
-  cmake_parse_arguments(test "" "" "SOURCES;LINKS" ${ARGN})
+  cmake_parse_arguments(test "STARTS_PROGRAMS" "" "SOURCES;LINKS" ${ARGN})
   add_executable(${name} ${test_SOURCES})
   target_link_libraries(${name} PRIVATE ${test_LINKS} qz_test_support qz_flags)
   add_test(NAME ${name} COMMAND ${name})
   set_tests_properties(${name} PROPERTIES TIMEOUT 900)
+  if(NOT test_STARTS_PROGRAMS)
+    qz_test_without_avx2(${name}_without_avx2 $<TARGET_FILE:${name}>)
+  endif()
+endfunction()
+
+# qz_test_without_avx2(NAME COMMAND...): a test on an emulated x86-64 processor of 2008.
+function(qz_test_without_avx2 name)
+  if(NOT QZ_KERNELS STREQUAL "x86_64" OR QZ_SANITIZE)
+    return()
+  endif()
+  add_test(NAME ${name} COMMAND qemu-x86_64 -cpu Nehalem ${ARGN})
+  set_tests_properties(${name} PROPERTIES TIMEOUT 900 LABELS without_avx2)
 endfunction()

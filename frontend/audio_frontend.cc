@@ -4,17 +4,17 @@
 #include <new>
 
 #include "audio_frontend_tables.h"
+#include "real_fft.h"
 #include "signal_kernels.h"
 
 namespace {
 
 using qz::frontend::kFeatureChannels;
+using qz::frontend::kFftEntries;
 using qz::frontend::kFrameSamples;
 using qz::frontend::w1;
-using qz::frontend::w3;
 using qz::frontend::w5;
 
-constexpr size_t kFftEntries = 256;  // complex; twice as many real samples
 constexpr size_t kFirstBin = 4;
 constexpr size_t kBins = 237;
 constexpr size_t kComplexBytes = 2 * sizeof(int16_t);
@@ -56,45 +56,6 @@ uint32_t NormalisingShift(uint16_t peak) {
   return leading_zeros >= 17 ? static_cast<uint32_t>(leading_zeros - 17) : 0;
 }
 
-void CopyComplex(int16_t* to, const int16_t* from) { std::memcpy(to, from, kComplexBytes); }
-
-// Loads the 16 FFT entries from `first` on. Entry i receives complex value r of the frame, the four
-// base-4 digits of i in reverse order, and 0 where r lies past the frame's 200 values. The last
-// digit of i weighs 64 in r and the one before it 16, so that of the entries whose last digit is 3
-// only the first of a block can lie inside.
-void LoadDigitReversed(const int16_t* frame, size_t first, int16_t* block) {
-  static_assert(kFrameSamples / 2 > 128 + 63 && kFrameSamples / 2 <= 192 + 16);
-  const size_t low_digits = (first / 64) + (first / 16 % 4) * 4;
-  const int16_t* values = frame + 2 * low_digits;
-  for (size_t digit = 0; digit < 4; ++digit) {
-    CopyComplex(block, values);
-    CopyComplex(block + 2, values + 2 * 64);
-    CopyComplex(block + 4, values + 2 * 128);
-    if (digit == 0 && 192 + low_digits < kFrameSamples / 2) {
-      CopyComplex(block + 6, values + 2 * 192);
-    } else {
-      std::memset(block + 6, 0, kComplexBytes);
-    }
-    values += 2 * 16;
-    block += 8;
-  }
-}
-
-// Real FFT of the frame, padded with zeros to 512 samples: bins 0 to 256, scaled by about 1/512.
-void RealFft(const int16_t* frame, int16_t* spectrum) {
-  for (size_t quarter = 0; quarter < kFftEntries; quarter += 64) {
-    for (size_t first = quarter; first < quarter + 64; first += 16) {
-      int16_t* block = spectrum + 2 * first;
-      LoadDigitReversed(frame, first, block);
-      orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4(4, 0, block, nullptr, 0);
-    }
-    orra_cs16_bfly4_samples4_ukernel__neon(4, 16, spectrum + 2 * quarter, nullptr, 0);
-  }
-  orra_cs16_bfly4_ukernel__neon_x4(4, 64, spectrum, w3.fft[0], 4 * kComplexBytes);
-  orra_cs16_bfly4_ukernel__neon_x4(1, 256, spectrum, w3.fft[0], kComplexBytes);
-  orra_cs16_fftr_ukernel__asm_aarch32_neon_x4(kFftEntries, spectrum, w3.split[0]);
-}
-
 }  // namespace
 
 int16_t* const audio_frontend_input_ptr = reinterpret_cast<int16_t*>(arena + kInput);
@@ -123,7 +84,7 @@ void audio_frontend_invoke(void) {
   orra_i16_vlshift_ukernel__neon_x32(kFrameSamples, windowed, normalised, *shift);
 
   int16_t* spectrum = Begin<int16_t, 2 * (kFftEntries + 1)>(kSpectrum);
-  RealFft(normalised, spectrum);
+  qz::frontend::RealFft(normalised, spectrum);
 
   uint32_t* power = Begin<uint32_t, kBins>(kPower);
   orra_cs16_vsquareabs_ukernel__neon_mlal_ld128_x8(kBins * kComplexBytes, spectrum + 2 * kFirstBin,

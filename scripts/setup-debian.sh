@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # Installs what is missing of the Debian packages that this project needs; silent when nothing is.
-# Usage: scripts/setup-debian.sh [build] [clip] [lint] [target]     (no argument: all groups)
+# Usage: scripts/setup-debian.sh [build] [clip] [counts] [lint] [target]     (no argument: all groups)
 set -euo pipefail
 
 packages_of() {
@@ -12,11 +12,12 @@ packages_of() {
       ;;
     clip) echo sox libsox-fmt-base alsa-utils sound-theme-freedesktop ;;
     lint) echo git clang-format clang-tidy ;;
+    counts) echo valgrind python3 ;;
     target)
       echo g++-arm-linux-gnueabihf qemu-user cmake ninja-build make python3 nanopb protobuf-compiler
       ;;
     *)
-      echo "setup-debian.sh: no such group: '$1', should be build, clip, lint or target" >&2
+      echo "setup-debian.sh: no such group: '$1', should be build, clip, counts, lint or target" >&2
       exit 2
       ;;
   esac
@@ -31,7 +32,7 @@ still_missing() {
   for package in "$@"; do installed "$package" || echo "$package"; done
 }
 
-[ $# -gt 0 ] || set -- build clip lint target
+[ $# -gt 0 ] || set -- build clip counts lint target
 wanted=()
 for group in "$@"; do
   names=$(packages_of "$group")

@@ -22,18 +22,18 @@ struct Choice {
 
 // clang-format off
 #define QZ_SIGNAL_CHOICES(ROW)                                                  \
-  ROW(orra_s16_window_shift12_ukernel__neon_x32, avx2_plain)                      \
+  ROW(orra_s16_window_shift12_ukernel__neon_x32, avx2)                      \
   ROW(orra_s16_rmaxabs_ukernel__neon_x32, avx2_plain)                             \
   ROW(orra_i16_vlshift_ukernel__neon_x32, avx2_plain)                             \
-  ROW(orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4, avx2_plain)          \
-  ROW(orra_cs16_bfly4_samples4_ukernel__neon, avx2_plain)                         \
-  ROW(orra_cs16_bfly4_ukernel__neon_x4, avx2_plain)                               \
-  ROW(orra_cs16_fftr_ukernel__asm_aarch32_neon_x4, avx2_plain)                    \
-  ROW(orra_cs16_vsquareabs_ukernel__neon_mlal_ld128_x8, avx2_plain)               \
-  ROW(orra_u32_filterbank_accumulate_ukernel__asm_aarch32_neon_x2, avx2_plain)    \
-  ROW(orra_u64_u32_vsqrtshift_ukernel__scalar_cvtu32_sqrt_cvtu32f64_x1, avx2_plain) \
-  ROW(orra_u32_filterbank_subtract_ukernel__scalar_x2, avx2_plain)                \
-  ROW(orra_u32_vlog_ukernel__scalar_x1, avx2_plain)
+  ROW(orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4, avx2)          \
+  ROW(orra_cs16_bfly4_samples4_ukernel__neon, avx2)                         \
+  ROW(orra_cs16_bfly4_ukernel__neon_x4, avx2)                               \
+  ROW(orra_cs16_fftr_ukernel__asm_aarch32_neon_x4, avx2)                    \
+  ROW(orra_cs16_vsquareabs_ukernel__neon_mlal_ld128_x8, avx2)               \
+  ROW(orra_u32_filterbank_accumulate_ukernel__asm_aarch32_neon_x2, avx2)    \
+  ROW(orra_u64_u32_vsqrtshift_ukernel__scalar_cvtu32_sqrt_cvtu32f64_x1, avx2) \
+  ROW(orra_u32_filterbank_subtract_ukernel__scalar_x2, avx2)                \
+  ROW(orra_u32_vlog_ukernel__scalar_x1, avx2)
 
 #define QZ_QUANTISED_CHOICES(ROW)                                                                 \
   ROW(orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35, avx2_plain)   \

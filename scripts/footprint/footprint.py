@@ -28,7 +28,7 @@ def instructions(build, counter):
     counts = {}
     with tempfile.TemporaryDirectory() as folder:
         marks = pathlib.Path(folder, "marks")
-        program = ["qemu-arm", "-plugin", f"{counter},out={marks}", str(build / "bin/target_counts")]
+        program = ["qemu-arm", "-plugin", f"{counter},out={marks}", str(build / "bin/counts")]
         printed = subprocess.run(program, check=True, text=True, stdout=subprocess.PIPE).stdout
         counted = [int(line) for line in marks.read_text().split()]
     spans = [b - a for a, b in zip(counted[2::2], counted[3::2])]
@@ -39,7 +39,7 @@ def instructions(build, counter):
             raise Failure(f"{name}: {len(own)} spans between marks, should be {times}")
         counts[name] = round(sum(own) / len(own) - counts.get("nothing", 0))
     if spans or counts.keys() != {"nothing", "frame", "network_run", "pass", "event"}:
-        raise Failure(f"target_counts tells of {sorted(counts)} and {len(spans)} spans more")
+        raise Failure(f"counts tells of {sorted(counts)} and {len(spans)} spans more")
     return counts
 
 

@@ -97,9 +97,10 @@ template <typename T>
 const T* Place(Random& random, const std::vector<T>& values, size_t readable = 0) {
   const size_t bytes = values.size() * sizeof(T);
   uint8_t* const behind = EndOfFreePages(bytes + readable) - readable;
-  std::memcpy(behind - bytes, values.data(), bytes);
+  T* const place = reinterpret_cast<T*>(behind - bytes);
+  std::copy(values.begin(), values.end(), place);
   std::generate_n(behind, readable, [&] { return static_cast<uint8_t>(random.Next()); });
-  return reinterpret_cast<const T*>(behind - bytes);
+  return place;
 }
 
 // Calls both texts with an output each that holds `contents` between random values, so that

@@ -1,5 +1,7 @@
 #include "signal_kernels.h"
 
+#include <array>
+
 #include "comparison.h"
 
 namespace qz::test {
@@ -10,7 +12,11 @@ QZ_TEXTS(kFirstStage, orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4);
 QZ_TEXTS(kSecondStage, orra_cs16_bfly4_samples4_ukernel__neon);
 QZ_TEXTS(kLaterStage, orra_cs16_bfly4_ukernel__neon_x4);
 QZ_TEXTS(kSplit, orra_cs16_fftr_ukernel__asm_aarch32_neon_x4);
+QZ_TEXTS(kPower, orra_cs16_vsquareabs_ukernel__neon_mlal_ld128_x8);
 QZ_TEXTS(kFilterbank, orra_u32_filterbank_accumulate_ukernel__asm_aarch32_neon_x2);
+QZ_TEXTS(kSquareRoot, orra_u64_u32_vsqrtshift_ukernel__scalar_cvtu32_sqrt_cvtu32f64_x1);
+QZ_TEXTS(kNoiseSubtraction, orra_u32_filterbank_subtract_ukernel__scalar_x2);
+QZ_TEXTS(kLogarithm, orra_u32_vlog_ukernel__scalar_x1);
 
 // A shaped fill, or values most of which are at either extreme, in no order.
 std::vector<int16_t> Samples(Random& random, size_t count) {
@@ -61,6 +67,13 @@ std::string CompareSplit(CaseRandom& random) {
                     [&](auto split, int16_t* data) { split(count, data, twiddles); });
 }
 
+std::string ComparePower(CaseRandom& random) {
+  const size_t count = random.Pick("count", 1, 40);
+  const int16_t* in = Place(random, Samples(random, 2 * count));
+  return Difference(random, kPower, RandomValues<uint32_t>(random, count),
+                    [&](auto power, uint32_t* out) { power(4 * count, in, out); });
+}
+
 std::string CompareFilterbank(CaseRandom& random) {
   const size_t rows = random.Pick("rows", 1, 8);
   const auto width_values =
@@ -75,13 +88,82 @@ std::string CompareFilterbank(CaseRandom& random) {
       [&](auto filterbank, uint64_t* out) { filterbank(rows, in, widths, weights, out); });
 }
 
-// The front end's data; what they hold changes no instruction count, but for the widths, which are
-// the front end's.
+// Values of all sizes: many beside a square or where the root steps up, halfway to the next, and
+// some from where the root of a 32-bit value would take 17 bits.
+std::vector<uint64_t> Radicands(Random& random, size_t count) {
+  std::vector<uint64_t> values(count);
+  for (uint64_t& v : values) {
+    v = random.Next() >> (random.Next() % 64);
+    const uint64_t shape = random.Next() % 8;
+    if (shape < 4) {
+      const uint64_t root = random.Next() >> (32 + random.Next() % 32);
+      v = root * root + (shape < 2 ? root : 0) + static_cast<uint64_t>(random.Between(-1, 1));
+    } else if (shape == 4) {
+      v = (uint64_t{1} << 32) + static_cast<uint64_t>(random.Between(-70000, 70000));
+    }
+  }
+  return values;
+}
+
+std::string CompareSquareRoot(CaseRandom& random) {
+  const size_t count = random.Pick("count", 1, 21);
+  const uint64_t* in = Place(
+      random, random.Next() % 4 ? Radicands(random, count) : RandomValues<uint64_t>(random, count));
+  const auto shift = static_cast<uint32_t>(random.Next() % 2 ? 0 : random.Pick("shift", 0, 70));
+  return Difference(random, kSquareRoot, RandomValues<uint32_t>(random, count),
+                    [&](auto root, uint32_t* out) { root(8 * count, in, out, shift); });
+}
+
+std::string CompareNoiseSubtraction(CaseRandom& random) {
+  const size_t count = 2 * random.Pick("count / 2", 1, 20);
+  const uint32_t* in = Place(random, ShapedFill<uint32_t>(random, count));
+  const auto factors = ShapedFill<uint32_t>(random, 5);
+  const auto scale = static_cast<uint32_t>(random.Pick("scale_bits", 0, 31));
+  const auto fraction = static_cast<uint32_t>(random.Pick("fraction_bits", 0, 63));
+  // The estimates, then the output.
+  std::vector<uint32_t> contents = ShapedFill<uint32_t>(random, count);
+  contents.resize(2 * count);
+  return Difference(random, kNoiseSubtraction, contents, [&](auto subtract, uint32_t* noise) {
+    subtract(count, in, factors[0], factors[1], factors[2], factors[3], factors[4], scale, fraction,
+             noise, noise + count);
+  });
+}
+
+std::string CompareLogarithm(CaseRandom& random) {
+  const size_t count = random.Pick("count", 0, 40);
+  std::vector<uint32_t> values = ShapedFill<uint32_t>(random, count);
+  if (random.Next() % 2) {
+    for (uint32_t& x : values)
+      x = static_cast<uint32_t>(random.Next() >> (32 + random.Next() % 32));
+  }
+  const uint32_t* in = Place(random, values);
+  const auto shift = static_cast<uint32_t>(random.Pick("input_shift", 0, 35));
+  const auto scale = static_cast<uint32_t>(random.Next() >> (32 + random.Next() % 32));
+  return Difference(random, kLogarithm, RandomValues<uint16_t>(random, count),
+                    [&](auto log, uint16_t* out) { log(count, in, shift, scale, out); });
+}
+
+// Values of `bits` bits at most, in no order.
+template <typename T>
+constexpr std::array<T, 48> Scattered(int bits) {
+  std::array<T, 48> values{};
+  for (size_t i = 0; i < values.size(); ++i) {
+    values[i] = static_cast<T>((i + 1) * 0x9E3779B97F4A7C15u >> (64 - bits));
+  }
+  return values;
+}
+
+// The front end's data. What they hold changes nothing that is counted or timed, but for the
+// widths, which are the front end's, and for channels of 0, for which the plain texts have less to
+// do.
 int16_t samples[514];
 int16_t table[2 * 256];
 uint16_t weights[2 * 237];
-uint32_t levels[237];
+uint32_t levels[237], noise[48], roots[48];
 uint64_t energies[48];
+uint16_t features[48];
+constexpr auto kEnergies = Scattered<uint64_t>(47);
+constexpr auto kAmplitudes = Scattered<uint32_t>(23);
 constexpr uint8_t kWidths[49] = {1, 1, 2, 1, 2, 1, 2, 2, 1, 2,  2,  2,  3,  2,  2, 3, 2,
                                  3, 3, 3, 4, 3, 3, 4, 4, 4, 4,  5,  5,  5,  5,  5, 6, 6,
                                  6, 7, 7, 7, 7, 8, 9, 8, 9, 10, 10, 11, 11, 11, 13};
@@ -95,9 +177,9 @@ std::vector<Kernel> SignalKernels() {
       {"orra_s16_rmaxabs_ukernel__neon_x32", "peak"},
       {"orra_i16_vlshift_ukernel__neon_x32", "left_shift"},
       {kFirstStage.name, "fft_butterflies", CompareFirstStage,
-       [](Side side) { kFirstStage.text[side](4, 0, samples, nullptr, 0); }},
+       [](Side side) { kFirstStage.text[side](64, 0, samples, nullptr, 0); }},
       {kSecondStage.name, "fft_butterflies", CompareSecondStage,
-       [](Side side) { kSecondStage.text[side](4, 16, samples, nullptr, 0); }},
+       [](Side side) { kSecondStage.text[side](16, 16, samples, nullptr, 0); }},
       {kLaterStage.name, "fft_butterflies", CompareLaterStage,
        [](Side side) {
          kLaterStage.text[side](4, 64, samples, table, 16);
@@ -105,12 +187,19 @@ std::vector<Kernel> SignalKernels() {
        }},
       {kSplit.name, "fft_real_split", CompareSplit,
        [](Side side) { kSplit.text[side](256, samples, table); }},
-      {"orra_cs16_vsquareabs_ukernel__neon_mlal_ld128_x8", "power_spectrum"},
+      {kPower.name, "power_spectrum", ComparePower,
+       [](Side side) { kPower.text[side](948, samples, levels); }},
       {kFilterbank.name, "filterbank", CompareFilterbank,
        [](Side side) { kFilterbank.text[side](48, levels, kWidths, weights, energies); }},
-      {"orra_u64_u32_vsqrtshift_ukernel__scalar_cvtu32_sqrt_cvtu32f64_x1", "square_root"},
-      {"orra_u32_filterbank_subtract_ukernel__scalar_x2", "noise_subtraction"},
-      {"orra_u32_vlog_ukernel__scalar_x1", "logarithm"},
+      {kSquareRoot.name, "square_root", CompareSquareRoot,
+       [](Side side) { kSquareRoot.text[side](384, kEnergies.data(), roots, 1); }},
+      {kNoiseSubtraction.name, "noise_subtraction", CompareNoiseSubtraction,
+       [](Side side) {
+         kNoiseSubtraction.text[side](48, kAmplitudes.data(), 655, 655, 15729, 15729, 819, 0, 14,
+                                      noise, levels);
+       }},
+      {kLogarithm.name, "logarithm", CompareLogarithm,
+       [](Side side) { kLogarithm.text[side](48, kAmplitudes.data(), 3, 16, features); }},
   };
 }
 

@@ -1,0 +1,38 @@
+#!/usr/bin/env bash
+# Times our kernels and the libraries that others would use instead, in interleaved rounds, and prints one
+# table; then our operators and kernels one by one. All of it stays in build/host/peers.
+#   bench-peers.sh PEERS      the folder with the peers' setup.sh and run.sh
+# PEERS_DIR (default a folder under /tmp) is where they are built; ROUNDS and BENCH_MAX_MS as run.sh says.
+# UPDATE=1 also rewrites docs/performance.md and its picture.
+set -euo pipefail
+cd "$(dirname "$0")/.."
+
+peers=$1
+[ -x "$peers/setup.sh" ] && [ -x "$peers/run.sh" ] || {
+  echo "bench-peers.sh: no setup.sh and run.sh in '$peers', should be the folder of the peers" \
+    "(make bench-peers PEERS=FOLDER)" >&2
+  exit 1
+}
+export PEERS_DIR=${PEERS_DIR:-${TMPDIR:-/tmp}/qz-peers}
+[ -x "$PEERS_DIR/bin/fftmix" ] || "$peers/setup.sh" >&2
+
+bin=$PWD/build/host/bin
+export PEERS_EXTRA=$PEERS_DIR/extra
+cat >"$PEERS_EXTRA" <<EXTRA
+$bin/peer_lines_Avx2
+$bin/peer_lines_Baseline
+EXTRA
+# Where the processor has more than AVX2, both we and the network library use it unless told not to.
+if grep -q ' avx512_vnni' /proc/cpuinfo; then
+  cat >>"$PEERS_EXTRA" <<EXTRA
+$bin/peer_lines
+ONEDNN_MAX_CPU_ISA=AVX2 $PEERS_DIR/bin/onednn | sed 's/|oneDNN [^ ]*/&, AVX2 only,/'
+EXTRA
+fi
+results=build/host/peers
+mkdir -p "$results"
+"$peers/run.sh" | tee "$results/table.md"
+cp "$PEERS_DIR/raw.txt" "$results"
+"$bin/peer_lines_Avx2" --parts >"$results/parts.txt"
+taskset -c $(($(nproc) > 1 ? 1 : 0)) "$bin/kernel_comparison_test" --time >"$results/gains.txt"
+[ -z "${UPDATE:-}" ] || scripts/performance/performance.py "$results"

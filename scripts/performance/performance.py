@@ -1,0 +1,115 @@
+#!/usr/bin/env python3
+"""Rewrites what docs/performance.md says of one `make bench-peers`, and its picture.
+
+Usage: performance.py FOLDER, which holds what bench-peers.sh left there:
+  table.md   the table of peers          raw.txt    its raw lines
+  parts.txt  our operators one by one    gains.txt  our kernels' texts side by side
+"""
+
+import pathlib
+import re
+import subprocess
+import sys
+
+sys.dont_write_bytecode = True
+
+from picture import Drawing
+
+ROOT = pathlib.Path(__file__).resolve().parents[2]
+PAGE, PICTURE = ROOT / "docs/performance.md", ROOT / "docs/performance.svg"
+MARKS = ("<!-- measured -->\n", "<!-- end of what is measured -->\n")
+PRODUCTS_A_CYCLE = 32  # two instructions of 16 exact products
+RUNS_A_PASS, FRAMES_A_PASS = 25 / 8, 200
+
+CONVOLUTION = 3 * 60 * 60
+# What each operator of the network multiplies; the others only compare, look up or convert.
+OPERATORS = {0: ("depthwise", 380 * 48 * 3), 1: ("pointwise", 380 * 48 * 60), 3: ("depthwise", 188 * 60 * 3),
+             4: ("pointwise", 188 * 60 * 60), 6: ("convolution", 92 * CONVOLUTION),
+             8: ("convolution", 44 * CONVOLUTION), 10: ("convolution", 20 * CONVOLUTION),
+             12: ("convolution", 8 * CONVOLUTION), 13: ("convolution", 6 * CONVOLUTION),
+             15: ("convolution", CONVOLUTION), 17: ("fully connected", 60 * 64), 18: ("fully connected", 64 * 5)}
+NETWORK_PRODUCTS = sum(products for _, products in OPERATORS.values())
+
+
+def fields(path, kind):
+    return [line.split("|") for line in path.read_text().splitlines() if line.startswith(kind + "|")]
+
+
+def quiet(raw, group, name):
+    times = [float(line[6]) for line in raw if line[1] == group and line[2] == name]
+    if not times:
+        sys.exit(f"performance.py: no line of '{name}' in group {group}")
+    return min(times)
+
+
+def machine(ghz):
+    cpu = re.search(r"model name\s*: (.*)", pathlib.Path("/proc/cpuinfo").read_text()).group(1)
+    family = [re.search(rf"^{key}\s*: (\d+)", pathlib.Path("/proc/cpuinfo").read_text(), re.MULTILINE).group(1)
+              for key in ("cpu family", "model")]
+    compiler = subprocess.run(["g++", "--version"], check=True, text=True, stdout=subprocess.PIPE).stdout
+    date = subprocess.run(["date", "+%-d %B %Y"], check=True, text=True, stdout=subprocess.PIPE,
+                          env={"LC_ALL": "C"}).stdout.strip()
+    return (f"{cpu}, family {family[0]}, model {family[1]}, {ghz:.3f} GHz as measured, a virtual machine; "
+            f"{compiler.splitlines()[0]}; {date}.")
+
+
+def gains(path):
+    """[(text, kernel, ns of plain, of plain for AVX2, of AVX2, of AVX512-VNNI)], 0 for what there is not."""
+    return [(*words[:2], *map(float, words[2:])) for words in map(str.split, path.read_text().splitlines())]
+
+
+def gains_table(rows):
+    lines = ["| Text | Kernel | SSE2 ns | for AVX2 ns | AVX2 ns | gain | AVX512-VNNI ns | gain |",
+             "|---|---|---|---|---|---|---|---|"]
+    for text, kernel, plain, compiled, avx2, vnni in rows:
+        kernel = re.sub(r"^orra_|_ukernel.*", "", kernel)
+        lines.append(f"| {text} | {kernel} | {plain:.0f} | {compiled:.0f} | " +
+                     (f"{avx2:.0f} | {compiled / avx2:.2f} | " if avx2 else " | | ") +
+                     (f"{vnni:.0f} | {compiled / vnni:.2f} |" if vnni else " | |"))
+    return lines
+
+
+def picture(raw, parts, limits, ghz):
+    drawing = Drawing()
+    drawing.heading("Part of the limit that is reached, AVX2, quiet time (limit: two instructions of 16 products a cycle)")
+    rows = []
+    for number, (kind, products) in OPERATORS.items():
+        reached = products / (parts[number] * ghz * 1e3)
+        rows.append((f"operator {number}, {kind}", reached / PRODUCTS_A_CYCLE,
+                     f"{parts[number]:5.2f} µs, {reached:.1f} MAC a cycle"))
+    network = quiet(raw, "A", "QZ, exact, AVX2")
+    reached = NETWORK_PRODUCTS / (network * ghz * 1e3)
+    rows.append(("the whole network", reached / PRODUCTS_A_CYCLE, f"{network:5.1f} µs, {reached:.1f} MAC a cycle"))
+    fft, frame = quiet(raw, "B-fft", "QZ, exact, AVX2"), quiet(raw, "B", "QZ, exact, AVX2")
+    rows.append(("512-point real FFT", limits["wide products"] / fft, f"{fft:.3f} µs (limit: its instructions alone)"))
+    drawing.limit_bars(rows)
+
+    drawing.heading("Where the time of a pass goes (2 s of sound: 200 frames, 25/8 runs of the network)")
+    groups = {}
+    for number, time in parts.items():
+        kind = OPERATORS.get(number, ("max pools and the rest", 0))[0]
+        groups[kind] = groups.get(kind, 0) + time * RUNS_A_PASS
+    drawing.stack([("FFT", fft * FRAMES_A_PASS), ("rest of the front end", (frame - fft) * FRAMES_A_PASS),
+                   *sorted(groups.items(), key=lambda item: -item[1])])
+    PICTURE.write_text(drawing.svg())
+
+
+def main():
+    if len(sys.argv) != 2:
+        sys.exit(__doc__)
+    folder = pathlib.Path(sys.argv[1])
+    raw = fields(folder / "raw.txt", "PEER")
+    parts = {int(line[2]): float(line[3]) for line in fields(folder / "parts.txt", "PART")}
+    ghz = max(float(line[1]) for line in fields(folder / "raw.txt", "CLOCK"))
+    limits = {name: min(float(line[6].split()[0]) for line in fields(folder / "raw.txt", "LIMIT") if name in line[1])
+              for name in ("wide products",)}
+    picture(raw, parts, limits, ghz)
+
+    lines = [machine(ghz), "", (folder / "table.md").read_text().strip(), "", "## What each text gains", "",
+             "One call as the graphs make it, quiet nanoseconds; the gain is against the plain text, compiled for AVX2.",
+             "", *gains_table(gains(folder / "gains.txt")), ""]
+    before, after = PAGE.read_text().split(MARKS[0])[0], PAGE.read_text().split(MARKS[1])[1]
+    PAGE.write_text(before + MARKS[0] + "\n".join(lines) + MARKS[1] + after)
+
+
+main()
