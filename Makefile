@@ -22,7 +22,7 @@ help:
 	@echo 'make bench-peers       time ours and the libraries that others would use, in one table'
 	@echo 'make counts            count instructions on this PC; compare with bench/instruction_counts.txt'
 	@echo 'make footprint         measure bytes, stack and instructions; compare with docs/footprint.md'
-	@echo 'make kernel-gains      instructions of each kernel: its plain text, and the one that runs'
+	@echo 'make kernel-gains      what each kernel costs: its plain text, and those for some processors'
 	@echo 'make lint              check formatting and the rules of clang-tidy'
 	@echo 'make setup             install what is missing of the Debian packages for all this'
 	@echo 'make clean             remove everything that was built'
@@ -83,8 +83,10 @@ footprint: configure-host build-target
 	scripts/footprint/footprint.py $(if $(UPDATE),--update)
 
 kernel-gains: configure-host build-target
-	cmake --build --preset host --parallel $(JOBS) --target instruction_counter
+	cmake --build --preset host --parallel $(JOBS) --target instruction_counter kernel_comparison_test
 	scripts/kernel-gains.py
+	@echo 'On this PC, nanoseconds: plain for every x86-64, plain for AVX2, own for AVX2, for AVX512-VNNI'
+	build/host/bin/kernel_comparison_test --time
 
 lint: build-host build-target
 	@scripts/setup-debian.sh lint

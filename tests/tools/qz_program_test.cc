@@ -9,6 +9,7 @@
 namespace qz::test {
 namespace {
 
+using testing::AllOf;
 using testing::HasSubstr;
 using testing::Not;
 using testing::StartsWith;
@@ -43,6 +44,7 @@ TEST_F(QzProgram, NobodyNeedsToListen) {
   EXPECT_EQ(Run("$QZ --version && $QZ run --raw --host-clients 0 --client-nanoapps 0 " + Noise(1)),
             0);
   EXPECT_THAT(err_, HasSubstr("no audio source was taken"));
+  EXPECT_THAT(out_, AllOf(StartsWith("qz "), HasSubstr("\nkernels")));
   EXPECT_THAT(out_, HasSubstr("2.00 s of audio (2.00 s of it silence), 0 passes, 0 reports"));
 }
 

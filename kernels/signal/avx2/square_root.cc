@@ -56,7 +56,7 @@ inline __m128i Roots(__m256i v, __m128i shift) {
 
 extern "C" void orra_u64_u32_vsqrtshift_ukernel__scalar_cvtu32_sqrt_cvtu32f64_x1(
     size_t bytes, const uint64_t* input, uint32_t* output, uint32_t shift) {
-  const __m128i shift_count = _mm_cvtsi64_si128(shift);
+  const __m128i shift_count = _mm_cvtsi32_si128(static_cast<int>(shift));
   size_t left = bytes / sizeof(uint64_t);
   for (; left >= 4; left -= 4) {
     const __m256i in = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(input));
