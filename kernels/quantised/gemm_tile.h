@@ -50,4 +50,32 @@ static inline void StoreTile(const Tile& sums, const uint8_t* scales, OutputRang
   for (size_t r = 0; r < m; ++r) std::memcpy(c + r * c_stride, tile + r * kTileColumns, columns);
 }
 
+// All rows, tile by tile, from row_at(tap, row), the row of the input that a tap meets for a row of
+// the output. In a last tile of fewer rows the last one stands for those that are missing: a tile
+// is computed whole, and only its rows that there are stored.
+template <typename RowAt>
+static inline void MultiplyTiles(size_t m, size_t n, size_t k, size_t taps, RowAt row_at,
+                                 const void* w, int8_t* c, size_t c_stride, size_t c_block_stride,
+                                 OutputRange range) {
+  for (size_t first = 0; first < m; first += kTileRows, c += kTileRows * c_stride) {
+    const size_t tile_rows = std::min(m - first, kTileRows);
+    const uint8_t* biases = static_cast<const uint8_t*>(w);
+    for (size_t column = 0; column < n; column += kTileColumns) {
+      const uint8_t* weights = biases + kBiasBytes;
+      Tile sums;
+      StartTile(biases, sums);
+      for (size_t tap = 0; tap < taps; ++tap, weights += k * kTileColumns) {
+        const int8_t* rows[kTileRows];
+        for (size_t r = 0; r < kTileRows; ++r) {
+          rows[r] = row_at(tap, first + std::min(r, tile_rows - 1));
+        }
+        AddProducts(rows, weights, k, sums);
+      }
+      StoreTile(sums, weights, range, tile_rows, std::min(n - column, kTileColumns),
+                c + column / kTileColumns * c_block_stride, c_stride);
+      biases = weights + kScaleBytes;
+    }
+  }
+}
+
 }  // namespace qz

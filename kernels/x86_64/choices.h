@@ -36,11 +36,11 @@ struct Choice {
   ROW(orra_u32_vlog_ukernel__scalar_x1, avx2)
 
 #define QZ_QUANTISED_CHOICES(ROW)                                                                 \
-  ROW(orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35, avx2_plain)   \
-  ROW(orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35, avx2_plain)  \
-  ROW(orra_qs8_gemm_minmax_rndnu_ukernel_1x8__asm_aarch32_neon_mlal_lane_cortex_a7, avx2_plain)     \
-  ROW(orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35, avx2_plain)    \
-  ROW(orra_s8_maxpool_minmax_ukernel_2p2x__neon_c16, avx2_plain)                                    \
+  ROW(orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35, avx512vnni)   \
+  ROW(orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35, avx512vnni)  \
+  ROW(orra_qs8_gemm_minmax_rndnu_ukernel_1x8__asm_aarch32_neon_mlal_lane_cortex_a7, avx2)     \
+  ROW(orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35, avx512vnni)    \
+  ROW(orra_s8_maxpool_minmax_ukernel_2p2x__neon_c16, avx2)                                    \
   ROW(orra_qs8_f32_vcvt_ukernel__neon_x32, avx2_plain)                                              \
   ROW(orra_x8_lut_ukernel__scalar_x2, avx2_plain)
 // clang-format on

@@ -8,12 +8,14 @@
 namespace qz::test {
 namespace {
 
-QZ_TEXTS(kGemm, orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35);
-QZ_TEXTS(kIndirectGemm,
-         orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35);
+QZ_TEXTS_AND_AVX512VNNI(
+    kGemm, orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35);
+QZ_TEXTS_AND_AVX512VNNI(
+    kIndirectGemm, orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35);
 QZ_TEXTS(kFixedPointGemm,
          orra_qs8_gemm_minmax_rndnu_ukernel_1x8__asm_aarch32_neon_mlal_lane_cortex_a7);
-QZ_TEXTS(kDepthwise, orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35);
+QZ_TEXTS_AND_AVX512VNNI(
+    kDepthwise, orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35);
 QZ_TEXTS(kMaxPool, orra_s8_maxpool_minmax_ukernel_2p2x__neon_c16);
 
 constexpr size_t kReadAhead = 7;
@@ -26,14 +28,22 @@ const uint8_t* PlaceLayer(Random& random, size_t inputs, size_t columns, size_t 
   return Place(random, layer.Packed(with_scales), random.Next() % 2);
 }
 
+// Now and then more rows, columns or products in a sum than a text that unpacks them has room for
+// at a time.
 struct MatrixShape {
-  explicit MatrixShape(CaseRandom& random)
-      : m(random.Pick("m", 1, 4)),
-        n(random.Pick("n", 1, 25)),
-        k(random.Pick("k", 1, 40)),
+  explicit MatrixShape(CaseRandom& random, size_t taps = 1)
+      : large(random.Next() % 16),
+        m(random.Pick("m", 1, std::min<size_t>(kMostRows, large == 0 ? 150 : 13))),
+        n(random.Pick("n", 1, large == 1 ? 70 : 25)),
+        k(random.Pick("k", 1,
+                      (large == 1   ? 700
+                       : large == 2 ? 1600
+                                    : 100) /
+                          taps)),
         a_stride(k + random.Pick("a gap", 0, 9)),
         c_block_stride(8 + random.Pick("c block gap", 0, 3)),
         c_stride((n + 7) / 8 * c_block_stride + random.Pick("c gap", 0, 5)) {}
+  uint64_t large;
   size_t m, n, k, a_stride, c_block_stride, c_stride;
 };
 
@@ -49,17 +59,16 @@ std::string CompareGemm(CaseRandom& random) {
   });
 }
 
-// Lists of rows of one input; some are the zero row, and `offset` lies between entries and the
-// others.
+// Lists of rows of one input, entry i of which names row_of(i); one is the zero row, and `offset`
+// lies between entries and the others.
 struct RowList {
-  RowList(Random& random, size_t entries, size_t row_bytes)
+  template <typename RowOf>
+  RowList(Random& random, size_t entries, size_t rows, size_t row_bytes, RowOf row_of)
       : offset(random.Next() % 2 ? 40000 : 0) {
-    constexpr size_t kRows = 9;
-    const int8_t* rows = Place(random, ShapedFill<int8_t>(random, kRows * row_bytes), kReadAhead);
-    zero = rows + random.Next() % kRows * row_bytes;
+    const int8_t* first = Place(random, ShapedFill<int8_t>(random, rows * row_bytes), kReadAhead);
+    zero = first + random.Next() % rows * row_bytes;
     for (size_t i = 0; i < entries; ++i) {
-      const int8_t* row = rows + random.Next() % kRows * row_bytes;
-      list.push_back(ListEntry(row, zero, offset));
+      list.push_back(ListEntry(first + row_of(i) * row_bytes, zero, offset));
     }
   }
   size_t offset;
@@ -67,10 +76,20 @@ struct RowList {
   std::vector<const int8_t*> list;
 };
 
+// Any rows, or those of a convolution, where each tap's rows are the ones after those of the tap
+// before: texts may make use of that. A last tile names rows that are not asked for.
 std::string CompareIndirectGemm(CaseRandom& random) {
-  const MatrixShape s(random);
   const size_t taps = random.Pick("taps", 1, 4), tap_bytes = 4 * taps * sizeof(const int8_t*);
-  const RowList in(random, 4 * taps, s.k);
+  const MatrixShape s(random, taps);
+  const bool convolution = random.Pick("convolution", 0, 1) != 0;
+  const size_t listed = (s.m + 3) / 4 * 4;
+  const size_t last = random.Pick("last row", s.m - 1, listed - 1);
+  const size_t rows = convolution ? last + taps : 9;
+  const auto row_of = [&](size_t i) {
+    if (!convolution) return static_cast<size_t>(random.Next() % rows);
+    return std::min(i / (4 * taps) * 4 + i % 4, last) + i / 4 % taps;
+  };
+  const RowList in(random, listed * taps, rows, s.k, row_of);
   const uint8_t* w = PlaceLayer(random, taps * s.k, s.n, 8);
   const orra_fp32_requant_params params = RandomParams(random);
   const auto c_contents = RandomValues<int8_t>(random, s.m * s.c_stride);
@@ -92,9 +111,10 @@ std::string CompareFixedPointGemm(CaseRandom& random) {
 }
 
 std::string CompareDepthwise(CaseRandom& random) {
-  const size_t channels = random.Pick("channels", 1, 50), width = random.Pick("width", 1, 5);
+  const size_t channels = random.Pick("channels", 1, 70), width = random.Pick("width", 1, 5);
   const size_t step = random.Pick("step", 1, 4), gap = random.Pick("gap", 0, 5);
-  const RowList in(random, (width - 1) * step + 3, channels);
+  const RowList in(random, (width - 1) * step + 3, 9, channels,
+                   [&](size_t) { return random.Next() % 9; });
   const uint8_t* w = PlaceLayer(random, 3, channels, 16);
   const orra_fp32_requant_params params = RandomParams(random);
   const auto contents = RandomValues<int8_t>(random, width * (channels + gap));
@@ -128,6 +148,8 @@ std::string CompareMaxPool(CaseRandom& random) {
 
 // The shapes of the network. What the bytes hold changes no instruction count.
 constexpr size_t kChannels = 60;
+constexpr size_t kGemmRows = std::min<size_t>(kMostRows, 380);
+constexpr size_t kIndirectGemmRows = std::min<size_t>(kMostRows, 92);
 constexpr orra_fp32_requant_params kParams{-128, -128, 127};
 constexpr orra_rndnu_requant_params kFixedParams{0, 1427340160, -5, -128, -128, 127};
 constexpr orra_s8_clamp_params kClamp{-128, 127};
@@ -146,12 +168,14 @@ std::vector<Kernel> QuantisedKernels() {
   return {
       {kGemm.name, "gemm", CompareGemm,
        [](Side side) {
-         kGemm.text[side](4, kChannels, 48, in_rows, 48, weights, out_rows, kChannels, 8, &kParams);
+         kGemm.text[side](kGemmRows, kChannels, 48, in_rows, 48, weights, out_rows, kChannels, 8,
+                          &kParams);
        }},
       {kIndirectGemm.name, "indirect_gemm", CompareIndirectGemm,
        [](Side side) {
-         kIndirectGemm.text[side](4, kChannels, kChannels, 12 * sizeof kRowList[0], kRowList.data(),
-                                  weights, out_rows, kChannels, 8, 0, nullptr, &kParams);
+         kIndirectGemm.text[side](kIndirectGemmRows, kChannels, kChannels, 12 * sizeof kRowList[0],
+                                  kRowList.data(), weights, out_rows, kChannels, 8, 0, nullptr,
+                                  &kParams);
        }},
       {kFixedPointGemm.name, "fixed_point_gemm", CompareFixedPointGemm,
        [](Side side) {
