@@ -33,6 +33,10 @@ results=build/host/peers
 mkdir -p "$results"
 "$peers/run.sh" | tee "$results/table.md"
 cp "$PEERS_DIR/raw.txt" "$results"
-"$bin/peer_lines_Avx2" --parts >"$results/parts.txt"
-taskset -c $(($(nproc) > 1 ? 1 : 0)) "$bin/kernel_comparison_test" --time >"$results/gains.txt"
+# Several times, of which the shortest counts: a neighbour can slow a machine down for seconds.
+for run in parts gains; do : >"$results/$run.txt"; done
+for _ in 1 2 3 4 5; do
+  BENCH_MAX_MS=200 "$bin/peer_lines_Avx2" --parts >>"$results/parts.txt"
+  taskset -c $(($(nproc) > 1 ? 1 : 0)) "$bin/kernel_comparison_test" --time >>"$results/gains.txt"
+done
 [ -z "${UPDATE:-}" ] || scripts/performance/performance.py "$results"

@@ -2,7 +2,7 @@
 
 from xml.sax.saxutils import escape
 
-WIDTH, LEFT, BAR, ROW = 860, 250, 430, 22
+WIDTH, LEFT, BAR, ROW = 900, 215, 440, 22
 COLOURS = ["#4269d0", "#efb118", "#ff725c", "#6cc5b0", "#3ca951", "#ff8ab7", "#a463f2", "#97bbf5", "#9c6b4e"]
 
 
@@ -29,7 +29,7 @@ class Drawing:
             self.text(LEFT - 8, self.y + 15, name, anchor="end")
             self.rect(LEFT, self.y + 4, BAR, 14, "#eeeeee")
             self.rect(LEFT, self.y + 4, BAR * min(part, 1), 14, COLOURS[0])
-            self.text(LEFT + BAR + 8, self.y + 15, f"{part:4.0%}  {note}")
+            self.text(LEFT + BAR + 8, self.y + 15, f"{part:.0%}: {note}")
             self.y += ROW
         self.parts.append(f'<line x1="{LEFT + BAR}" x2="{LEFT + BAR}" y1="{top}" y2="{self.y}" '
                           'stroke="#333333" stroke-width="1.5"/>')
@@ -44,8 +44,8 @@ class Drawing:
             self.rect(x, self.y, whole * time / total, 26, colour)
             x += whole * time / total
             column, line = i % 3, i // 3
-            self.rect(16 + column * 280, self.y + 40 + line * 20, 12, 12, colour)
-            self.text(34 + column * 280, self.y + 50 + line * 20, f"{name}: {time:.1f} µs, {time / total:.0%}")
+            self.rect(16 + column * 290, self.y + 40 + line * 20, 12, 12, colour)
+            self.text(34 + column * 290, self.y + 50 + line * 20, f"{name}: {time:.1f} µs, {time / total:.0%}")
         self.y += 40 + (len(rows) + 2) // 3 * 20 + 16
 
     def svg(self):
