@@ -1,6 +1,6 @@
-// The texts of a kernel for different processors stand side by side in one program under names of their
-// own: where a text is compiled for that, this is included ahead of everything (-include), with
-// QZ_TEXT(kernel) defined as the kernel's name and what is to stand behind it.
+// The texts of a kernel for different processors stand side by side in one program under names of
+// their own: where a text is compiled for that, this is included ahead of everything (-include),
+// with QZ_TEXT(kernel) defined as the kernel's name and what is to stand behind it.
 #pragma once
 
 // clang-format off

@@ -23,6 +23,7 @@ static inline Kernel* Choose(Kernel* plain, Kernel* avx2, Kernel* avx512vnni) {
 }  // namespace qz
 
 // Hidden, so that addresses need nothing of the loader, which is not done yet.
+// NOLINTBEGIN(bugprone-macro-parentheses): what is declared stands in none.
 #define QZ_CHOICE(kernel, best)                                           \
   extern "C" {                                                            \
   __attribute__((visibility("hidden"))) decltype(kernel) kernel##__plain; \
@@ -33,6 +34,7 @@ static inline Kernel* Choose(Kernel* plain, Kernel* avx2, Kernel* avx512vnni) {
   }                                                                       \
   decltype(kernel) kernel __attribute__((ifunc(#kernel "__choice")));     \
   }
+// NOLINTEND(bugprone-macro-parentheses)
 
 #define QZ_CHOOSE_avx2(kernel) QZ_CHOICE(kernel, kernel##__avx2)
 #define QZ_CHOOSE_avx2_plain(kernel) QZ_CHOICE(kernel, kernel##__avx2)

@@ -33,6 +33,7 @@ struct Texts {
 };
 
 // Defines a kernel's Texts and declares those that have a name of their own.
+// NOLINTBEGIN(bugprone-macro-parentheses): what is declared stands in none.
 #ifdef QZ_KERNELS_X86_64
 #define QZ_TEXTS(texts, kernel)                                                      \
   extern "C" decltype(kernel) kernel##__plain, kernel##__avx2_plain, kernel##__avx2; \
@@ -53,6 +54,7 @@ struct Texts {
   }
 #define QZ_TEXTS_AND_AVX512VNNI(texts, kernel) QZ_TEXTS(texts, kernel)
 #endif
+// NOLINTEND(bugprone-macro-parentheses)
 
 // Random numbers of one comparison of a text with the plain one; a failure names those that were
 // picked.
