@@ -54,8 +54,10 @@ clip:
 
 test: build-host build-target clip
 	ctest --preset host
+ifeq ($(shell uname -m),x86_64)
 	@$(SHOW_COMPARISONS) build/host/Testing/Temporary/LastTest.log
 	ctest --preset host-without-avx2
+endif
 	ctest --preset target
 	@$(SHOW_COMPARISONS) build/target/Testing/Temporary/LastTest.log
 	build/host/bin/qz prove $(CLIP) build/host build/target

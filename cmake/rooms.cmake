@@ -46,8 +46,9 @@ set(QZ_TEXT_SETS ${QZ_KERNELS})
 if(QZ_KERNELS STREQUAL "x86_64")
   set(QZ_TEXT_SETS avx2 avx512vnni)
 endif()
-set(QZ_FLAGS_avx2 -mavx2)
-set(QZ_FLAGS_avx512vnni -mavx2 -mavx512f -mavx512bw -mavx512vl -mavx512vnni)
+# Never without optimisation: what is inline must not become a function that others could be linked to.
+set(QZ_FLAGS_avx2 -mavx2 $<$<CONFIG:Debug>:-O1>)
+set(QZ_FLAGS_avx512vnni ${QZ_FLAGS_avx2} -mavx512f -mavx512bw -mavx512vl -mavx512vnni)
 
 # qz_module_room(NAME SOURCES... LINKS... USES...): a room of the module, as a static library. Who links it
 # sees the rooms of LINKS too, which its headers include, but not those of USES.
@@ -104,8 +105,11 @@ function(qz_kernel_room name)
   endif()
 
   if(QZ_KERNELS STREQUAL "x86_64")
-    string(REPLACE _kernels _choice choice ${name})
-    qz_module_room(${name} SOURCES ${CMAKE_SOURCE_DIR}/kernels/x86_64/${choice}.cc ${room_TABLES})
+    # kernels/x86_64/signal_choice.cc of signal_kernels, and so on. Called by the loader, before
+    # sanitizers are ready.
+    string(REPLACE _kernels _choice choice ${CMAKE_SOURCE_DIR}/kernels/x86_64/${name}.cc)
+    set_source_files_properties(${choice} PROPERTIES COMPILE_OPTIONS -fno-sanitize=all)
+    qz_module_room(${name} SOURCES ${choice} ${room_TABLES})
     qz_kernel_texts(${name} avx2 ${all_avx2})
     target_compile_options(${name}_avx2 PRIVATE ${QZ_FLAGS_avx2})
     target_link_libraries(${name} PUBLIC x86_64_processor PRIVATE ${name}_plain ${name}_avx2)

@@ -7,10 +7,14 @@
 set -euo pipefail
 cd "$(dirname "$0")/.."
 
-peers=$1
+peers=${1:?no folder of the peers (make bench-peers PEERS=FOLDER)}
 [ -x "$peers/setup.sh" ] && [ -x "$peers/run.sh" ] || {
   echo "bench-peers.sh: no setup.sh and run.sh in '$peers', should be the folder of the peers" \
     "(make bench-peers PEERS=FOLDER)" >&2
+  exit 1
+}
+grep -q ' avx2' /proc/cpuinfo || {
+  echo "bench-peers.sh: this processor has no AVX2, which the table is about" >&2
   exit 1
 }
 export PEERS_DIR=${PEERS_DIR:-${TMPDIR:-/tmp}/qz-peers}

@@ -35,6 +35,8 @@ def calls_in(profile, function):
 
 
 def count(program):
+    if not program.exists():
+        sys.exit(f"instruction-counts.py: no {program}, should be in a build with QZ_KERNELS=x86_64")
     with tempfile.TemporaryDirectory() as folder:
         profile = pathlib.Path(folder, "profile")
         subprocess.run(["valgrind", "--tool=callgrind", "--compress-strings=no", "--compress-pos=no",
@@ -53,7 +55,13 @@ def count(program):
 def committed():
     """{(variant, work): instructions}"""
     lines = FIGURES.read_text().splitlines() if FIGURES.exists() else []
-    rows = [re.fullmatch(r"(\w+) +(.+?) +([\d,]+)", line) for line in lines if not line.startswith("#")]
+    rows = []
+    for line in lines:
+        if line.startswith("#"):
+            continue
+        rows.append(re.fullmatch(r"(\w+) +(.+?) +([\d,]+)", line))
+        if not rows[-1]:
+            sys.exit(f"{FIGURES}: '{line}' should be a variant, what it does and a number")
     return {(row[1], row[2]): int(row[3].replace(",", "")) for row in rows}
 
 

@@ -52,7 +52,7 @@ static inline void StoreTile(const Tile& sums, const uint8_t* scales, OutputRang
 
 // All rows, tile by tile, from row_at(tap, row), the row of the input that a tap meets for a row of
 // the output. In a last tile of fewer rows the last one stands for those that are missing: a tile
-// is computed whole, and only its rows that there are stored.
+// is computed whole, and only those of its rows that exist are stored.
 template <typename RowAt>
 static inline void MultiplyTiles(size_t m, size_t n, size_t k, size_t taps, RowAt row_at,
                                  const void* w, int8_t* c, size_t c_stride, size_t c_block_stride,

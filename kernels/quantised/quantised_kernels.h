@@ -18,7 +18,8 @@
 // Preconditions of all: counts of at least 1, output minimum <= maximum, records aligned as the
 // compiler does it, outputs apart from inputs (lookup excepted). Rows may be read by a version for
 // one processor up to 7 bytes past their last channel or element (max pool: 15): the caller keeps
-// those bytes readable. No byte outside the stated outputs is written.
+// those bytes readable. No byte outside the stated outputs is written. Sums have up to 65,536
+// products: versions for PCs keep some columns' weights on the stack.
 #pragma once
 
 #include <cstddef>
@@ -104,8 +105,8 @@ void orra_qs8_gemm_minmax_rndnu_ukernel_1x8__asm_aarch32_neon_mlal_lane_cortex_a
 //   out[p][c] = requantise_c(bias[c] + sum over t < 3 of row(p, t)[c] * weight[t][c]).
 // row(p, t) is entry t of the list after p advances of in_ptrs_step bytes, with in_offset bytes
 // added unless the entry equals `zero`. out_gap bytes follow the `channels` bytes of each position.
-// w: depthwise groups; weights of -128 would overflow the 16-bit sums of a version for one
-// processor.
+// w: depthwise groups; weights of -128 would overflow the 16-bit sums of versions for some
+// processors.
 void orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35(
     size_t channels, size_t width, const int8_t* const* in_ptrs, const void* w, int8_t* out,
     size_t in_ptrs_step, size_t out_gap, size_t in_offset, const int8_t* zero,

@@ -11,6 +11,6 @@ enum class InstructionSet {
 
 // The largest that both the processor and the operating system offer. Apart in a library, so that a
 // program can pretend to have less.
-InstructionSet BestInstructionSet();
+__attribute__((visibility("hidden"))) InstructionSet BestInstructionSet();
 
 }  // namespace qz

@@ -83,6 +83,10 @@ def in_short(raw):
             ("512-point real FFT", "B-fft", ("QZ, exact, AVX2",), "FFTW, float", ("FFTW",)),
             ("a frame of the front end", "B", ("QZ, exact, AVX2",), "a float chain around FFTW", ("FFTW",))]
     lines = ["| | QZ µs | µs | beside it | ratio |", "|---|---|---|---|---|"]
+    names = {line[2] for line in raw}
+    if "QZ, exact, AVX512-VNNI" not in names:  # nor has the peer more than AVX2 to hide then
+        rows[0] = (*rows[0][:4], ("oneDNN", "pad64"))
+        del rows[1]
     for what, group, ours, name, theirs in rows:
         own, other = best(group, *ours), best(group, *theirs)
         lines.append(f"| {what} | {own:.3g} | {other:.3g} | {name} | **{own / other:.2f}** |")
@@ -90,13 +94,13 @@ def in_short(raw):
 
 
 def gains_table(rows):
-    lines = ["| Text | Kernel | SSE2 ns | for AVX2 ns | AVX2 ns | gain | AVX512-VNNI ns | gain |",
-             "|---|---|---|---|---|---|---|---|"]
+    lines = ["| Text | Kernel | SSE2 ns | for AVX2 ns | AVX2 ns | gain | AVX512-VNNI ns | gain | over AVX2 |",
+             "|---|---|---|---|---|---|---|---|---|"]
     for text, kernel, plain, compiled, avx2, vnni in rows:
         kernel = re.sub(r"^orra_|_ukernel.*", "", kernel)
         lines.append(f"| {text} | {kernel} | {plain:.0f} | {compiled:.0f} | " +
                      (f"{avx2:.0f} | {compiled / avx2:.2f} | " if avx2 else " | | ") +
-                     (f"{vnni:.0f} | {compiled / vnni:.2f} |" if vnni else " | |"))
+                     (f"{vnni:.0f} | {compiled / vnni:.2f} | {avx2 / vnni:.2f} |" if vnni else " | | |"))
     return lines
 
 

@@ -1,7 +1,7 @@
 // The two matrix kernels with float scales, for any number of rows. Weights and rows are unpacked
 // once: weights in panels of columns, as many as fit, for all rows; rows in chunks, as many as fit,
-// for all panels. Then each chunk meets each panel, and the sums are requantised. Takes 54 KiB of
-// the stack.
+// for all panels. Then each chunk meets each panel, and the sums are requantised. Takes 52 to
+// 56 KiB of the stack.
 //
 // How products are added up is the business of a method:
 //   kColumns                 columns of a panel, a multiple of 16
@@ -20,7 +20,7 @@ namespace qz {
 namespace {
 
 // Little enough to stay in the nearest cache. More only where a panel or a tile of rows is larger:
-// from sums of a thousand products on.
+// from sums of a thousand products on, at the earliest.
 constexpr size_t kPanelsBytes = 32768;
 constexpr size_t kChunkBytes = 16384;
 constexpr size_t kChunkRows = 64;

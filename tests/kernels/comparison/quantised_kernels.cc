@@ -37,7 +37,7 @@ struct MatrixShape {
         n(random.Pick("n", 1, large == 1 ? 70 : 25)),
         k(random.Pick("k", 1,
                       (large == 1   ? 700
-                       : large == 2 ? 1600
+                       : large == 2 ? 2600
                                     : 100) /
                           taps)),
         a_stride(k + random.Pick("a gap", 0, 9)),
