@@ -106,7 +106,8 @@ def gains_table(rows):
 
 def picture(raw, parts, kernels, limits, ghz):
     drawing = Drawing()
-    drawing.heading("Part of the limit that is reached, AVX2, quiet time (limit: 32 products a cycle; *: its instructions alone)")
+    drawing.heading("Part of the limit that is reached, AVX2, quiet time "
+                    "(limit: 32 products a cycle; *: its instructions alone)")
     rows = []
     for number, (kind, products) in OPERATORS.items():
         reached = products / (parts[number] * ghz * 1e3)
@@ -143,7 +144,9 @@ def main():
               for name in ("wide products",)}
     picture(raw, parts, kernels, limits, ghz)
 
-    lines = [machine(ghz), "", *in_short(raw), "", "## The table", "", (folder / "table.md").read_text().strip(), "", "## What each text gains", "",
+    lines = [machine(ghz), "", *in_short(raw), "",
+             "## The table", "", (folder / "table.md").read_text().strip(), "",
+             "## What each text gains", "",
              "One call as the graphs make it, quiet nanoseconds; the gain is against the plain text, compiled for AVX2.",
              "", *gains_table(kernels), ""]
     before, after = PAGE.read_text().split(MARKS[0])[0], PAGE.read_text().split(MARKS[1])[1]
