@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <cstring>
 
+#include "indirection.h"
 #include "requantisation.h"
 
 namespace qz {
@@ -48,6 +49,13 @@ static inline void StoreTile(const Tile& sums, const uint8_t* scales, OutputRang
   }
   RequantiseFp32(sums, tile_scales, range, tile);
   for (size_t r = 0; r < m; ++r) std::memcpy(c + r * c_stride, tile + r * kTileColumns, columns);
+}
+
+// The row that a tap meets for a row of the output, by lists of [taps][4] rows, one a tile.
+static inline const int8_t* TileRow(const int8_t* const* lists, size_t taps, size_t tap, size_t row,
+                                    size_t offset, const int8_t* zero) {
+  const size_t tap_rows = (row / kTileRows * taps + tap) * kTileRows;
+  return ListedRow(lists, tap_rows + row % kTileRows, offset, zero);
 }
 
 // All rows, tile by tile, from row_at(tap, row), the row of the input that a tap meets for a row of

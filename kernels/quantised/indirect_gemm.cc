@@ -1,5 +1,4 @@
 #include "gemm_tile.h"
-#include "indirection.h"
 #include "quantised_kernels.h"
 
 extern "C" void orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
@@ -8,8 +7,7 @@ extern "C" void orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_
     const orra_fp32_requant_params* params) {
   const size_t taps = tap_bytes / (qz::kTileRows * sizeof(const int8_t*));
   const auto row_at = [=](size_t tap, size_t row) {
-    const size_t list = row / qz::kTileRows * taps + tap;
-    return qz::ListedRow(a_ptrs, list * qz::kTileRows + row % qz::kTileRows, a_offset, zero);
+    return qz::TileRow(a_ptrs, taps, tap, row, a_offset, zero);
   };
   qz::MultiplyTiles(m, n, k, taps, row_at, w, c, c_stride, c_block_stride, qz::RangeOf(*params));
 }

@@ -36,9 +36,9 @@ struct PairedRows {
     __m256i starts[2][2] = {};
     uint8_t *step0 = parts[0] + 2 * kStartBytes, *step1 = parts[1] + 2 * kStartBytes;
     for (size_t i = 0; i < k; i += kStepChannels, weights += kStepChannels * kTileColumns) {
-      const StepPairs g0 = LoadStep(weights, k - i);
-      const StepPairs g1 = LoadStep(weights + tap_bytes, k - i);
-      const StepPairs g2 = LoadStep(weights + 2 * tap_bytes, k - i);
+      const StepPairs g0 = LoadStep(weights);
+      const StepPairs g1 = LoadStep(weights + tap_bytes);
+      const StepPairs g2 = LoadStep(weights + 2 * tap_bytes);
       const StepPairs outer = Sum(g0, g2);
       StoreStep(Sum(outer, g1), step0, starts[0][0]);
       StoreStep(Difference(outer, g1), step0 + kPanelStep, starts[0][1]);

@@ -43,15 +43,15 @@ inline __m256i PairsOf(__m128i first, __m128i second) {
   return _mm256_cvtepi8_epi16(_mm_unpacklo_epi8(first, second));
 }
 
-// Where `count` is less than 4, the channels that are missing have weights of 0.
-inline StepPairs LoadStep(const uint8_t* weights, size_t count) {
+// Where channels are missing, what stands behind the weights takes their place: rows are 0 there,
+// and what the columns start with makes up for the rest. It is of the same block, which ends in
+// scales.
+inline StepPairs LoadStep(const uint8_t* weights) {
   const auto load = [=](size_t channel) {
     const uint8_t* from = weights + channel * kTileColumns;
     return _mm_loadl_epi64(reinterpret_cast<const __m128i*>(from));
   };
-  if (count >= kStepChannels) return {PairsOf(load(1), load(3)), PairsOf(load(0), load(2))};
-  const __m128i none = _mm_setzero_si128();
-  return {PairsOf(count > 1 ? load(1) : none, none), PairsOf(load(0), count > 2 ? load(2) : none)};
+  return {PairsOf(load(1), load(3)), PairsOf(load(0), load(2))};
 }
 
 // Stores a step's weights, and takes their products off what the columns start with.
@@ -190,7 +190,7 @@ struct WordProducts {
     uint8_t* step = to + kStartBytes;
     for (size_t t = 0; t < taps; ++t, weights += k * kTileColumns) {
       for (size_t i = 0; i < k; i += kStepChannels, step += kPanelStep) {
-        StoreStep(LoadStep(weights + i * kTileColumns, k - i), step, start);
+        StoreStep(LoadStep(weights + i * kTileColumns), step, start);
       }
     }
     StoreInts(start, to);

@@ -27,7 +27,9 @@ struct ByteProducts {
     uint8_t* step = to + kPanelStart;
     for (size_t t = 0; t < taps; ++t, weights += k * kTileColumns) {
       for (size_t i = 0; i < k; i += kStepChannels, step += kPanelStep) {
-        const __m256i y = ByColumn(LoadStep(weights + i * kTileColumns, k - i));
+        // Where channels are missing, what stands behind the weights takes their place, in the same
+        // block, which ends in scales: rows are 128 there, and that comes off.
+        const __m256i y = ByColumn(LoadInts(weights + i * kTileColumns));
         const __m256i none = _mm256_setzero_si256();
         added = _mm256_add_epi32(added, _mm256_dpbusd_epi32(none, _mm256_set1_epi8(INT8_MIN), y));
         _mm256_storeu_si256(reinterpret_cast<__m256i*>(step), y);
@@ -62,12 +64,6 @@ struct ByteProducts {
   struct RowSums {
     __m512i low, high;  // columns 0 to 15, and 16 to 31
   };
-
-  // Up to 4 channels of 8 columns.
-  static inline __m256i LoadStep(const uint8_t* weights, size_t count) {
-    if (count >= kStepChannels) return LoadInts(weights);
-    return _mm256_maskz_loadu_epi64(static_cast<__mmask8>((1 << count) - 1), weights);
-  }
 
   // Bytes [channel][column] of 4 channels and 8 columns as [column][channel].
   static inline __m256i ByColumn(__m256i bytes) {
