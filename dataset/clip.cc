@@ -1,0 +1,24 @@
+#include "clip.h"
+
+#include <memory>
+
+#include "audio_input.h"
+
+namespace qz::dataset {
+
+std::vector<int16_t> ReadClip(const std::string& path) {
+  constexpr size_t kBlockSamples = 32000;
+  const std::unique_ptr<tools::AudioInput> input = tools::OpenAudio(path, /*raw=*/false);
+  std::vector<int16_t> samples;
+  size_t held = 0;
+  size_t got = 0;
+  do {
+    held += got;
+    samples.resize(held + kBlockSamples);
+    got = input->Read(samples.data() + held, kBlockSamples);
+  } while (got > 0);
+  samples.resize(held);
+  return samples;
+}
+
+}  // namespace qz::dataset

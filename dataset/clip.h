@@ -1,0 +1,13 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace qz::dataset {
+
+// A whole sound file as 16-bit samples, mono at 16 kHz, full scale +-32768: what the microphone of
+// the hub would deliver. Throws tools::AudioError.
+std::vector<int16_t> ReadClip(const std::string& path);
+
+}  // namespace qz::dataset
