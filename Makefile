@@ -1,9 +1,11 @@
 # The commands of this project; CMake and its presets do the work.
 
 JOBS ?= $(shell nproc)
-# The recording that `make run` plays; made of the sounds of Debian packages unless given.
+# Recordings made of the sounds of Debian packages: for tests and benches; and for `make run`, unless another
+# is given, with things that the detector knows.
 CLIP := build/host/clip.wav
-AUDIO ?= $(CLIP)
+DEMO := build/host/demo.wav
+AUDIO ?= $(DEMO)
 
 # Which kernels the comparison has held against their plain texts, out of a log of CTest.
 SHOW_COMPARISONS := grep -E '^[0-9]+ comparisons: |not compared: |^[0-9]+ texts of [0-9]+ kernels '
@@ -12,14 +14,16 @@ SHOW_COMPARISONS := grep -E '^[0-9]+ comparisons: |not compared: |^[0-9]+ texts 
 .NOTPARALLEL:
 
 .PHONY: help run test bench bench-peers counts footprint kernel-gains lint setup clean configure-host build-host \
-        build-target clip
+        build-target build-trainer clip demo train cross-validate
 
 help:
-	@echo 'make run               build, then run the detector on a clip of recorded sound'
+	@echo 'make run               build, then run the detector on a clip of real sounds, all five scores shown'
 	@echo 'make run AUDIO=FILE    the same on a sound file of your own'
 	@echo 'make test              build and test for this PC, for the device, under the sanitizers'
 	@echo 'make bench             time the kernels, the graphs and the whole program'
 	@echo 'make bench-peers       time ours and the libraries that others would use, in one table'
+	@echo 'make train DATA=FOLDER  make the demonstration model again; compare with the committed one'
+	@echo 'make cross-validate DATA=FOLDER  measure its recipe on recordings that were not learnt from'
 	@echo 'make counts            count instructions on this PC; compare with bench/instruction_counts.txt'
 	@echo 'make footprint         measure bytes, stack and instructions; compare with docs/footprint.md'
 	@echo 'make kernel-gains      what each kernel costs: its plain text, and those for some processors'
@@ -44,13 +48,18 @@ build-target:
 	cmake --preset target
 	cmake --build --preset target --parallel $(JOBS)
 
-run: configure-host $(if $(filter $(CLIP),$(AUDIO)),clip)
+run: configure-host $(if $(filter $(DEMO),$(AUDIO)),demo)
 	cmake --build --preset host --parallel $(JOBS) --target qz
-	build/host/bin/qz run --log-level info "$(AUDIO)"
+	@$(if $(filter $(DEMO),$(AUDIO)),cat $(DEMO:.wav=.txt))
+	build/host/bin/qz run --scores --log-level info "$(AUDIO)"
 
 clip:
 	@scripts/setup-debian.sh clip
 	@test -e $(CLIP) || scripts/make-clip.sh $(CLIP)
+
+demo:
+	@scripts/setup-debian.sh demo
+	@test $(DEMO) -nt scripts/make-demo-clip.sh || scripts/make-demo-clip.sh $(DEMO) >/dev/null
 
 test: build-host build-target clip
 	ctest --preset host
@@ -67,6 +76,21 @@ endif
 
 bench: build-host clip
 	scripts/bench.sh
+
+# The recordings that the demonstration model learns from: a folder of class folders.
+DATA ?=
+
+build-trainer: configure-host
+	@scripts/setup-debian.sh train
+	cmake --build --preset host --parallel $(JOBS) --target qz qz_train
+
+# UPDATE=1 commits to what is made.
+train: build-trainer
+	UPDATE=$(UPDATE) scripts/train.sh "$(DATA)"
+
+cross-validate: build-trainer
+	@scripts/setup-debian.sh figures
+	scripts/cross-validate.sh "$(DATA)"
 
 # The programs that time other libraries stand outside this tree, in the folder PEERS. UPDATE=1 rewrites
 # docs/performance.md.

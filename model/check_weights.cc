@@ -6,13 +6,6 @@
 namespace qz::model {
 namespace {
 
-// Nine significant digits tell any two float32 apart.
-std::string Number(float value) {
-  char text[32];
-  std::snprintf(text, sizeof(text), "%.9g", static_cast<double>(value));
-  return text;
-}
-
 class TableChecker {
  public:
   TableChecker(const PackedModel& model, const TableLayout& table,
@@ -78,9 +71,10 @@ class TableChecker {
   void CheckScale(int column) {
     const float scale = Load<float>(model_, table_.ScaleOffset(column));
     if (!std::isfinite(scale) || scale < 0) {
-      Report("scale", column, "", Number(scale), "scales are finite and not negative");
+      Report("scale", column, "", ExactText(scale), "scales are finite and not negative");
     } else if (table_.fixed_scale != 0 && scale != table_.fixed_scale) {
-      Report("scale", column, "", Number(scale), Number(table_.fixed_scale) + " would be right");
+      Report("scale", column, "", ExactText(scale),
+             ExactText(table_.fixed_scale) + " would be right");
     }
   }
 
@@ -95,7 +89,8 @@ class TableChecker {
     if (!table_.HasScales()) return;
     // By its bits: padding is zero bytes, and a negative zero is not.
     if (Load<uint32_t>(model_, table_.ScaleOffset(column)) != 0) {
-      Report("scale", column, "", Number(Load<float>(model_, table_.ScaleOffset(column))), right);
+      Report("scale", column, "", ExactText(Load<float>(model_, table_.ScaleOffset(column))),
+             right);
     }
   }
 
@@ -115,6 +110,18 @@ std::vector<std::string> CheckWeights(const PackedModel& model) {
   }
   for (const TableLayout& table : kTables) TableChecker(model, table, findings).Run();
   return findings;
+}
+
+std::vector<std::string> CheckTable(const PackedModel& model, const TableLayout& table) {
+  std::vector<std::string> findings;
+  TableChecker(model, table, findings).Run();
+  return findings;
+}
+
+std::string ExactText(float value) {
+  char text[32];
+  std::snprintf(text, sizeof(text), "%.9g", static_cast<double>(value));
+  return text;
 }
 
 std::string FormatFindings(const std::string& file, const std::vector<std::string>& findings,

@@ -18,6 +18,12 @@ namespace qz::model {
 // and the bias 128 x the sum of the channel's weights (a real bias of 0 at input zero point -128).
 std::vector<std::string> CheckWeights(const PackedModel& model);
 
+// The findings in one table of a model of 86,000 bytes.
+std::vector<std::string> CheckTable(const PackedModel& model, const TableLayout& table);
+
+// With nine significant digits, which tell any two float32 apart.
+std::string ExactText(float value);
+
 // One line per finding, each begun by `file`; from `cap` on only their number.
 std::string FormatFindings(const std::string& file, const std::vector<std::string>& findings,
                            size_t cap = 20);

@@ -6,6 +6,8 @@
 #include <memory>
 #include <stdexcept>
 
+#include "check_weights.h"
+
 namespace qz::model {
 namespace {
 
@@ -20,17 +22,29 @@ using File = std::unique_ptr<std::FILE, Closer>;
 
 }  // namespace
 
-PackedModel ReadModelFile(const std::string& path) {
+std::vector<uint8_t> ReadWholeFile(const std::string& path, size_t most) {
   File file(std::fopen(path.c_str(), "rb"));
   if (!file) Fail(path, "cannot open", errno);
-  PackedModel bytes;
+  std::vector<uint8_t> bytes;
   uint8_t buffer[4096];
   size_t got;
   while ((got = std::fread(buffer, 1, sizeof(buffer), file.get())) > 0) {
     bytes.insert(bytes.end(), buffer, buffer + got);
+    if (bytes.size() > most) {
+      throw std::runtime_error(path + ": has more than " + std::to_string(most) + " bytes");
+    }
   }
   if (std::ferror(file.get())) Fail(path, "cannot read", errno);
   return bytes;
+}
+
+PackedModel ReadSoundModel(const std::string& path) {
+  PackedModel model = ReadModelFile(path);
+  const std::vector<std::string> findings = CheckWeights(model);
+  if (findings.empty()) return model;
+  std::string line = path + ": " + findings[0];
+  if (findings.size() > 1) line += " (and " + std::to_string(findings.size() - 1) + " more)";
+  throw std::runtime_error(line);
 }
 
 void WriteWholeFile(const std::string& path, const std::string& bytes) {

@@ -1,14 +1,24 @@
 // Packed models on disk and as a C++ header.
 #pragma once
 
+#include <cstdint>
 #include <string>
+#include <vector>
 
 #include "weight_layout.h"
 
 namespace qz::model {
 
-// A whole file, whatever its size. Throws std::runtime_error naming the file and the cause.
-PackedModel ReadModelFile(const std::string& path);
+// A whole file, whatever is in it. Throws std::runtime_error naming the file and the cause, also
+// where it has more than `most` bytes.
+std::vector<uint8_t> ReadWholeFile(const std::string& path, size_t most);
+
+// What may be a packed model: of any content, and of any size that is not absurd.
+inline PackedModel ReadModelFile(const std::string& path) { return ReadWholeFile(path, 1 << 20); }
+
+// A packed model that the checker passes. Throws std::runtime_error: why it can't be read, or the
+// first finding and how many more there are.
+PackedModel ReadSoundModel(const std::string& path);
 
 // Writes all of `bytes` or nothing: into a temporary file beside `path` that then takes its name.
 // Throws std::runtime_error naming the file and the cause.

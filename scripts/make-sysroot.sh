@@ -6,8 +6,8 @@
 set -euo pipefail
 
 [ $# -eq 1 ] || { echo "usage: make-sysroot.sh FOLDER" >&2; exit 2; }
-packages=(libc6-dev libstdc++6 libprotobuf-dev libnanopb-dev libsndfile1-dev libsoxr-dev libcli11-dev
-  nlohmann-json3-dev libgtest-dev libgmock-dev)
+packages=(libc6-dev libstdc++6 libprotobuf-dev libnanopb-dev libsndfile1-dev libsoxr-dev libminizip-dev
+  zlib1g-dev libcli11-dev nlohmann-json3-dev libgtest-dev libgmock-dev)
 
 folder=$1
 [ "$(cat "$folder/packages" 2>/dev/null)" != "${packages[*]}" ] || exit 0

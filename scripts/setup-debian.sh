@@ -1,23 +1,30 @@
 #!/usr/bin/env bash
 # Installs what is missing of the Debian packages that this project needs; silent when nothing is.
-# Usage: scripts/setup-debian.sh [build] [clip] [counts] [lint] [target]     (no argument: all groups)
+# Usage: scripts/setup-debian.sh [build] [clip] [demo] [train] [figures] [counts] [lint] [target]
+# No argument: all groups.
 set -euo pipefail
 
 packages_of() {
   case "$1" in
     build)
       echo g++ cmake ninja-build make python3 nanopb libnanopb-dev libprotobuf-dev \
-        protobuf-compiler libsndfile1-dev libsoxr-dev libcli11-dev nlohmann-json3-dev \
-        libgtest-dev libgmock-dev libbenchmark-dev binutils
+        protobuf-compiler libsndfile1-dev libsoxr-dev libminizip-dev zlib1g-dev libcli11-dev \
+        nlohmann-json3-dev libgtest-dev libgmock-dev libbenchmark-dev libeigen3-dev binutils
       ;;
     clip) echo sox libsox-fmt-base alsa-utils sound-theme-freedesktop ;;
+    demo)
+      echo sox libsox-fmt-base libsox-fmt-mp3 alsa-utils sound-theme-freedesktop scratch \
+        elpa-redtick
+      ;;
+    train) echo espeak-ng sox libsox-fmt-base alsa-utils sound-theme-freedesktop ;;
+    figures) echo python3 python3-numpy python3-sklearn ;;
     lint) echo git clang-format clang-tidy ;;
     counts) echo valgrind python3 ;;
     target)
       echo g++-arm-linux-gnueabihf qemu-user cmake ninja-build make python3 nanopb protobuf-compiler
       ;;
     *)
-      echo "setup-debian.sh: no such group: '$1', should be build, clip, counts, lint or target" >&2
+      echo "setup-debian.sh: no such group: '$1', should be build, clip, demo, train, figures, counts, lint or target" >&2
       exit 2
       ;;
   esac
@@ -32,7 +39,7 @@ still_missing() {
   for package in "$@"; do installed "$package" || echo "$package"; done
 }
 
-[ $# -gt 0 ] || set -- build clip counts lint target
+[ $# -gt 0 ] || set -- build clip demo train figures counts lint target
 wanted=()
 for group in "$@"; do
   names=$(packages_of "$group")

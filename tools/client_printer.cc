@@ -1,6 +1,6 @@
 #include "client_printer.h"
 
-#include "messages.h"
+#include <utility>
 
 namespace qz::tools {
 namespace {
@@ -53,6 +53,11 @@ void ClientPrinter::OnEvent(uint32_t nanoapp, uint16_t type, const void* data, s
   }
   ++reports_;
   console_.Data(format_.Report(nanoapp, *report));
+  newest_report_ = report;
+}
+
+std::optional<hub::SoundReport> ClientPrinter::TakeReport() {
+  return std::exchange(newest_report_, std::nullopt);
 }
 
 }  // namespace qz::tools

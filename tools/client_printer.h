@@ -1,10 +1,12 @@
 #pragma once
 
+#include <optional>
 #include <string>
 #include <vector>
 
 #include "clients.h"
 #include "console.h"
+#include "messages.h"
 #include "report_format.h"
 
 namespace qz::tools {
@@ -18,6 +20,9 @@ class ClientPrinter final : public hub::ClientListener {
   void OnHostMessage(uint16_t endpoint, uint32_t type, const uint8_t* bytes, size_t size) override;
   void OnEvent(uint32_t nanoapp, uint16_t type, const void* data, size_t size) override;
 
+  // The newest report since the last call, if any.
+  std::optional<hub::SoundReport> TakeReport();
+
   uint64_t reports() const { return reports_; }
   uint64_t detections() const { return detections_; }
   // One sentence for each message or event that could not be decoded.
@@ -29,6 +34,7 @@ class ClientPrinter final : public hub::ClientListener {
   uint64_t reports_ = 0;
   uint64_t detections_ = 0;
   std::vector<std::string> faults_;
+  std::optional<hub::SoundReport> newest_report_;
 };
 
 }  // namespace qz::tools

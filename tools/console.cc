@@ -6,6 +6,7 @@
 #include <cerrno>
 #include <chrono>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 
 #include "audio_input.h"
@@ -49,17 +50,35 @@ void Console::Message(const std::string& line) {
 }
 
 void Console::Progress(uint64_t done, uint64_t total) {
-  if (!messages_on_terminal_ || total < kLongAudioSamples || SteadyMs() < next_progress_ms_) return;
-  next_progress_ms_ = SteadyMs() + kProgressIntervalMs;
-  progress_shown_ = true;
+  if (total < kLongAudioSamples || !ProgressDue()) return;
   std::fprintf(stderr, "\r%.0f of %.0f s, %.0f%%\x1b[K", static_cast<double>(done) / kSampleRateHz,
                static_cast<double>(total) / kSampleRateHz,
+               100.0 * static_cast<double>(done) / static_cast<double>(total));
+}
+
+void Console::ClipProgress(uint64_t done, uint64_t total) {
+  if (!ProgressDue()) return;
+  std::fprintf(stderr, "\r%llu of %llu clips, %.0f%%\x1b[K", static_cast<unsigned long long>(done),
+               static_cast<unsigned long long>(total),
                100.0 * static_cast<double>(done) / static_cast<double>(total));
 }
 
 std::string Console::OutputFault() const {
   if (lost_error_ == 0 || lost_error_ == EPIPE) return {};
   return std::string("standard output: can't be written: ") + std::strerror(lost_error_);
+}
+
+// If so, the caller writes the line.
+bool Console::ProgressDue() {
+  if (!messages_on_terminal_ || SteadyMs() < next_progress_ms_) return false;
+  next_progress_ms_ = SteadyMs() + kProgressIntervalMs;
+  progress_shown_ = true;
+  return true;
+}
+
+bool Console::data_in_colour() const {
+  const char* const no_colour = std::getenv("NO_COLOR");
+  return data_on_terminal_ && (no_colour == nullptr || no_colour[0] == '\0');
 }
 
 void Console::EraseProgress() {

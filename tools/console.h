@@ -19,6 +19,8 @@ class Console {
   // `done` of `total` samples in a progress line that the next line replaces; at most five a
   // second. Only on a terminal, and only for audio that is long.
   void Progress(uint64_t done, uint64_t total);
+  // The same of clips, however few.
+  void ClipProgress(uint64_t done, uint64_t total);
 
   // True once nobody reads stdout any more, or it can't be written.
   bool output_lost() const { return lost_error_ != 0; }
@@ -26,8 +28,11 @@ class Console {
   std::string OutputFault() const;
 
   bool data_on_terminal() const { return data_on_terminal_; }
+  // Whether data may be coloured: on a terminal whose user has not set NO_COLOR.
+  bool data_in_colour() const;
 
  private:
+  bool ProgressDue();
   void EraseProgress();
 
   bool data_on_terminal_;

@@ -3,10 +3,13 @@
 #include <cstddef>
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
+#include "labels.h"
 #include "messages.h"
+#include "score_follower.h"
 
 namespace qz::tools {
 
@@ -38,12 +41,27 @@ class ReportFormat {
                                  const std::vector<uint32_t>& categories) const = 0;
   virtual std::string Report(uint32_t client, const hub::SoundReport& report) const = 0;
   virtual std::string Detection(uint16_t endpoint, const hub::SoundReport& event) const = 0;
+  // What the tool itself made of the pass that ended at `time_ns`, in the hub's clock.
+  virtual std::string Scores(uint64_t time_ns, const PassScores& scores) const = 0;
+  // Of that pass, the outputs that the tool's own table detects; at least one.
+  virtual std::string ToolDetection(uint64_t time_ns, const PassScores& scores,
+                                    const std::vector<int>& outputs) const = 0;
   virtual std::string Summary(const RunSummary& summary) const = 0;
 };
 
-// For people; with a small bar beside each confidence if wanted.
-std::unique_ptr<ReportFormat> MakeTextFormat(bool bars);
+// Names for categories. Without them reports show codes alone, and there are no scores to show.
+using Names = std::optional<model::Labels>;
+// The name of a category; null if it has none.
+const std::string* NameOf(const Names& names, uint32_t category);
+
+struct TextStyle {
+  bool bars = false;    // a small bar beside each confidence, and scores one below the other
+  bool colour = false;  // scores in colours of a terminal
+};
+
+// For people.
+std::unique_ptr<ReportFormat> MakeTextFormat(TextStyle style, const Names& names);
 // For programs: one JSON object a line, its kind under "type".
-std::unique_ptr<ReportFormat> MakeJsonFormat();
+std::unique_ptr<ReportFormat> MakeJsonFormat(const Names& names);
 
 }  // namespace qz::tools

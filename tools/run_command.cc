@@ -3,6 +3,8 @@
 #include <chrono>
 #include <cstdio>
 #include <memory>
+#include <optional>
+#include <stdexcept>
 #include <vector>
 
 #include "audio_input.h"
@@ -12,6 +14,7 @@
 #include "hub.h"
 #include "interrupt.h"
 #include "report_format.h"
+#include "tool_view.h"
 
 namespace qz::tools {
 namespace {
@@ -33,13 +36,15 @@ std::string LogLine(chreLogLevel level, uint64_t time_ns, const std::string& lin
   return head + line;
 }
 
+Names ReadNames(const std::string& path) {
+  return path.empty() ? Names() : Names(model::ReadLabels(path));
+}
+
 // One run from its first message to its exit code.
 class Run {
  public:
-  explicit Run(const RunOptions& options)
-      : options_(options),
-        format_(options.json ? MakeJsonFormat() : MakeTextFormat(console_.data_on_terminal())),
-        printer_(format_.get(), &console_) {}
+  // Throws std::runtime_error, one line, when the labels, the table or the model are unusable.
+  explicit Run(const RunOptions& options);
   // Whatever the module still sends at its end needs the clients.
   ~Run() { hub_.End(); }
 
@@ -49,24 +54,40 @@ class Run {
   bool StartModule(ExitCode* exit_code);
   // Plays the input, of which `first_samples` stand in the cutter's room already.
   void Stream(AudioInput* input, size_t first_samples);
+  void Play(const int16_t* buffer);
   void ReportShortAudio();
   RunSummary Summarise() const;
   ExitCode Conclude();
 
   const RunOptions& options_;
   Console console_;
+  const Names names_;
   std::unique_ptr<ReportFormat> format_;
   hub::Hub hub_;
   ClientPrinter printer_;
   hub::Clients clients_{&hub_, &printer_};
-  BufferCutter cutter_{[this](const int16_t* buffer) {
-    hub_.PlayAudio(buffer, kBufferSamples);
-    delivered_samples_ += kBufferSamples;
-  }};
+  std::optional<ToolView> view_;
+  BufferCutter cutter_{[this](const int16_t* buffer) { Play(buffer); }};
   uint64_t delivered_samples_ = 0;
   uint64_t silent_samples_ = 0;
   double wall_seconds_ = 0;
 };
+
+Run::Run(const RunOptions& options)
+    : options_(options),
+      names_(ReadNames(options.labels_path)),
+      format_(options.json ? MakeJsonFormat(names_)
+                           : MakeTextFormat(
+                                 {console_.data_on_terminal(), console_.data_in_colour()}, names_)),
+      printer_(format_.get(), &console_) {
+  std::optional<DetectionRules> rules;
+  if (!options.thresholds_path.empty()) {
+    rules = ReadDetectionRules(options.thresholds_path, names_.value());
+  }
+  if (options.scores || rules) {
+    view_.emplace(options.model_path, options.scores, rules, format_.get(), &console_);
+  }
+}
 
 ExitCode Run::Execute() {
   CatchInterrupt();
@@ -84,6 +105,10 @@ ExitCode Run::Execute() {
   ExitCode exit_code = kFine;
   if (!StartModule(&exit_code)) return exit_code;
   console_.Message(input->Description());
+  if (view_) {
+    console_.Message("tool's view: what qz itself hears beside the module, by " +
+                     options_.model_path + "; no messages of the module");
+  }
   clients_.Connect(options_.host_clients, options_.client_nanoapps);
   const bool audio_taken = hub_.audio_enabled();
   if (!audio_taken) console_.Message("no audio source was taken: the nanoapp hears nothing");
@@ -113,6 +138,14 @@ bool Run::StartModule(ExitCode* exit_code) {
   console_.Message("qz: " + failure.sentence);
   *exit_code = failure.kind == hub::LoadFailure::Kind::kRefused ? kFaultFound : kNotRunnable;
   return false;
+}
+
+void Run::Play(const int16_t* buffer) {
+  hub_.PlayAudio(buffer, kBufferSamples);
+  delivered_samples_ += kBufferSamples;
+  if (view_ && hub_.audio_enabled()) {
+    view_->Pass(buffer, kBufferSamples, hub_.TimeNs(), printer_.TakeReport());
+  }
 }
 
 void Run::Stream(AudioInput* input, size_t first_samples) {
@@ -163,6 +196,7 @@ RunSummary Run::Summarise() const {
 ExitCode Run::Conclude() {
   std::vector<std::string> faults = printer_.faults();
   for (const std::string& fault : hub_.Faults()) faults.push_back(fault);
+  if (view_) faults.insert(faults.end(), view_->faults().begin(), view_->faults().end());
 
   RunSummary summary = Summarise();
   summary.heap_blocks_held = hub_.heap().live_blocks();
@@ -181,6 +215,15 @@ ExitCode Run::Conclude() {
 
 }  // namespace
 
-ExitCode RunCommand(const RunOptions& options) { return Run(options).Execute(); }
+ExitCode RunCommand(const RunOptions& options) {
+  std::optional<Run> run;
+  try {
+    run.emplace(options);
+  } catch (const std::runtime_error& error) {
+    std::fprintf(stderr, "qz: %s\n", error.what());
+    return kUnreadableInput;
+  }
+  return run->Execute();
+}
 
 }  // namespace qz::tools

@@ -17,6 +17,10 @@ struct RunOptions {
   bool json = false;
   bool real_time = false;
   std::string module_path;
+  bool scores = false;          // show all five, as the tool hears them
+  std::string thresholds_path;  // a table by which the tool detects; empty: none
+  std::string model_path;       // of these two: the module's own model
+  std::string labels_path;      // names of the outputs; empty: none, and neither of the two
 };
 
 // Plays a file to the nanoapp and prints what its clients receive. Says what went wrong itself.

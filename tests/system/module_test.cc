@@ -89,11 +89,8 @@ TEST(LoadedModule, ServesHostsAndNanoappsFromOneRecording) {
     EXPECT_EQ(seen == std::set<float>{0.0f}, pass == 0);
   }
   EXPECT_GT(seen.size(), kBuffers) << "the scores don't follow the sound";
-#ifdef QZ_STANDIN
-  // Recorded with the stand-in model: another figure on another machine or build is a broken
-  // promise.
+  // Recorded: another figure on another machine or build is a broken promise.
   EXPECT_EQ(digest, 0x6F9AA3DA2058A843u);
-#endif
   // Every load begins anew.
   EXPECT_EQ(Listen(Recording(kBuffers)).reports, heard.reports);
 }

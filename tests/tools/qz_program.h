@@ -35,6 +35,14 @@ class QzProgram : public testing::Test, protected SoundFolder {
   std::string Noise(size_t samples) const {
     return WriteRaw("noise.raw", Random(3).Fill<int16_t>(samples, -8000, 8000));
   }
+  // The same of noise that changes its loudness, so that scores move.
+  std::string LoudAndSoft(size_t samples) const {
+    std::vector<int16_t> noise = Random(5).Fill<int16_t>(samples, -8000, 8000);
+    for (size_t i = 0; i < samples; ++i) {
+      noise[i] = static_cast<int16_t>(noise[i] >> (i / 9000 % 5 * 3 % 8));
+    }
+    return WriteRaw("changing.raw", noise);
+  }
 
   std::string out_;
   std::string err_;

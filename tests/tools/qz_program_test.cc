@@ -5,12 +5,18 @@
 #include <gmock/gmock.h>
 
 #include <algorithm>
+#include <map>
+#include <nlohmann/json.hpp>
+#include <sstream>
+#include <tuple>
 
 namespace qz::test {
 namespace {
 
 using testing::AllOf;
+using testing::Ge;
 using testing::HasSubstr;
+using testing::Le;
 using testing::Not;
 using testing::StartsWith;
 
@@ -60,6 +66,67 @@ TEST_F(QzProgram, AnInterruptOrAReaderThatLeavesEndsLiveInput) {
   EXPECT_THAT(err_, Not(HasSubstr("qz: ")));
 }
 
+// Each result in the lines of one type, from whichever receiver: when, which category, how surely.
+using Result = std::tuple<double, int, float>;
+std::vector<Result> ResultsOf(const std::string& lines, const std::string& type) {
+  std::vector<Result> results;
+  std::istringstream stream(lines);
+  for (std::string line; std::getline(stream, line);) {
+    const auto object = nlohmann::json::parse(line);
+    if (object["type"] != type) continue;
+    for (const auto& result : object["results"]) {
+      results.emplace_back(object["time_s"], result["category"], result["confidence"]);
+    }
+  }
+  return results;
+}
+
+// A module of low thresholds, whatever model this build holds: over a stand-in.
+const std::string kWithModel =
+    "export MODEL=$(dirname $0)/model && " QZ_MODEL_TOOL " standin --seed 1 -o $MODEL && ";
+const std::string kLowModule = " --module " QZ_LOW_MODULE " --labels " QZ_LABELS " ";
+
+TEST_F(QzProgram, TheToolsViewIsWhatTheModuleReportsAndDetects) {
+  // As in the module's own tables.
+  const std::string table = WriteBytes("table",
+                                       "class\tthreshold\tcooling_s\nperson_sneeze\t0.5\t0\n"
+                                       "dog_bark\t0.5\t0\nbaby_cry\t0.25\t0\n"
+                                       "rooster\t0.5\t5\nclock_tick\t0.0625\t0\n");
+  ASSERT_EQ(Run(kWithModel + "$QZ run --raw --json --scores --thresholds " + table + kLowModule +
+                " --model $MODEL " + LoudAndSoft(40 * kSecond)),
+            0)
+      << err_;
+  EXPECT_THAT(err_, HasSubstr("tool's view: what qz itself hears beside the module, by "));
+  EXPECT_THAT(out_, HasSubstr(R"({"type":"scores","source":"tool","time_s":2.0,)"
+                              R"("timestamp_ns":2000000000,"runs":0,"results":[{"output":0,)"));
+
+  const std::vector<Result> events = ResultsOf(out_, "detection");
+  EXPECT_EQ(ResultsOf(out_, "tool_detection"), events);
+  std::map<int, int> detections;
+  for (const Result& event : events) ++detections[std::get<1>(event)];
+  // All five, and a rooster that rests: there are 20 passes, one every two seconds.
+  for (const int category : {0, 6, 15, 18}) EXPECT_GE(detections[category], 5) << category;
+  EXPECT_THAT(detections[17], AllOf(Ge(2), Le(7)));
+
+  std::vector<Result> scores = ResultsOf(out_, "scores");
+  EXPECT_EQ(scores.size(), 20u * 5);
+  const auto unreported = [](const Result& score) {
+    return std::get<1>(score) != 6 && std::get<1>(score) != 15;
+  };
+  scores.erase(std::remove_if(scores.begin(), scores.end(), unreported), scores.end());
+  EXPECT_EQ(scores, ResultsOf(out_, "report"));
+}
+
+TEST_F(QzProgram, AModelThatIsNotTheModulesIsAFault) {
+  EXPECT_EQ(
+      Run(kWithModel + QZ_MODEL_TOOL " standin --seed 2 -o $MODEL-2 && $QZ run --raw --scores" +
+          kLowModule + "--model $MODEL-2 " + LoudAndSoft(10 * kSecond)),
+      1);
+  EXPECT_THAT(err_, HasSubstr("model-2: is not the model in the module: at 4.000 s output "));
+  EXPECT_THAT(out_, AllOf(HasSubstr("[   2.000 s] tool's view: "), HasSubstr("[   4.000 s] report"),
+                          Not(HasSubstr("[   4.000 s] tool's view: "))));
+}
+
 TEST_F(QzProgram, FaultsOfANanoappAreFound) {
   EXPECT_EQ(Run("$QZ run --raw --module " QZ_FAULTY_MODULE " " + Noise(kSecond)), 1);
   EXPECT_THAT(out_, HasSubstr("heap blocks still held: 1"));
@@ -78,6 +145,11 @@ TEST_F(QzProgram, WhatPreventsARunIsSaidInOneLine) {
       {"$QZ run " + Path("missing.wav"), 3},
       {"$QZ run -", 3},
       {"$QZ run --raw - <&-", 3},
+      {"$QZ run --raw --model " + good + " " + good, 2},
+      {"$QZ run --raw --scores --model " + good + " " + good, 3},
+      {"$QZ run --raw --scores --model " + Path("missing") + " " + good, 3},
+      {"$QZ run --raw --labels " + good + " " + good, 3},
+      {"$QZ run --raw --thresholds " + good + " " + good, 3},
       {"$QZ run --raw --module /nonexistent " + good, 4},
       {"$QZ run --raw --module " QZ_NO_MODULE " " + good, 4},
   };

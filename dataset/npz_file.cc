@@ -1,0 +1,149 @@
+#include "npz_file.h"
+
+#include <unzip.h>
+#include <zip.h>
+
+#include <cerrno>
+#include <cstdio>
+#include <memory>
+
+namespace qz::dataset {
+namespace {
+
+constexpr char kSuffix[] = ".npy";
+constexpr size_t kSuffixLength = 4;
+constexpr unsigned kFirstOfJanuary1980 = 1 << 21 | 1 << 16;  // the first day that a zip file knows
+
+struct UnzipCloser {
+  void operator()(void* archive) const { unzClose(archive); }
+};
+using Archive = std::unique_ptr<void, UnzipCloser>;
+
+[[noreturn]] void FailWithErrno(const std::string& path, const char* what) {
+  const int error = errno;
+  throw NpyError(path + ": " + what + ": " + std::strerror(error));
+}
+
+Archive OpenArchive(const std::string& path) {
+  // For the reason, which the archive's library keeps to itself.
+  std::FILE* file = std::fopen(path.c_str(), "rb");
+  if (file == nullptr) FailWithErrno(path, "can't be opened");
+  std::fclose(file);
+  Archive archive(unzOpen64(path.c_str()));
+  if (archive == nullptr) throw NpyError(path + ": not an archive of arrays (.npz)");
+  return archive;
+}
+
+// Fit to be shown.
+std::string Printable(std::string name) {
+  for (char& c : name) {
+    if (c < ' ' || c > '~') c = '?';
+  }
+  return name;
+}
+
+// Reads the files of an archive, one after the other.
+class NpzReader {
+ public:
+  NpzReader(const std::string& path, const NpzLimits& limits)
+      : path_(path), limits_(limits), archive_(OpenArchive(path)) {}
+
+  std::map<std::string, NpyArray> Run() {
+    std::map<std::string, NpyArray> arrays;
+    int result = unzGoToFirstFile(archive_.get());
+    for (; result == UNZ_OK; result = unzGoToNextFile(archive_.get())) {
+      if (arrays.size() == limits_.arrays) {
+        throw NpyError(path_ + ": more than " + std::to_string(limits_.arrays) + " arrays");
+      }
+      unz_file_info64 info;
+      const std::string name = NextName(&info);
+      const std::string place = path_ + ": " + name;
+      if (!arrays.emplace(name, ParseNpy(Unpack(info, place), place)).second) {
+        throw NpyError(place + ": is there twice");
+      }
+    }
+    if (result != UNZ_END_OF_LIST_OF_FILE) {
+      throw NpyError(path_ + ": the archive's list of files is damaged");
+    }
+    return arrays;
+  }
+
+ private:
+  std::string NextName(unz_file_info64* info) {
+    char text[256] = {};
+    if (unzGetCurrentFileInfo64(archive_.get(), info, text, sizeof(text) - 1, nullptr, 0, nullptr,
+                                0) != UNZ_OK) {
+      throw NpyError(path_ + ": the archive's list of files is damaged");
+    }
+    std::string name = Printable(text);
+    if (name.size() <= kSuffixLength ||
+        name.compare(name.size() - kSuffixLength, kSuffixLength, kSuffix) != 0) {
+      throw NpyError(path_ + ": holds '" + name + "', should hold names that end in .npy");
+    }
+    return name.substr(0, name.size() - kSuffixLength);
+  }
+
+  // The bytes of the current file, whose check sum must be right.
+  std::string Unpack(const unz_file_info64& info, const std::string& place) {
+    if (info.uncompressed_size > limits_.file_bytes) {
+      throw NpyError(place + ": has " + std::to_string(info.uncompressed_size) +
+                     " bytes, should have at most " + std::to_string(limits_.file_bytes));
+    }
+    const bool encrypted = (info.flag & 1) != 0;
+    if (encrypted || (info.compression_method != 0 && info.compression_method != Z_DEFLATED)) {
+      throw NpyError(place + ": is encrypted or packed by another method, should be stored or " +
+                     "deflated");
+    }
+    std::string bytes(static_cast<size_t>(info.uncompressed_size), '\0');
+    const int opened = unzOpenCurrentFile(archive_.get());
+    const int got =
+        unzReadCurrentFile(archive_.get(), bytes.data(), static_cast<unsigned>(bytes.size()));
+    const int closed = unzCloseCurrentFile(archive_.get());
+    if (opened != UNZ_OK || got < 0 || static_cast<size_t>(got) != bytes.size() ||
+        closed != UNZ_OK) {
+      throw NpyError(place + ": damaged: can't be unpacked, or its check sum is wrong");
+    }
+    return bytes;
+  }
+
+  const std::string& path_;
+  const NpzLimits& limits_;
+  Archive archive_;
+};
+
+bool Add(zipFile archive, const std::string& name, const std::string& bytes) {
+  zip_fileinfo info = {};
+  info.dosDate = kFirstOfJanuary1980;
+  return zipOpenNewFileInZip(archive, name.c_str(), &info, nullptr, 0, nullptr, 0, nullptr,
+                             /*method: stored*/ 0, /*level*/ 0) == ZIP_OK &&
+         zipWriteInFileInZip(archive, bytes.data(), static_cast<unsigned>(bytes.size())) ==
+             ZIP_OK &&
+         zipCloseFileInZip(archive) == ZIP_OK;
+}
+
+}  // namespace
+
+std::map<std::string, NpyArray> ReadNpz(const std::string& path, const NpzLimits& limits) {
+  return NpzReader(path, limits).Run();
+}
+
+void WriteNpz(const std::string& path,
+              const std::vector<std::pair<std::string, NpyArray>>& arrays) {
+  const std::string temporary = path + ".part";
+  zipFile archive = zipOpen64(temporary.c_str(), APPEND_STATUS_CREATE);
+  if (archive == nullptr) FailWithErrno(path, "can't be written");
+  bool written = true;
+  for (const auto& [name, array] : arrays) {
+    written = written && Add(archive, name + kSuffix, NpyBytes(array));
+  }
+  // Closing writes the list of files, so it can fail as a write does.
+  written = zipClose(archive, nullptr) == ZIP_OK && written;
+  if (!written || std::rename(temporary.c_str(), path.c_str()) != 0) {
+    const int error = errno;
+    std::remove(temporary.c_str());
+    errno = error;
+    FailWithErrno(path, "can't be written");
+  }
+}
+
+}  // namespace qz::dataset

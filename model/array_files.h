@@ -1,0 +1,23 @@
+// A model's plain arrays as a file: the form in which models go to and come from elsewhere.
+#pragma once
+
+#include <string>
+
+#include "packing.h"
+
+namespace qz::model {
+
+// An .npz archive that holds for every table, w6 say:
+//   w6.weight  int8 [taps][inputs][outputs]; without taps where there is one; depthwise
+//              [taps][channels]
+//   w6.bias    int32 [outputs], as in LayerArrays
+//   w6.scale   float32 [outputs]; not of w17 and w18
+// Throws dataset::NpyError if the archive can't be read, and PackingError about arrays that are
+// missing, unknown, or of a wrong type or shape.
+ModelArrays ReadModelArrays(const std::string& path);
+
+// Writes all or nothing, the same bytes for the same arrays. Throws dataset::NpyError. The sizes
+// are right, as of arrays that come from Unpack.
+void WriteModelArrays(const std::string& path, const ModelArrays& arrays);
+
+}  // namespace qz::model

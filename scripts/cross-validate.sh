@@ -1,0 +1,28 @@
+#!/usr/bin/env bash
+# Judges the recipe of the demonstration model: for each of the four folds of DATA a model that learnt from
+# the other three, all measured on what they did not learn from; then a simple reference on the same folds.
+# Usage: scripts/cross-validate.sh DATA
+set -euo pipefail
+
+[ $# -eq 1 ] || { echo "usage: cross-validate.sh DATA" >&2; exit 2; }
+cd "$(dirname "$0")/.."
+folder=build/cross-validation
+folds=(1 2 3 4)
+
+fit() {
+  echo "fold $1 begins" >&2
+  build/host/bin/qz-train fit $folder/manifest.tsv --recipe model/demonstration.recipe --hold-out "$1" \
+    --threads 1 --state "$folder/state-$1" -o "$folder/fold-$1.bin" \
+    >"$folder/fold-$1.txt" 2>"$folder/fold-$1.log" || { cat "$folder/fold-$1.log" >&2; return 1; }
+  echo "fold $1 is done" >&2
+}
+export -f fit
+export folder
+
+scripts/train-material.sh "$1" $folder
+printf '%s\n' "${folds[@]}" | xargs -P 2 -I{} bash -c 'fit {}'
+for fold in "${folds[@]}"; do cat $folder/fold-"$fold".txt; done
+awk '/^loss of quantisation/ { sum += $4; n++ }
+     END { printf "loss of quantisation, mean over %d folds: %.4f mean AP\n", n, sum / n }' \
+  $folder/fold-?.txt
+build/host/bin/qz eval $folder/manifest.tsv "${folds[@]/#/--fold-model=}"

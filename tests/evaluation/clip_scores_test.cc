@@ -1,0 +1,99 @@
+// Scores of clips against the model evaluated plainly over windows of the clip's features.
+
+#include "clip_scores.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cmath>
+#include <set>
+
+#include "clip_features.h"
+#include "random.h"
+#include "standin_model.h"
+
+namespace qz::evaluation {
+namespace {
+
+using model::PackedModel;
+
+// Noise of changing loudness, so that the scores change from run to run.
+std::vector<int16_t> Sound(size_t samples) {
+  test::Random random(samples);
+  std::vector<int16_t> sound(samples);
+  for (size_t i = 0; i < samples; ++i) {
+    const double loudness = std::exp(8 * std::sin(static_cast<double>(i) / 9000));
+    sound[i] = static_cast<int16_t>(static_cast<double>(random.Between(-1000, 1000)) * loudness /
+                                    (100 + loudness));
+  }
+  return sound;
+}
+
+// The same by the model's reference: the scores of one run, and its bytes into the digest.
+Scores ReferenceRun(const PackedModel& packed, const uint16_t* features, uint64_t* digest) {
+  model::Tensor window(model::kInputRows, model::kInputChannels);
+  std::transform(features, features + window.values.size(), window.values.begin(),
+                 dataset::NetworkInput);
+  const model::NetworkRun run = model::RunNetwork(packed, window);
+  const auto add = [digest](const void* bytes, size_t count) {
+    const auto* values = static_cast<const unsigned char*>(bytes);
+    for (size_t i = 0; i < count; ++i) *digest = (*digest ^ values[i]) * 0x100000001B3u;
+  };
+  for (const model::Tensor& output : run.outputs) add(output.values.data(), output.values.size());
+  add(run.scores.data(), sizeof run.scores);
+  return run.scores;
+}
+
+TEST(ClipScores, EqualThePlainEvaluationOfEachWindow) {
+  const PackedModel standin = model::MakeStandinModel(1);
+  const PackedModel other = model::MakeStandinModel(2);
+  for (const PackedModel* packed : {&standin, &other}) {
+    std::vector<int16_t> sound = Sound(80000);
+    const ClipScores scores = ScoreClip(*packed, sound);
+    sound.resize(96000);  // 3 buffers, of which 598 frames come
+    const std::vector<uint16_t> features = dataset::FeaturesOf(sound.data(), sound.size());
+    uint64_t digest = 0xCBF29CE484222325u;
+    Scores highest{};
+    ASSERT_EQ(scores.runs.size(), 4u);
+    for (size_t run = 0; run < 4; ++run) {
+      const Scores expected =
+          ReferenceRun(*packed, features.data() + run * 64 * dataset::kFeatureChannels, &digest);
+      EXPECT_EQ(scores.runs[run], expected) << "run " << run;
+      for (size_t i = 0; i < highest.size(); ++i) highest[i] = std::max(highest[i], expected[i]);
+    }
+    EXPECT_EQ(scores.highest, highest);
+    EXPECT_EQ(scores.digest, digest);
+    EXPECT_GT(std::set<Scores>(scores.runs.begin(), scores.runs.end()).size(), 1u)
+        << "too dull a sound to tell anything";
+  }
+  EXPECT_NE(ScoreClip(standin, Sound(80000)).digest, ScoreClip(other, Sound(80000)).digest);
+}
+
+TEST(ClipScores, DoNotDependOnWhatWasHeardBefore) {
+  const PackedModel packed = model::MakeStandinModel(1);
+  const uint64_t fresh = ScoreClip(packed, Sound(50000)).digest;
+  ScoreClip(packed, std::vector<int16_t>(200000, 30000));
+  EXPECT_EQ(ScoreClip(packed, Sound(50000)).digest, fresh);
+}
+
+TEST(ClipScores, TwoRunsOrMoreSeeTheLastSample) {
+  for (const size_t samples : {0, 1, 61359, 61360, 61361, 71600, 71601, 80000, 86639, 86641, 96000,
+                               96001, 320000, 999999}) {
+    const size_t played = SamplesToPlay(samples);
+    EXPECT_EQ(played % 32000, 0u);
+    ASSERT_GE(played, samples);
+    size_t seeing = 0;
+    size_t before_last_buffer = 0;
+    for (size_t frames = 382; dataset::SamplesOf(frames) <= played; frames += 64) {
+      seeing += dataset::SamplesOf(frames) >= samples;
+      before_last_buffer +=
+          dataset::SamplesOf(frames) >= samples && dataset::SamplesOf(frames) <= played - 32000;
+    }
+    EXPECT_GE(seeing, 2u) << samples;
+    EXPECT_TRUE(before_last_buffer < 2 || played - 32000 < samples) << samples << ": too long";
+  }
+  EXPECT_EQ(SamplesToPlay(80000), 96000u);
+}
+
+}  // namespace
+}  // namespace qz::evaluation

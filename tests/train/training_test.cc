@@ -1,0 +1,166 @@
+// Runs on a handful of made-up sounds: that the same is the same, that stopping does not matter,
+// that something is learnt, and what is refused.
+
+#include <gmock/gmock.h>
+
+#include <cmath>
+#include <filesystem>
+#include <fstream>
+
+#include "adam.h"
+#include "labels.h"
+#include "model_files.h"
+#include "recipe.h"
+#include "state_file.h"
+#include "temporary_folder.h"
+#include "trainer.h"
+
+namespace qz::train {
+namespace {
+
+using testing::HasSubstr;
+
+// A tone for each output, and noise that nothing answers to.
+std::vector<Clip> Tones(int of_each) {
+  std::vector<Clip> clips;
+  for (int i = 0; i < 6 * of_each; ++i) {
+    model::NumberGenerator random(static_cast<uint64_t>(i));
+    Clip clip;
+    clip.output = i % 6 == 5 ? -1 : i % 6;
+    const double step = 0.1 * (1 + clip.output) * random.Uniform(0.95, 1.05);
+    for (int n = 0; n < 40000; ++n) {
+      const double value = clip.output < 0 ? random.Bell() : std::sin(step * n) * (n % 8000 < 4000);
+      clip.samples.push_back(static_cast<int16_t>(3000 * value));
+    }
+    clips.push_back(clip);
+  }
+  return clips;
+}
+
+Recipe ShortRecipe() {
+  Recipe recipe;
+  recipe.teachers = 2;
+  recipe.epochs = 2;
+  recipe.tuning_epochs = 2;
+  recipe.batch = 4;
+  recipe.windows = 1;
+  return recipe;
+}
+
+TrainingState RunTo(int epochs, Trainer* trainer, TrainingState state = TrainingState()) {
+  while (state.epoch < epochs) trainer->RunEpoch(&state);
+  return state;
+}
+
+TEST(Trainer, SameSeedSameModelWhateverTheThreadsAndStops) {
+  const Recipe recipe = ShortRecipe();
+  const std::vector<Clip> clips = Tones(1);
+  Trainer one(recipe, 5, 1, clips), two(recipe, 5, 2, clips), other_seed(recipe, 6, 1, clips);
+  const Values straight = RunTo(6, &one).average;
+  EXPECT_EQ(RunTo(6, &two).average, straight);
+  EXPECT_NE(RunTo(6, &other_seed).average, straight);
+
+  const test::TemporaryFolder folder;
+  const std::string file = folder.Path("state"), mark = Fingerprint(recipe, 5, clips, {});
+  EXPECT_FALSE(ReadState(file, mark));
+  for (const int stop : {1, 2, 3, 4, 5}) {  // within phases and between them
+    WriteState(file, mark, RunTo(stop, &one));
+    EXPECT_EQ(RunTo(6, &one, *ReadState(file, mark)).average, straight) << stop;
+  }
+  EXPECT_THROW(ReadState(file, Fingerprint(recipe, 6, clips, {})), std::runtime_error);
+  std::filesystem::resize_file(file, std::filesystem::file_size(file) - 1);
+  EXPECT_THROW(ReadState(file, mark), std::runtime_error);
+}
+
+TEST(Trainer, LearnsTonesAndStillKnowsThemInInt8) {
+  Recipe recipe = ShortRecipe();
+  recipe.teachers = 1;
+  recipe.epochs = 80;
+  recipe.tuning_epochs = 3;
+  // Two tones, or one played faster, are like another.
+  recipe.mix_share = recipe.speed_share = recipe.shift_share = recipe.dropout = 0;
+  recipe.tilt = recipe.time_masks = recipe.channel_masks = 0;
+  recipe.batch = 6;
+  recipe.average = 0.8;
+  const std::vector<Clip> clips = Tones(2);
+  Trainer trainer(recipe, 1, 2, clips);
+  const TrainingState state = RunTo(83, &trainer);
+  EXPECT_TRUE(trainer.Done(state));
+  std::vector<Batch> features;
+  for (const Clip& clip : clips) features.push_back(JudgedFeatures(clip.samples));
+  const Figures by_float = FiguresOf(ScoresOf(state.teachers[0], features), clips);
+  const Figures by_device =
+      FiguresOf(ScoresOf(QuantisedParameters(state.average), features), clips);
+  EXPECT_EQ(by_device.outputs, 5);
+  EXPECT_GT(by_float.average_precision, 0.9);
+  EXPECT_GT(by_device.average_precision, 0.85);
+}
+
+TEST(Trainer, TuningBeginsWithTheFirstTeacherHoweverItEnded) {
+  const Recipe recipe = ShortRecipe();
+  const std::vector<Clip> clips = Tones(1);
+  Trainer trainer(recipe, 1, 1, clips);
+  TrainingState state = RunTo(1, &trainer);
+  Values best = state.average;
+  best[0] = 0.25f;
+  trainer.EndTeacher(best, &state);  // with an epoch to go
+  EXPECT_EQ(trainer.EpochsLeft(state), 4);
+  state = RunTo(3, &trainer, state);
+  ASSERT_TRUE(trainer.Tuning(state));
+  EXPECT_EQ(state.teachers[0][0], 0.25f);
+  state = RunTo(4, &trainer, state);
+  EXPECT_NEAR(state.average[0], 0.25f, 0.01f);
+  EXPECT_TRUE(trainer.Done(RunTo(5, &trainer, state)));
+}
+
+TEST(Augmentation, JoinsLabelsAndStaysInRange) {
+  Recipe recipe = ShortRecipe();
+  recipe.mix_share = 1;
+  recipe.noise_share = 1;
+  const std::vector<Clip> clips = Tones(1);
+  const Augmentation augmentation(recipe, clips);
+  Batch features;
+  features.Resize(2, FramesFor(1), 48);
+  Matrix targets(2, 5);
+  bool joined = false;
+  for (uint64_t seed = 0; seed < 40; ++seed) {
+    augmentation.Make(seed % 5, seed, 1, &features, &targets);
+    EXPECT_EQ(targets(1, static_cast<Eigen::Index>(seed % 5)), 1);
+    joined |= targets.row(1).sum() == 2;
+    const auto made = features.values.bottomRows(FramesFor(1));
+    EXPECT_GE(made.minCoeff(), 0);
+    EXPECT_LE(made.maxCoeff(), 255);
+    EXPECT_GT(made.maxCoeff(), 60) << "the clip is not to be heard";
+  }
+  EXPECT_TRUE(joined);
+}
+
+TEST(Recipe, IsReadAndRefused) {
+  const test::TemporaryFolder folder;
+  const std::string file = folder.Path("recipe");
+  const auto read = [&](const std::string& text) {
+    std::ofstream(file) << text;
+    return ReadRecipe(file);
+  };
+  const Recipe recipe = read("# mine\n\nepochs 7 # few\nrate 0.5\n");
+  EXPECT_EQ(recipe.epochs, 7);
+  EXPECT_EQ(recipe.rate, 0.5);
+  EXPECT_EQ(Describe(read(Describe(recipe))), Describe(recipe));
+  const std::pair<const char*, const char*> kBad[] = {
+      {"epochs\n", "line 1: should be a name and a value"},
+      {"rate 0.1\nepochs 1.5\n", "line 2: epochs is '1.5', should be a whole number from 1 to"},
+      {"rate nan\n", "rate is 'nan', should be a number from 0 to 1"},
+      {"rate 1x\n", "rate is '1x'"},
+      {"speed 1\n", "line 1: a recipe knows no 'speed'"}};
+  for (const auto& [text, message] : kBad) {
+    try {
+      read(text);
+      ADD_FAILURE() << text;
+    } catch (const std::runtime_error& error) {
+      EXPECT_THAT(error.what(), HasSubstr(message));
+    }
+  }
+}
+
+}  // namespace
+}  // namespace qz::train

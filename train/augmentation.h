@@ -1,0 +1,40 @@
+// Makes many sounds of few: the same recording at another place, loudness, speed, among other
+// sounds, in noise; and features with gaps, as from another microphone.
+#pragma once
+
+#include <cstdint>
+#include <vector>
+
+#include "matrix.h"
+#include "number_generator.h"
+#include "recipe.h"
+#include "training_set.h"
+
+namespace qz::train {
+
+class Augmentation {
+ public:
+  // The clips are not copied; there is at least one.
+  Augmentation(const Recipe& recipe, const std::vector<Clip>& clips);
+
+  // Writes sequence `sequence` of a batch of features (0 to 255, FramesFor(recipe.windows) frames)
+  // that begins with clip `first`, and its row of targets. Follows from the arguments alone; may
+  // be called on several threads.
+  void Make(size_t first, uint64_t seed, Eigen::Index sequence, Batch* features,
+            Matrix* targets) const;
+
+ private:
+  using Sound = std::vector<float>;
+
+  void AddClip(const Clip& clip, double gain, model::NumberGenerator* random, Sound* sound) const;
+  void AddNoise(model::NumberGenerator* random, Sound* sound) const;
+  void Colour(model::NumberGenerator* random, Eigen::Index sequence, Batch* features) const;
+  void Mask(model::NumberGenerator* random, Eigen::Index sequence, Batch* features) const;
+
+  const Recipe& recipe_;
+  const std::vector<Clip>& clips_;
+  size_t samples_;             // of a sequence
+  std::vector<Sound> noises_;  // white, pink and brown, of mean square 1
+};
+
+}  // namespace qz::train

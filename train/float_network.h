@@ -1,0 +1,52 @@
+// The network over float, in real units: what training begins with.
+#pragma once
+
+#include <array>
+#include <cstdint>
+
+#include "layers.h"
+#include "parameters.h"
+
+namespace qz::train {
+
+// What a layer keeps of a forward pass for the backward pass.
+struct LayerTrace {
+  Batch in;       // after dropout
+  Batch out;      // clamped, before the pool
+  Batch pooled;   // of pooled layers
+  Batch dropout;  // what the input was multiplied with; empty where nothing was dropped
+  Normalisation normalisation;
+
+  const Batch& Result(const LayerPlan& plan) const { return plan.pooled ? pooled : out; }
+};
+
+// What is done in training only.
+struct TrainingNoise {
+  float dropout = 0;  // share of inputs that are put out before the layers that the plan names
+  uint64_t seed = 0;  // of what is put out
+};
+
+class FloatNetwork {
+ public:
+  // Features (0 to 255, sequences of 382 + 64 k frames) into logits, k + 1 for each sequence. With
+  // `noise` normalises by the batch, else the parameters must be folded.
+  const Batch& Forward(const Values& parameters, const Batch& features, const TrainingNoise* noise);
+  // After Forward with the same parameters: adds the gradient of the loss to *gradient, of
+  // kParameters.learnt numbers.
+  void Backward(const Values& parameters, const Batch& dlogits, Values* gradient);
+  // Moves the running numbers of *values to the last batch's by `rate`.
+  void MoveRunning(float rate, Values* values) const;
+
+ private:
+  std::array<LayerTrace, kLayers> traces_;
+  bool normalised_ = false;
+};
+
+// Puts out a share of the values and makes the others larger; *mask is what they were multiplied
+// with.
+void DropOut(float share, uint64_t seed, Batch* x, Batch* mask);
+
+// Clears the gradient where the output stands at a limit.
+void MaskClamped(const Batch& out, float lowest, float highest, Batch* gradient);
+
+}  // namespace qz::train

@@ -1,0 +1,59 @@
+#include "loss.h"
+
+#include <cmath>
+
+namespace qz::train {
+namespace {
+
+// log(1 + e^x) without overflow.
+double SoftPlus(double x) { return x > 0 ? x + std::log1p(std::exp(-x)) : std::log1p(std::exp(x)); }
+
+double Logistic(double x) { return 1 / (1 + std::exp(-x)); }
+
+}  // namespace
+
+double ClipLoss(const Batch& logits, const Matrix& targets, const LossShape& shape, float divisor,
+                Batch* dlogits) {
+  const Eigen::Index windows = logits.steps();
+  dlogits->Resize(logits.sequences, windows, logits.channels());
+  const double sharpness = static_cast<double>(shape.sharpness);
+  double loss = 0;
+  for (int s = 0; s < logits.sequences; ++s) {
+    for (Eigen::Index c = 0; c < logits.channels(); ++c) {
+      const auto column = logits.values.col(c).segment(s * windows, windows);
+      const double highest = static_cast<double>(column.maxCoeff());
+      double sum = 0;
+      for (Eigen::Index w = 0; w < windows; ++w) {
+        sum += std::exp(sharpness * (static_cast<double>(column(w)) - highest));
+      }
+      const double logit = highest + std::log(sum / static_cast<double>(windows)) / sharpness;
+      const double smoothing = static_cast<double>(shape.smoothing);
+      const double target = smoothing + (1 - 2 * smoothing) * static_cast<double>(targets(s, c));
+      const double weight = static_cast<double>(shape.positive_weight(c));
+      loss += weight * target * SoftPlus(-logit) + (1 - target) * SoftPlus(logit);
+      const double score = Logistic(logit);
+      const double slope =
+          ((1 - target) * score - weight * target * (1 - score)) / static_cast<double>(divisor);
+      for (Eigen::Index w = 0; w < windows; ++w) {
+        const double share = std::exp(sharpness * (static_cast<double>(column(w)) - highest)) / sum;
+        dlogits->values(s * windows + w, c) = static_cast<float>(slope * share);
+      }
+    }
+  }
+  return loss / static_cast<double>(divisor);
+}
+
+double TeachingLoss(const Batch& logits, const Batch& taught, float divisor, Batch* dlogits) {
+  dlogits->Resize(logits.sequences, logits.steps(), logits.channels());
+  const double parts = static_cast<double>(divisor) * static_cast<double>(logits.steps());
+  double loss = 0;
+  for (Eigen::Index i = 0; i < logits.values.size(); ++i) {
+    const auto logit = static_cast<double>(logits.values.data()[i]);
+    const double target = Logistic(static_cast<double>(taught.values.data()[i]));
+    loss += target * SoftPlus(-logit) + (1 - target) * SoftPlus(logit);
+    dlogits->values.data()[i] = static_cast<float>((Logistic(logit) - target) / parts);
+  }
+  return loss / parts;
+}
+
+}  // namespace qz::train

@@ -1,0 +1,27 @@
+#pragma once
+
+#include "matrix.h"
+#include "reference_network.h"
+
+namespace qz::train {
+
+// How windows of a sequence make one score, and what a wrong score costs.
+struct LossShape {
+  float sharpness = 3;  // of the soft maximum over the windows of a sequence
+  float smoothing = 0;  // targets are moved that far from 0 and 1
+  // Cost of a missed positive as a multiple of a false alarm's, by class.
+  RowVector positive_weight = RowVector::Ones(model::kClasses);
+};
+
+// logits: sequences of windows x classes; targets: sequences x classes, 0 to 1. The clip's logit is
+// the soft maximum (1 / sharpness) log mean exp(sharpness x logit) over its windows, its cost the
+// cross-entropy of its logistic with the target. Gives the sum over sequences and classes divided
+// by `divisor`, and its gradient.
+double ClipLoss(const Batch& logits, const Matrix& targets, const LossShape& shape, float divisor,
+                Batch* dlogits);
+
+// The cross-entropy of every window's logistic with that of the teachers' logit: sum over windows
+// and classes, divided by `divisor` and the windows of a sequence, and its gradient.
+double TeachingLoss(const Batch& logits, const Batch& taught, float divisor, Batch* dlogits);
+
+}  // namespace qz::train

@@ -1,0 +1,127 @@
+#include "proof.h"
+
+#include <algorithm>
+#include <cstdio>
+
+#include "digest.h"
+#include "judge.h"
+#include "loaded_network.h"
+#include "operators.h"
+
+namespace qz::train {
+namespace {
+
+constexpr size_t kLogistic = 19;
+constexpr size_t kConversion = 20;
+
+// A clip's windows, as sequences of their own.
+Batch WindowsOf(const Batch& features) {
+  Batch windows;
+  const auto count = static_cast<int>((features.steps() - FramesFor(1)) / 64 + 1);
+  windows.Resize(count, FramesFor(1), features.channels());
+  for (int w = 0; w < count; ++w) {
+    windows.values.middleRows(w * FramesFor(1), FramesFor(1)) =
+        features.values.middleRows(w * 64, FramesFor(1));
+  }
+  return windows;
+}
+
+class Prover {
+ public:
+  Prover(const QuantisedParameters& parameters, const model::PackedModel& model)
+      : parameters_(parameters) {
+    std::copy(model.begin(), model.end(), loaded_tables);
+  }
+
+  void Compare(const Batch& features) {
+    const Batch windows = WindowsOf(features);
+    network_.Forward(parameters_, windows, nullptr);
+    for (int w = 0; w < windows.sequences; ++w) {
+      const auto input = windows.values.middleRows(w * FramesFor(1), FramesFor(1));
+      std::transform(input.data(), input.data() + input.size(), mobilenet_backend_input_ptr,
+                     [](float feature) { return static_cast<int8_t>(feature - 128); });
+      for (size_t op = 0; op < kOperatorCount; ++op) CompareOperator(op, w);
+      ++proof_.runs;
+    }
+  }
+
+  const Proof& proof() const { return proof_; }
+
+ private:
+  void CompareOperator(size_t op, int window) {
+    kOperators[op].run();
+    const Tensor& tensor = kOperators[op].output;
+    const int8_t* const theirs = BytesOf(tensor);
+    const std::vector<int8_t> ours = OursOf(op, window);
+    proof_.trainer_digest = model::Digest(ours.data(), ours.size(), proof_.trainer_digest);
+    proof_.module_digest = model::Digest(theirs, tensor.Bytes(), proof_.module_digest);
+    proof_.bytes += tensor.Bytes();
+    if (!proof_.difference.empty()) return;
+    size_t i = 0;
+    while (i < ours.size() && i < tensor.Bytes() && ours[i] == theirs[i]) ++i;
+    if (i == ours.size() && i == tensor.Bytes()) return;
+    proof_.difference = "run " + std::to_string(proof_.runs) + ", operator " + std::to_string(op) +
+                        ", row " + std::to_string(i / tensor.channels) + ", channel " +
+                        std::to_string(i % tensor.channels);
+    if (i < ours.size() && i < tensor.Bytes()) {
+      proof_.difference += ": the trainer's is " + std::to_string(ours[i]) + ", the module's " +
+                           std::to_string(theirs[i]);
+    }
+  }
+
+  // The tensor of a window as bytes.
+  std::vector<int8_t> OursOf(size_t op, int window) const {
+    if (op >= kLogistic) return ScoreBytes(window, op == kConversion);
+    // Operator 16 hands on what 15 wrote.
+    const int written = op == 16 ? 15 : static_cast<int>(op);
+    const Batch& out = network_.OutputOf(written);
+    const auto rows = out.values.middleRows(window * out.steps(), out.steps());
+    const int zero_point = QuantisedNetwork::ZeroPointOf(written);
+    std::vector<int8_t> bytes(static_cast<size_t>(rows.size()));
+    std::transform(rows.data(), rows.data() + rows.size(), bytes.begin(), [&](float value) {
+      return static_cast<int8_t>(static_cast<int>(value) + zero_point);
+    });
+    return bytes;
+  }
+
+  std::vector<int8_t> ScoreBytes(int window, bool as_floats) const {
+    std::vector<int8_t> bytes;
+    for (int c = 0; c < model::kClasses; ++c) {
+      const float score = DeviceScore(network_.OutputOf(18).values(window, c));
+      if (as_floats) {
+        const auto* begin = reinterpret_cast<const int8_t*>(&score);
+        bytes.insert(bytes.end(), begin, begin + sizeof(score));
+      } else {
+        bytes.push_back(static_cast<int8_t>(static_cast<int>(score * 256) - 128));
+      }
+    }
+    return bytes;
+  }
+
+  const QuantisedParameters& parameters_;
+  QuantisedNetwork network_;
+  Proof proof_;
+};
+
+}  // namespace
+
+Proof Prove(const QuantisedParameters& parameters, const model::PackedModel& model,
+            const std::vector<Batch>& judged) {
+  Prover prover(parameters, model);
+  for (const Batch& features : judged) prover.Compare(features);
+  return prover.proof();
+}
+
+std::string Sentence(const Proof& proof) {
+  char text[256];
+  std::snprintf(text, sizeof(text),
+                "%llu network runs, %llu bytes of 21 operators: trainer %016llx, module %016llx",
+                static_cast<unsigned long long>(proof.runs),
+                static_cast<unsigned long long>(proof.bytes),
+                static_cast<unsigned long long>(proof.trainer_digest),
+                static_cast<unsigned long long>(proof.module_digest));
+  return text + std::string(proof.difference.empty() ? ", the same" : ", different: ") +
+         proof.difference;
+}
+
+}  // namespace qz::train

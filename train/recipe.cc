@@ -1,0 +1,121 @@
+#include "recipe.h"
+
+#include <cerrno>
+#include <cmath>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <fstream>
+#include <sstream>
+#include <stdexcept>
+
+namespace qz::train {
+namespace {
+
+struct Entry {
+  const char* name;
+  double low, high;
+  int Recipe::*whole;
+  double Recipe::*real;
+};
+
+constexpr Entry Whole(const char* name, int Recipe::*field, double low, double high) {
+  return {name, low, high, field, nullptr};
+}
+constexpr Entry Real(const char* name, double Recipe::*field, double low, double high) {
+  return {name, low, high, nullptr, field};
+}
+
+constexpr Entry kEntries[] = {
+    Whole("teachers", &Recipe::teachers, 1, 100),
+    Whole("epochs", &Recipe::epochs, 1, 100000),
+    Whole("tuning_epochs", &Recipe::tuning_epochs, 1, 100000),
+    Whole("batch", &Recipe::batch, 2, 1024),
+    Whole("windows", &Recipe::windows, 1, 64),
+    Real("rate", &Recipe::rate, 0, 1),
+    Real("tuning_rate", &Recipe::tuning_rate, 0, 1),
+    Real("decay", &Recipe::decay, 0, 10),
+    Real("average", &Recipe::average, 0, 0.999999),
+    Real("dropout", &Recipe::dropout, 0, 0.9),
+    Real("smoothing", &Recipe::smoothing, 0, 0.49),
+    Real("positive_weight", &Recipe::positive_weight, 0.01, 100),
+    Real("sharpness", &Recipe::sharpness, 0.01, 100),
+    Real("lowest_gain", &Recipe::lowest_gain, -90, 90),
+    Real("highest_gain", &Recipe::highest_gain, -90, 90),
+    Real("turn_share", &Recipe::turn_share, 0, 1),
+    Real("speed_share", &Recipe::speed_share, 0, 1),
+    Real("speed_range", &Recipe::speed_range, 0, 0.9),
+    Real("mix_share", &Recipe::mix_share, 0, 1),
+    Real("mix_range", &Recipe::mix_range, 0, 90),
+    Real("noise_share", &Recipe::noise_share, 0, 1),
+    Real("lowest_snr", &Recipe::lowest_snr, -90, 90),
+    Real("highest_snr", &Recipe::highest_snr, -90, 90),
+    Real("tilt", &Recipe::tilt, 0, 200),
+    Real("shift_share", &Recipe::shift_share, 0, 1),
+    Whole("time_masks", &Recipe::time_masks, 0, 100),
+    Whole("longest_time_mask", &Recipe::longest_time_mask, 1, 382),
+    Whole("channel_masks", &Recipe::channel_masks, 0, 48),
+    Whole("widest_channel_mask", &Recipe::widest_channel_mask, 1, 48),
+};
+
+std::string Number(double value) {
+  char text[32];
+  std::snprintf(text, sizeof(text), "%.10g", value);
+  return text;
+}
+
+}  // namespace
+
+void SetInRecipe(const std::string& name, const std::string& value, Recipe* recipe) {
+  for (const Entry& entry : kEntries) {
+    if (name != entry.name) continue;
+    char* end = nullptr;
+    const double number = std::strtod(value.c_str(), &end);
+    const bool whole = entry.whole == nullptr || number == std::floor(number);
+    if (value.empty() || *end != '\0' || !(number >= entry.low && number <= entry.high) || !whole) {
+      throw std::runtime_error(name + " is '" + value + "', should be a " +
+                               (entry.whole != nullptr ? "whole " : "") + "number from " +
+                               Number(entry.low) + " to " + Number(entry.high));
+    }
+    if (entry.whole != nullptr) {
+      recipe->*entry.whole = static_cast<int>(number);
+    } else {
+      recipe->*entry.real = number;
+    }
+    return;
+  }
+  throw std::runtime_error("a recipe knows no '" + name + "'");
+}
+
+Recipe ReadRecipe(const std::string& path) {
+  std::ifstream file(path);
+  if (!file) throw std::runtime_error(path + ": can't be opened: " + std::strerror(errno));
+  Recipe recipe;
+  std::string line;
+  for (int number = 1; std::getline(file, line); ++number) {
+    std::istringstream words(line.substr(0, line.find('#')));
+    std::string name, value, more;
+    if (!(words >> name)) continue;
+    const std::string place = path + ": line " + std::to_string(number) + ": ";
+    if (!(words >> value) || words >> more) {
+      throw std::runtime_error(place + "should be a name and a value: '" + line + "'");
+    }
+    try {
+      SetInRecipe(name, value, &recipe);
+    } catch (const std::runtime_error& error) {
+      throw std::runtime_error(place + error.what());
+    }
+  }
+  return recipe;
+}
+
+std::string Describe(const Recipe& recipe) {
+  std::string text;
+  for (const Entry& entry : kEntries) {
+    const double value = entry.whole != nullptr ? recipe.*entry.whole : recipe.*entry.real;
+    text += std::string(entry.name) + " " + Number(value) + "\n";
+  }
+  return text;
+}
+
+}  // namespace qz::train

@@ -1,0 +1,95 @@
+#include "state_file.h"
+
+#include <cstring>
+#include <filesystem>
+#include <stdexcept>
+
+#include "digest.h"
+#include "model_files.h"
+
+namespace qz::train {
+namespace {
+
+// The layout's name and version; numbers are as in memory, little-endian.
+constexpr char kMagic[] = "qz training state 1\n";
+
+// Of a hundred teachers and more.
+constexpr size_t kMostBytes = 128 << 20;
+
+std::string DigestOf(const std::vector<Clip>& clips) {
+  uint64_t digest = model::kDigestOfNothing;
+  for (const Clip& clip : clips) {
+    digest = model::Digest(&clip.output, sizeof(clip.output), digest);
+    digest = model::Digest(clip.samples.data(), clip.samples.size() * sizeof(int16_t), digest);
+  }
+  return std::to_string(clips.size()) + " clips, digest " + std::to_string(digest);
+}
+
+// Hands every field to `visit` in the order of the file; the teachers have their number already.
+template <typename State, typename Visit>
+void ForEachField(State& state, Visit visit) {
+  visit(&state.epoch, sizeof(state.epoch));
+  visit(&state.phase_epoch, sizeof(state.phase_epoch));
+  visit(&state.best_epoch, sizeof(state.best_epoch));
+  visit(&state.best_figure, sizeof(state.best_figure));
+  visit(&state.adam.steps, sizeof(state.adam.steps));
+  const auto visit_values = [&](auto& values) {
+    visit(values.data(), values.size() * sizeof(float));
+  };
+  for (auto* values :
+       {&state.adam.mean, &state.adam.square, &state.values, &state.average, &state.best}) {
+    visit_values(*values);
+  }
+  for (auto& teacher : state.teachers) visit_values(teacher);
+}
+
+size_t SizeOf(const TrainingState& state) {
+  size_t bytes = 0;
+  ForEachField(state, [&](const void*, size_t size) { bytes += size; });
+  return bytes;
+}
+
+}  // namespace
+
+std::string Fingerprint(const Recipe& recipe, uint64_t seed, const std::vector<Clip>& learnt,
+                        const std::vector<Clip>& judged) {
+  return kMagic + Describe(recipe) + "seed " + std::to_string(seed) + "\nlearns from " +
+         DigestOf(learnt) + "\njudged by " + DigestOf(judged) + "\n";
+}
+
+void WriteState(const std::string& path, const std::string& fingerprint,
+                const TrainingState& state) {
+  std::string bytes = fingerprint;
+  ForEachField(state, [&](const void* field, size_t size) {
+    bytes.append(static_cast<const char*>(field), size);
+  });
+  model::WriteWholeFile(path, bytes);
+}
+
+std::optional<TrainingState> ReadState(const std::string& path, const std::string& fingerprint) {
+  if (!std::filesystem::exists(path)) return std::nullopt;
+  const std::vector<uint8_t> bytes = model::ReadWholeFile(path, kMostBytes);
+  if (bytes.size() < fingerprint.size() ||
+      std::memcmp(bytes.data(), fingerprint.data(), fingerprint.size()) != 0) {
+    throw std::runtime_error(path +
+                             ": is of another run (recipe, seed or clips differ); remove it "
+                             "or name another file");
+  }
+  // As many teachers as the size tells.
+  TrainingState state;
+  const size_t fields = SizeOf(state), teacher = kParameters.all * sizeof(float);
+  const size_t held = bytes.size() - fingerprint.size();
+  if (held < fields || (held - fields) % teacher != 0) {
+    throw std::runtime_error(path + ": has " + std::to_string(bytes.size()) +
+                             " bytes, which is not whole; remove it to begin anew");
+  }
+  state.teachers.assign((held - fields) / teacher, Values(kParameters.all));
+  size_t next = fingerprint.size();
+  ForEachField(state, [&](void* field, size_t size) {
+    std::memcpy(field, bytes.data() + next, size);
+    next += size;
+  });
+  return state;
+}
+
+}  // namespace qz::train

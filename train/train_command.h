@@ -1,0 +1,25 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+#include "exit_code.h"
+
+namespace qz::train {
+
+struct TrainOptions {
+  std::string manifest;
+  std::string output;  // the packed model
+  std::string labels_file;
+  std::string recipe_file;  // empty: the recipe built in
+  std::string state_file;   // empty: none, a stopped run is lost
+  uint64_t seed = 1;
+  int hold_out = 0;  // fold that is not learnt from but judged by; 0: none
+  int patience = 0;  // epochs without a better figure that end the float part; 0: never
+  int threads = 2;
+};
+
+// Learns from a list of recordings and writes a packed model. Says what went wrong itself.
+tools::ExitCode TrainCommand(const TrainOptions& options);
+
+}  // namespace qz::train

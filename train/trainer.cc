@@ -1,0 +1,187 @@
+#include "trainer.h"
+
+#include <algorithm>
+#include <cmath>
+#include <thread>
+
+namespace qz::train {
+namespace {
+
+// A batch is cut into so many parts, whatever the number of threads, each normalised by itself: the
+// sums do not depend on the machine.
+constexpr size_t kShards = 2;
+
+constexpr float kRunningRate = 0.05f;
+constexpr double kWarmUpSteps = 50;
+constexpr double kPi = 3.14159265358979323846;
+
+uint64_t Mixed(uint64_t a, uint64_t b) {
+  return model::NumberGenerator(a ^ (b * 0x9E3779B97F4A7C15u)).Next();
+}
+
+// A class with half as many clips as the others weighs twice as much.
+LossShape ShapeOf(const Recipe& recipe, const std::vector<Clip>& clips) {
+  RowVector counts = RowVector::Zero(model::kClasses);
+  for (const Clip& clip : clips) {
+    if (clip.output >= 0) counts(clip.output) += 1;
+  }
+  const float mean = counts.mean();
+  LossShape shape;
+  shape.sharpness = static_cast<float>(recipe.sharpness);
+  shape.smoothing = static_cast<float>(recipe.smoothing);
+  shape.positive_weight =
+      static_cast<float>(recipe.positive_weight) * mean * counts.cwiseMax(1.0f).cwiseInverse();
+  return shape;
+}
+
+}  // namespace
+
+Trainer::Trainer(const Recipe& recipe, uint64_t seed, int threads, const std::vector<Clip>& clips)
+    : recipe_(recipe),
+      seed_(seed),
+      threads_(threads),
+      clips_(clips),
+      augmentation_(recipe_, clips_),
+      loss_shape_(ShapeOf(recipe, clips)),
+      shards_(kShards) {
+  const int sequences = recipe.batch / static_cast<int>(kShards);
+  for (Shard& shard : shards_) {
+    shard.features.Resize(sequences, FramesFor(recipe.windows), 48);
+    shard.targets.resize(sequences, model::kClasses);
+  }
+}
+
+int Trainer::EpochsLeft(const TrainingState& state) const {
+  if (Tuning(state)) return recipe_.tuning_epochs - state.phase_epoch;
+  const int teachers = recipe_.teachers - static_cast<int>(state.teachers.size());
+  return teachers * recipe_.epochs - state.phase_epoch + recipe_.tuning_epochs;
+}
+
+void Trainer::BeginPhase(TrainingState* state) const {
+  state->values =
+      Tuning(*state) ? state->teachers[0] : InitialParameters(Mixed(seed_, state->teachers.size()));
+  state->average = state->values;
+  state->adam = Adam();
+  state->best_figure = -1;
+}
+
+void Trainer::EndTeacher(const Values& average, TrainingState* state) const {
+  state->teachers.push_back(average);
+  FoldNormalisations(&state->teachers.back());
+  ClampWeights(&state->teachers.back());
+  state->phase_epoch = 0;
+}
+
+std::vector<size_t> Trainer::OrderOf(int epoch) const {
+  std::vector<size_t> order(clips_.size());
+  for (size_t i = 0; i < order.size(); ++i) order[i] = i;
+  model::NumberGenerator random(Mixed(seed_ + 1, static_cast<uint64_t>(epoch)));
+  for (size_t i = order.size(); i > 1; --i) std::swap(order[i - 1], order[random.Next() % i]);
+  return order;
+}
+
+double Trainer::RunEpoch(TrainingState* state) {
+  if (state->phase_epoch == 0) BeginPhase(state);
+  const std::vector<size_t> order = OrderOf(state->epoch);
+  const auto batch = static_cast<size_t>(recipe_.batch);
+  const size_t steps = StepsAnEpoch();
+  double loss = 0;
+  for (size_t i = 0; i < steps; ++i) {
+    loss += RunStep(state, order, i * batch, static_cast<uint64_t>(state->epoch) * steps + i);
+  }
+  ++state->epoch;
+  ++state->phase_epoch;
+  if (!Tuning(*state) && state->phase_epoch == recipe_.epochs) EndTeacher(state->average, state);
+  return loss / static_cast<double>(steps);
+}
+
+size_t Trainer::StepsAnEpoch() const {
+  const auto batch = static_cast<size_t>(recipe_.batch);
+  return (clips_.size() + batch - 1) / batch;
+}
+
+void Trainer::Teach(const TrainingState& state, Shard* shard) const {
+  shard->taught = Batch();
+  for (const Values& teacher : state.teachers) {
+    const Batch& logits = shard->float_network.Forward(teacher, shard->features, nullptr);
+    if (shard->taught.sequences == 0) {
+      shard->taught = logits;
+    } else {
+      shard->taught.values += logits.values;
+    }
+  }
+  shard->taught.values /= static_cast<float>(state.teachers.size());
+}
+
+void Trainer::RunShard(const TrainingState& state, const QuantisedParameters* quantised,
+                       const std::vector<size_t>& order, size_t first, uint64_t step,
+                       size_t index) {
+  Shard& shard = shards_[index];
+  const auto sequences = static_cast<size_t>(shard.features.sequences);
+  for (size_t s = 0; s < sequences; ++s) {
+    const size_t place = first + index * sequences + s;
+    augmentation_.Make(order[place % order.size()], Mixed(Mixed(seed_, step), place),
+                       static_cast<Eigen::Index>(s), &shard.features, &shard.targets);
+  }
+  const TrainingNoise noise{static_cast<float>(recipe_.dropout),
+                            Mixed(Mixed(seed_ + 2, step), index)};
+  const auto divisor = static_cast<float>(recipe_.batch);
+  shard.gradient.assign(kParameters.learnt, 0);
+  if (quantised == nullptr) {
+    const Batch& logits = shard.float_network.Forward(state.values, shard.features, &noise);
+    shard.loss = ClipLoss(logits, shard.targets, loss_shape_, divisor, &shard.dlogits);
+    shard.float_network.Backward(state.values, shard.dlogits, &shard.gradient);
+  } else {
+    Batch logits = shard.quantised_network.Forward(*quantised, shard.features, &noise);
+    logits.values *= static_cast<float>(kLogitScale);
+    Teach(state, &shard);
+    shard.loss = TeachingLoss(logits, shard.taught, divisor, &shard.dlogits);
+    shard.quantised_network.Backward(*quantised, shard.dlogits, &shard.gradient);
+  }
+}
+
+double Trainer::RunStep(TrainingState* state, const std::vector<size_t>& order, size_t first,
+                        uint64_t step) {
+  const bool tuning = Tuning(*state);
+  const QuantisedParameters quantised(state->values);
+  const auto run = [&](size_t index) {
+    RunShard(*state, tuning ? &quantised : nullptr, order, first, step, index);
+  };
+  std::vector<std::thread> threads;
+  for (size_t i = 1; i < kShards; ++i) {
+    if (threads_ > 1) threads.emplace_back(run, i);
+  }
+  run(0);
+  for (size_t i = 1; i < kShards && threads_ <= 1; ++i) run(i);
+  for (std::thread& thread : threads) thread.join();
+
+  double loss = shards_[0].loss;
+  Values gradient = shards_[0].gradient;
+  for (size_t i = 1; i < kShards; ++i) {
+    loss += shards_[i].loss;
+    for (size_t j = 0; j < gradient.size(); ++j) gradient[j] += shards_[i].gradient[j];
+  }
+  state->adam.Step(gradient, RateAt(*state), static_cast<float>(recipe_.decay), &state->values);
+  ClampWeights(&state->values);
+  for (const Shard& shard : shards_) {
+    if (!tuning) shard.float_network.MoveRunning(kRunningRate, &state->values);
+  }
+  const auto memory =
+      static_cast<float>(std::min(recipe_.average, 1 - 1 / (10 + static_cast<double>(step))));
+  for (size_t i = 0; i < state->values.size(); ++i) {
+    state->average[i] = memory * state->average[i] + (1 - memory) * state->values[i];
+  }
+  return loss;
+}
+
+float Trainer::RateAt(const TrainingState& state) const {
+  const bool tuning = Tuning(state);
+  const auto done = static_cast<double>(state.adam.steps);
+  const double all = static_cast<double>(tuning ? recipe_.tuning_epochs : recipe_.epochs) *
+                     static_cast<double>(StepsAnEpoch());
+  const double warmth = std::min(1.0, (done + 1) / kWarmUpSteps);
+  const double highest = tuning ? recipe_.tuning_rate : recipe_.rate;
+  return static_cast<float>(highest * warmth * 0.5 * (1 + std::cos(kPi * done / all)));
+}
+
+}  // namespace qz::train

@@ -1,0 +1,83 @@
+// A training run: some networks over float, the teachers; then the model, which begins as the first
+// of them and learns in the device's arithmetic to answer as they do together.
+#pragma once
+
+#include <cstdint>
+#include <functional>
+#include <vector>
+
+#include "adam.h"
+#include "augmentation.h"
+#include "judge.h"
+#include "loss.h"
+#include "recipe.h"
+
+namespace qz::train {
+
+// All that a run is made of at the end of an epoch: what is written to go on from later.
+struct TrainingState {
+  int epoch = 0;                             // epochs done in all
+  int phase_epoch = 0;                       // of them in this phase: a teacher, or the tuning
+  std::vector<Values> teachers;              // folded, of the phases that are done
+  Values values = Values(kParameters.all);   // what is being learnt
+  Values average = Values(kParameters.all);  // its moving average: it is judged, and what remains
+  Adam adam;
+  // With patience: the average that was best in this phase.
+  Values best = Values(kParameters.all);
+  double best_figure = -1;
+  int best_epoch = 0;  // of the phase
+};
+
+class Trainer {
+ public:
+  // Nothing is copied; both lists outlive this. Threads change nothing but the time it takes.
+  Trainer(const Recipe& recipe, uint64_t seed, int threads, const std::vector<Clip>& clips);
+
+  // The next epoch is in the device's arithmetic.
+  bool Tuning(const TrainingState& state) const {
+    return state.teachers.size() == static_cast<size_t>(recipe_.teachers);
+  }
+  bool Done(const TrainingState& state) const {
+    return Tuning(state) && state.phase_epoch == recipe_.tuning_epochs;
+  }
+  // As far as is known.
+  int EpochsLeft(const TrainingState& state) const;
+  // Ends a teacher's phase: `average` becomes a teacher.
+  void EndTeacher(const Values& average, TrainingState* state) const;
+
+  // One epoch: every clip once as the first of a sequence. Gives the mean loss.
+  double RunEpoch(TrainingState* state);
+
+ private:
+  struct Shard {
+    Batch features;
+    Matrix targets;
+    FloatNetwork float_network;
+    QuantisedNetwork quantised_network;
+    Batch taught;
+    Batch dlogits;
+    Values gradient;
+    double loss = 0;
+  };
+
+  size_t StepsAnEpoch() const;
+  std::vector<size_t> OrderOf(int epoch) const;
+  void BeginPhase(TrainingState* state) const;
+  // The mean logits of all teachers.
+  void Teach(const TrainingState& state, Shard* shard) const;
+  void RunShard(const TrainingState& state, const QuantisedParameters* quantised,
+                const std::vector<size_t>& order, size_t first, uint64_t step, size_t index);
+  double RunStep(TrainingState* state, const std::vector<size_t>& order, size_t first,
+                 uint64_t step);
+  float RateAt(const TrainingState& state) const;
+
+  const Recipe& recipe_;
+  uint64_t seed_;
+  int threads_;
+  const std::vector<Clip>& clips_;
+  Augmentation augmentation_;
+  LossShape loss_shape_;
+  std::vector<Shard> shards_;
+};
+
+}  // namespace qz::train

@@ -1,0 +1,43 @@
+#include "training_set.h"
+
+#include <algorithm>
+
+#include "audio_input.h"
+#include "clip.h"
+#include "clip_features.h"
+#include "clip_scores.h"
+
+namespace qz::train {
+
+ClipList LoadClips(const std::vector<dataset::Recording>& recordings, const model::Labels& labels) {
+  ClipList list;
+  for (const dataset::Recording& recording : recordings) {
+    try {
+      list.clips.push_back({recording.file, recording.fold,
+                            model::OutputOf(labels, recording.class_name),
+                            dataset::ReadClip(recording.file)});
+    } catch (const tools::AudioError& error) {
+      list.skipped.emplace_back(error.what());
+    }
+  }
+  return list;
+}
+
+Batch JudgedFeatures(const std::vector<int16_t>& samples) {
+  const std::vector<uint16_t> features = evaluation::FeaturesToPlay(samples);
+  const auto frames = static_cast<int>(features.size() / dataset::kFeatureChannels);
+  Batch batch;
+  batch.Resize(1, FramesFor(1 + (frames - FramesFor(1)) / 64),
+               static_cast<Eigen::Index>(dataset::kFeatureChannels));
+  CopyFeatures(features, 0, &batch);
+  return batch;
+}
+
+void CopyFeatures(const std::vector<uint16_t>& features, Eigen::Index sequence, Batch* batch) {
+  const Eigen::Index count = batch->steps() * batch->channels();
+  std::transform(
+      features.begin(), features.begin() + count, batch->values.data() + sequence * count,
+      [](uint16_t feature) { return static_cast<float>(dataset::NetworkInput(feature) + 128); });
+}
+
+}  // namespace qz::train

@@ -1,0 +1,39 @@
+// The recordings that a model learns from, and those that it is judged by.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "labels.h"
+#include "manifest.h"
+#include "matrix.h"
+
+namespace qz::train {
+
+struct Clip {
+  std::string file;
+  int fold = 0;
+  int output = -1;               // that should answer; -1: none
+  std::vector<int16_t> samples;  // mono, 16 kHz
+};
+
+struct ClipList {
+  std::vector<Clip> clips;
+  std::vector<std::string> skipped;  // a line for each that can't be read
+};
+
+// Decodes all recordings, in their order.
+ClipList LoadClips(const std::vector<dataset::Recording>& recordings, const model::Labels& labels);
+
+// Frames of a sequence that the network looks at `windows` times.
+constexpr int FramesFor(int windows) { return 382 + 64 * (windows - 1); }
+
+// A clip from a fresh start and the silence behind it, as features 0 to 255, for all network runs
+// that judge it: FramesFor(runs) x 48.
+Batch JudgedFeatures(const std::vector<int16_t>& samples);
+
+// Writes as many frames of features as a sequence of the batch holds, as floats from 0 to 255.
+void CopyFeatures(const std::vector<uint16_t>& features, Eigen::Index sequence, Batch* batch);
+
+}  // namespace qz::train
