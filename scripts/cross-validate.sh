@@ -21,8 +21,16 @@ export folder
 
 scripts/train-material.sh "$1" $folder
 printf '%s\n' "${folds[@]}" | xargs -P 2 -I{} bash -c 'fit {}'
-for fold in "${folds[@]}"; do cat $folder/fold-"$fold".txt; done
+
+models=()
+for fold in "${folds[@]}"; do
+  cat $folder/fold-"$fold".txt
+  models+=(--fold-model "$fold=$folder/fold-$fold.bin")
+done
 awk '/^loss of quantisation/ { sum += $4; n++ }
-     END { printf "loss of quantisation, mean over %d folds: %.4f mean AP\n", n, sum / n }' \
+     END { printf "loss of quantisation, mean over %d folds: %.4f mean AP\n\n", n, sum / n }' \
   $folder/fold-?.txt
-build/host/bin/qz eval $folder/manifest.tsv "${folds[@]/#/--fold-model=}"
+build/host/bin/qz eval $folder/manifest.tsv "${models[@]}"
+printf '\nFor comparison, a random forest on averages of the same features:\n'
+build/host/bin/qz features --manifest $folder/manifest.tsv -o $folder/features
+scripts/compare-with-forest.py $folder/features

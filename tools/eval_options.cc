@@ -37,6 +37,7 @@ std::vector<EvalOptions::Part> ParseFoldModels(const std::vector<std::string>& w
     }
   }
   std::vector<EvalOptions::Part> parts;
+  parts.reserve(models.size());
   for (const auto& [fold, model] : models) parts.push_back({fold, model});
   return parts;
 }

@@ -73,9 +73,11 @@ void SetInRecipe(const std::string& name, const std::string& value, Recipe* reci
     const double number = std::strtod(value.c_str(), &end);
     const bool whole = entry.whole == nullptr || number == std::floor(number);
     if (value.empty() || *end != '\0' || !(number >= entry.low && number <= entry.high) || !whole) {
-      throw std::runtime_error(name + " is '" + value + "', should be a " +
-                               (entry.whole != nullptr ? "whole " : "") + "number from " +
-                               Number(entry.low) + " to " + Number(entry.high));
+      std::string line = name;
+      line += " is '" + value + "', should be a ";
+      line += entry.whole != nullptr ? "whole number from " : "number from ";
+      line += Number(entry.low) + " to " + Number(entry.high);
+      throw std::runtime_error(line);
     }
     if (entry.whole != nullptr) {
       recipe->*entry.whole = static_cast<int>(number);
@@ -98,7 +100,7 @@ Recipe ReadRecipe(const std::string& path) {
     if (!(words >> name)) continue;
     const std::string place = path + ": line " + std::to_string(number) + ": ";
     if (!(words >> value) || words >> more) {
-      throw std::runtime_error(place + "should be a name and a value: '" + line + "'");
+      throw std::runtime_error(place + "should be a name and a value");
     }
     try {
       SetInRecipe(name, value, &recipe);

@@ -71,6 +71,12 @@ tools::ExitCode Run::Execute() {
 }
 
 void Run::Load() {
+  // Now, not after an hour.
+  const std::filesystem::path folder = std::filesystem::path(options_.output).parent_path();
+  if (!folder.empty() && !std::filesystem::is_directory(folder)) {
+    throw std::runtime_error(options_.output + ": can't be written: there is no folder " +
+                             folder.string());
+  }
   if (!options_.recipe_file.empty()) recipe_ = ReadRecipe(options_.recipe_file);
   labels_ = model::ReadLabels(options_.labels_file);
   ClipList list = LoadClips(dataset::ReadManifest(options_.manifest), labels_);

@@ -16,8 +16,6 @@ namespace {
 
 using testing::AllOf;
 using testing::HasSubstr;
-using testing::MatchesRegex;
-using testing::Not;
 using testing::StartsWith;
 
 class EvalCommand : public QzProgram {
@@ -27,7 +25,8 @@ class EvalCommand : public QzProgram {
       for (const std::string name :
            {"dog_bark", "baby_cry", "rooster", "clock_tick", "person_sneeze", "rain"}) {
         const std::string file = std::to_string(fold) + name + ".wav";
-        lines_ += file + '\t' + name + '\t' + std::to_string(fold) + '\n';
+        lines_.append(file).append(1, '\t').append(name).append(1, '\t');
+        lines_.append(std::to_string(fold)).append(1, '\n');
         WriteSound(file, SF_FORMAT_WAV | SF_FORMAT_PCM_16, 16000, 1, Sound(file));
       }
     }

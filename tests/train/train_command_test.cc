@@ -1,0 +1,107 @@
+// qz-train's two commands on files: what they write, what they skip, what they refuse.
+
+#include "train_command.h"
+
+#include <gmock/gmock.h>
+#include <sndfile.h>
+
+#include <cmath>
+#include <filesystem>
+#include <fstream>
+
+#include "check_weights.h"
+#include "model_files.h"
+#include "prove_model_command.h"
+#include "temporary_folder.h"
+
+namespace qz::train {
+namespace {
+
+using testing::AllOf;
+using testing::HasSubstr;
+using testing::ThrowsMessage;
+
+// Seven short sounds, one of them held out, and a list with one more that is not there.
+class Commands : public testing::Test {
+ protected:
+  void SetUp() override {
+    std::ofstream(folder_.Path("recipe")) << "teachers 1\nepochs 1\ntuning_epochs 1\nbatch 4\n";
+    options_.output = folder_.Path("model");
+    options_.recipe_file = folder_.Path("recipe");
+    options_.labels_file = QZ_LABELS;
+    options_.state_file = folder_.Path("state");
+    options_.hold_out = 2;
+    options_.manifest = folder_.Path("list");
+    std::ofstream list(options_.manifest);
+    list << "file\tclass\tfold\n";
+    const char* const classes[] = {"dog_bark",      "baby_cry", "rooster", "clock_tick",
+                                   "person_sneeze", "rain",     "dog_bark"};
+    for (int i = 0; i < 7; ++i) {
+      const std::string name = std::to_string(i) + ".wav";
+      WriteTone(folder_.Path(name), 0.1 * (i + 1));
+      list << name << "\t" << classes[i] << "\t" << (i == 6 ? 2 : 1) << "\n";
+    }
+    list << "absent.wav\train\t1\n";
+  }
+
+  static void WriteTone(const std::string& path, double step) {
+    SF_INFO info = {};
+    info.samplerate = 16000;
+    info.channels = 1;
+    info.format = SF_FORMAT_WAV | SF_FORMAT_PCM_16;
+    SNDFILE* const file = sf_open(path.c_str(), SFM_WRITE, &info);
+    ASSERT_NE(file, nullptr);
+    std::vector<double> tone(20000);
+    for (size_t i = 0; i < tone.size(); ++i)
+      tone[i] = 0.2 * std::sin(step * static_cast<double>(i));
+    sf_write_double(file, tone.data(), static_cast<sf_count_t>(tone.size()));
+    sf_close(file);
+  }
+
+  std::string FitAndListen() {
+    testing::internal::CaptureStdout();
+    testing::internal::CaptureStderr();
+    exit_code_ = TrainCommand(options_);
+    return testing::internal::GetCapturedStderr() + testing::internal::GetCapturedStdout();
+  }
+
+  const test::TemporaryFolder folder_;
+  TrainOptions options_;
+  tools::ExitCode exit_code_ = tools::kFine;
+};
+
+TEST_F(Commands, FitWritesASoundModelAndNamesWhatItSkipped) {
+  EXPECT_THAT(FitAndListen(),
+              AllOf(HasSubstr("skipped: " + folder_.Path("absent.wav") + ": can't be opened"),
+                    HasSubstr("learning from 6 clips, judged by 1, 1 skipped"),
+                    HasSubstr("on 1 clips that were held out"), HasSubstr("loss of quantisation"),
+                    HasSubstr(" of 21 operators: "), HasSubstr(", the same\n")));
+  EXPECT_EQ(exit_code_, tools::kUnreadableInput);
+  const model::PackedModel model = model::ReadModelFile(options_.output);
+  EXPECT_TRUE(model::CheckWeights(model).empty());
+  EXPECT_FALSE(std::filesystem::exists(options_.state_file)) << "nothing is left to go on with";
+
+  testing::internal::CaptureStdout();
+  EXPECT_EQ(ProveModelCommand(options_.output, options_.manifest), tools::kUnreadableInput);
+  EXPECT_THAT(testing::internal::GetCapturedStdout(),
+              AllOf(HasSubstr("on 7 clips: "), HasSubstr(", the same\n")));
+}
+
+TEST_F(Commands, RefuseBeforeTheWorkBegins) {
+  const auto fit = [&] { TrainCommand(options_); };
+  options_.hold_out = 3;
+  EXPECT_THAT(fit, ThrowsMessage<std::runtime_error>(HasSubstr("fold 3 is to be held out, but")));
+  options_.hold_out = 1;
+  EXPECT_THAT(fit, ThrowsMessage<std::runtime_error>(
+                       HasSubstr("no clip to learn the class 'baby_cry' from")));
+  options_.hold_out = 0;
+  options_.output = folder_.Path("absent/model");
+  EXPECT_THAT(fit, ThrowsMessage<std::runtime_error>(HasSubstr("there is no folder ")));
+  EXPECT_FALSE(std::filesystem::exists(folder_.Path("model")));
+  std::ofstream(folder_.Path("model")) << "four";
+  EXPECT_THAT([&] { ProveModelCommand(folder_.Path("model"), options_.manifest); },
+              ThrowsMessage<std::runtime_error>(HasSubstr("has 4 bytes; 86000 would be right")));
+}
+
+}  // namespace
+}  // namespace qz::train
