@@ -51,7 +51,7 @@ build-target:
 run: configure-host $(if $(filter $(DEMO),$(AUDIO)),demo)
 	cmake --build --preset host --parallel $(JOBS) --target qz
 	@$(if $(filter $(DEMO),$(AUDIO)),cat $(DEMO:.wav=.txt))
-	build/host/bin/qz run --scores --log-level info "$(AUDIO)"
+	build/host/bin/qz run --scores "$(AUDIO)"
 
 clip:
 	@scripts/setup-debian.sh clip
