@@ -133,16 +133,16 @@ function(qz_room name)
   target_link_libraries(${name} PUBLIC ${room_LINKS} PRIVATE qz_flags)
 endfunction()
 
-# qz_test(NAME SOURCES... LINKS... [STARTS_PROGRAMS]): one suite, run by CTest as one test that fails when it
+# qz_test(NAME SOURCES... LINKS... [STARTS_PROGRAMS] [NEEDS_AVX2]): one suite, run by CTest as one test that fails when it
 # holds none. On a PC it runs once more, under the label without_avx2, on an emulated processor; not so
-# where it STARTS_PROGRAMS, which would run on this one.
+# where it STARTS_PROGRAMS, which would run on this one, or NEEDS_AVX2.
 function(qz_test name)
-  cmake_parse_arguments(test "STARTS_PROGRAMS" "" "SOURCES;LINKS" ${ARGN})
+  cmake_parse_arguments(test "STARTS_PROGRAMS;NEEDS_AVX2" "" "SOURCES;LINKS" ${ARGN})
   add_executable(${name} ${test_SOURCES})
   target_link_libraries(${name} PRIVATE ${test_LINKS} qz_test_support qz_flags)
   add_test(NAME ${name} COMMAND ${name})
   set_tests_properties(${name} PROPERTIES TIMEOUT 900)
-  if(NOT test_STARTS_PROGRAMS)
+  if(NOT test_STARTS_PROGRAMS AND NOT test_NEEDS_AVX2)
     qz_test_without_avx2(${name}_without_avx2 $<TARGET_FILE:${name}>)
   endif()
 endfunction()

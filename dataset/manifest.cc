@@ -4,6 +4,7 @@
 #include <cstring>
 #include <filesystem>
 #include <fstream>
+#include <map>
 
 namespace qz::dataset {
 namespace {
@@ -34,6 +35,7 @@ Recording ParseLine(const std::string& line, const std::filesystem::path& folder
     throw ManifestError(place + std::to_string(fields.size()) +
                         " fields, should be 3 between tabs: file, class, fold");
   }
+  if (fields[0] == "-") throw ManifestError(place + "the file is -, should be a file's name");
   if (fields[0].empty()) throw ManifestError(place + "no file name before the first tab");
   if (fields[1].empty()) throw ManifestError(place + "no class between the tabs");
   const int fold = FoldOf(fields[2]);
@@ -51,6 +53,7 @@ std::vector<Recording> ReadManifest(const std::string& path) {
   if (!file) throw ManifestError(path + ": can't be opened: " + std::strerror(errno));
   const std::filesystem::path folder = std::filesystem::path(path).parent_path();
   std::vector<Recording> recordings;
+  std::map<std::string, int> lines;  // by file
   bool headed = false;
   std::string line;
   for (int number = 1; std::getline(file, line); ++number) {
@@ -59,6 +62,12 @@ std::vector<Recording> ReadManifest(const std::string& path) {
     const std::string place = path + ": line " + std::to_string(number) + ": ";
     if (headed) {
       recordings.push_back(ParseLine(line, folder, place));
+      // In two folds it would be learnt from and measured.
+      const auto [before, is_new] = lines.emplace(recordings.back().file, number);
+      if (!is_new) {
+        throw ManifestError(place + recordings.back().file + " stands in line " +
+                            std::to_string(before->second) + " already");
+      }
     } else if (line != kHeader) {
       throw ManifestError(place + "the first line should be: file, class, fold, with tabs between");
     }

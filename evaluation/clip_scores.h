@@ -24,7 +24,8 @@ struct ClipScores {
 };
 
 // The samples of whole 2 s buffers that a clip fills together with the silence behind it: enough
-// for two network runs or more that see its last sample.
+// that two network runs or more end at or behind its last sample. Of a clip of 3.8 s and more each
+// part but the first 0.64 s is then seen by two runs at least.
 size_t SamplesToPlay(size_t clip_samples);
 
 // The features of so many samples, frames x 48: of the clip and the silence behind it.

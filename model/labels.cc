@@ -51,14 +51,25 @@ Labels ReadLabels(const std::string& path) {
   Labels labels;
   int lines = 0;
   for (std::string line; std::getline(file, line); ++lines) {
+    if (!line.empty() && line.back() == '\r') line.pop_back();
     const std::string place = path + ": line " + std::to_string(lines + 1) + ": ";
     if (lines == 0 && line != kHeader) {
       throw std::runtime_error(place +
                                "should be: output, category, class, name, with tabs between");
     }
     if (lines > kClasses) throw std::runtime_error(place + "should not be: there are 5 outputs");
-    if (lines > 0) labels[static_cast<size_t>(lines - 1)] = ParseLine(line, lines - 1, place);
+    if (lines == 0) continue;
+    const Label label = ParseLine(line, lines - 1, place);
+    for (int i = 0; i < lines - 1; ++i) {
+      const Label& before = labels[static_cast<size_t>(i)];
+      if (before.class_name == label.class_name || before.category == label.category) {
+        throw std::runtime_error(place + "class or category stands in the line of output " +
+                                 std::to_string(i) + " already");
+      }
+    }
+    labels[static_cast<size_t>(lines - 1)] = label;
   }
+  if (file.bad()) throw std::runtime_error(path + ": can't be read: " + std::strerror(errno));
   if (lines <= kClasses) {
     throw std::runtime_error(path + ": " + std::to_string(lines) +
                              " lines, should be 6: a header and the outputs 0 to 4");

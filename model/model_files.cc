@@ -3,6 +3,7 @@
 #include <cerrno>
 #include <cstdio>
 #include <cstring>
+#include <filesystem>
 #include <memory>
 #include <stdexcept>
 
@@ -47,17 +48,29 @@ PackedModel ReadSoundModel(const std::string& path) {
   throw std::runtime_error(line);
 }
 
-void WriteWholeFile(const std::string& path, const std::string& bytes) {
+void CheckWritable(const std::string& path) {
+  const std::filesystem::file_status status = std::filesystem::status(path);
+  if (std::filesystem::exists(status) && !std::filesystem::is_regular_file(status)) {
+    throw std::runtime_error(path + ": can't be written: it is no regular file");
+  }
   const std::string temporary = path + ".part";
   File file(std::fopen(temporary.c_str(), "wb"));
-  if (!file) Fail(path, "cannot write", errno);
+  if (!file) Fail(path, "can't be written", errno);
+  std::remove(temporary.c_str());
+}
+
+void WriteWholeFile(const std::string& path, const std::string& bytes) {
+  CheckWritable(path);
+  const std::string temporary = path + ".part";
+  File file(std::fopen(temporary.c_str(), "wb"));
+  if (!file) Fail(path, "can't be written", errno);
   const bool written = std::fwrite(bytes.data(), 1, bytes.size(), file.get()) == bytes.size();
   // Closing writes out what is still buffered, so it can fail as a write does.
   const bool closed = std::fclose(file.release()) == 0;
   if (!written || !closed || std::rename(temporary.c_str(), path.c_str()) != 0) {
     const int error = errno;
     std::remove(temporary.c_str());
-    Fail(path, "cannot write", error);
+    Fail(path, "can't be written", error);
   }
 }
 

@@ -20,6 +20,9 @@ inline PackedModel ReadModelFile(const std::string& path) { return ReadWholeFile
 // first finding and how many more there are.
 PackedModel ReadSoundModel(const std::string& path);
 
+// Throws as WriteWholeFile would, before there is anything to write.
+void CheckWritable(const std::string& path);
+
 // Writes all of `bytes` or nothing: into a temporary file beside `path` that then takes its name.
 // Throws std::runtime_error naming the file and the cause.
 void WriteWholeFile(const std::string& path, const std::string& bytes);

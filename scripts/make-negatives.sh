@@ -1,27 +1,24 @@
 #!/usr/bin/env bash
 # Makes sounds that none of the classes answers to, out of what Debian packages offer: synthetic speech
-# in several voices (espeak-ng) and the sounds of a desktop (sound-theme-freedesktop, alsa-utils), as
-# 16-bit mono WAV of 44.1 kHz. The same files each time.
+# in several voices (espeak-ng) and the sounds of a desktop (sound-theme-freedesktop), as 16-bit mono WAV of
+# 44.1 kHz. The same files each time. Left out is what scripts/make-demo-clip.sh plays.
 # Usage: scripts/make-negatives.sh FOLDER
 set -euo pipefail
 
 [ $# -eq 1 ] || { echo "usage: make-negatives.sh FOLDER" >&2; exit 2; }
 folder=$1
 effects=/usr/share/sounds/freedesktop/stereo
-spoken=/usr/share/sounds/alsa
 voices=(en-us en-gb+f3 de fr+f2 es it+f4 pt ru+m3 pl+f1 sv nl+m5 tr+f5)
-sentences=(
-  "The quick brown fox jumps over the lazy dog, and then it goes home to have some tea."
-  "Please leave your name, your number and a short message after the tone. Thank you for calling."
-  "Nine, eight, seven, six, five, four, three, two, one. And here is the news of the day."
-)
+sentence="The quick brown fox jumps over the lazy dog, and then it goes home to have some tea."
 
 for needed in espeak-ng sox; do
   command -v "$needed" >/dev/null || { echo "make-negatives.sh: $needed is missing" >&2; exit 1; }
 done
-for needed in "$effects" "$spoken"; do
-  [ -d "$needed" ] || { echo "make-negatives.sh: $needed is missing" >&2; exit 1; }
-done
+[ -d "$effects" ] || { echo "make-negatives.sh: $effects is missing" >&2; exit 1; }
+if [ -e "$folder" ] && [ ! -e "$folder/speech-de.wav" ]; then
+  echo "make-negatives.sh: $folder exists and is not of this script's making" >&2
+  exit 1
+fi
 
 mkdir -p "$(dirname "$folder")"
 part=$(mktemp -d "$folder.part-XXXXXX")
@@ -32,15 +29,13 @@ mkdir "$part/sounds"
 convert() { sox -D "$1" -b 16 "$part/sounds/$2.wav" gain -6 rate 44100 channels 1 gain -n -3; }
 
 for i in "${!voices[@]}"; do
-  for j in "${!sentences[@]}"; do
-    espeak-ng -v "${voices[$i]}" -s $((130 + 15 * j)) -p $((30 + 5 * i)) -w "$part/speech.wav" \
-      "${sentences[$j]}"
-    convert "$part/speech.wav" "speech-${voices[$i]}-$j"
-  done
+  espeak-ng -v "${voices[$i]}" -s $((130 + 4 * i)) -p $((30 + 5 * i)) -w "$part/speech.wav" "$sentence"
+  convert "$part/speech.wav" "speech-${voices[$i]}"
 done
-for file in "$effects"/*.oga "$spoken"/*.wav; do
-  name=$(basename "$file")
-  convert "$file" "desktop-${name%.*}"
+for file in "$effects"/*.oga; do
+  name=$(basename "$file" .oga)
+  case "$name" in audio-channel-* | alarm-clock-elapsed | phone-incoming-call) continue ;; esac
+  convert "$file" "desktop-$name"
 done
 rm -rf "$folder"
 mv "$part/sounds" "$folder"

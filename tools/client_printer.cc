@@ -19,6 +19,7 @@ void ClientPrinter::OnHostMessage(uint16_t endpoint, uint32_t type, const uint8_
   switch (type) {
     case hub::kQueryResponse:
       if (const auto categories = hub::DecodeQueryResponse(bytes, size)) {
+        categories_ = *categories;
         console_.Data(format_.Categories(endpoint, *categories));
       } else {
         decoded = false;

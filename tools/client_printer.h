@@ -23,6 +23,9 @@ class ClientPrinter final : public hub::ClientListener {
   // The newest report since the last call, if any.
   std::optional<hub::SoundReport> TakeReport();
 
+  // As the nanoapp told them last, by output; empty if nobody asked.
+  const std::vector<uint32_t>& categories() const { return categories_; }
+
   uint64_t reports() const { return reports_; }
   uint64_t detections() const { return detections_; }
   // One sentence for each message or event that could not be decoded.
@@ -35,6 +38,7 @@ class ClientPrinter final : public hub::ClientListener {
   uint64_t detections_ = 0;
   std::vector<std::string> faults_;
   std::optional<hub::SoundReport> newest_report_;
+  std::vector<uint32_t> categories_;
 };
 
 }  // namespace qz::tools

@@ -9,6 +9,7 @@
 #include "clip_scores.h"
 #include "console.h"
 #include "figures.h"
+#include "interrupt.h"
 #include "labels.h"
 #include "manifest.h"
 #include "model_files.h"
@@ -99,6 +100,7 @@ void Eval::ScoreAll() {
   for (Job& job : jobs_) {
     std::vector<ScoredClip> scored;
     for (ScoredClip& clip : job.clips) {
+      if (Interrupted()) return;
       if (Score(job.model, &clip)) scored.push_back(clip);
       console_.ClipProgress(++done, all);
     }
@@ -147,9 +149,14 @@ void Eval::Print() {
 }
 
 ExitCode Eval::Execute() {
+  CatchInterrupt();
   try {
     Prepare();
     ScoreAll();
+    if (Interrupted()) {
+      console_.Message("qz: interrupted; figures of some clips would mislead");
+      return kNotRunnable;
+    }
   } catch (const std::runtime_error& error) {
     console_.Message(std::string("qz: ") + error.what());
     return kUnreadableInput;

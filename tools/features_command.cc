@@ -109,6 +109,8 @@ void Features::Write(const Job& job) {
 }
 
 ExitCode Features::WriteAll() {
+  // No list of an earlier run beside arrays of this one.
+  if (!options_.manifest.empty()) fs::remove(folder_ / kList);
   size_t done = 0;
   for (const Job& job : jobs_) {
     Write(job);
@@ -126,9 +128,11 @@ ExitCode Features::WriteAll() {
 }
 
 ExitCode Features::Conclude() {
-  console_.Message("wrote features of " + std::to_string(frames_) + " frames in " +
-                   std::to_string(written_) + (written_ == 1 ? " array" : " arrays") + " to " +
-                   options_.output);
+  if (written_ > 0) {
+    console_.Message("wrote features of " + std::to_string(frames_) + " frames in " +
+                     std::to_string(written_) + (written_ == 1 ? " array" : " arrays") + " to " +
+                     options_.output);
+  }
   if (written_ == jobs_.size()) return kFine;
   console_.Message("qz: skipped " + std::to_string(jobs_.size() - written_) + " of " +
                    std::to_string(jobs_.size()) + " clips");

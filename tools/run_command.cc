@@ -57,6 +57,7 @@ class Run {
   void Play(const int16_t* buffer);
   void ReportShortAudio();
   RunSummary Summarise() const;
+  std::string WrongLabels() const;
   ExitCode Conclude();
 
   const RunOptions& options_;
@@ -106,8 +107,10 @@ ExitCode Run::Execute() {
   if (!StartModule(&exit_code)) return exit_code;
   console_.Message(input->Description());
   if (view_) {
-    console_.Message("tool's view: what qz itself hears beside the module, by " +
-                     options_.model_path + "; no messages of the module");
+    console_.Message(
+        "tool's view: what qz itself hears beside the module, by " + options_.model_path +
+        "; no messages of the module" +
+        (options_.client_nanoapps > 0 ? "" : ", and for want of reports not compared"));
   }
   clients_.Connect(options_.host_clients, options_.client_nanoapps);
   const bool audio_taken = hub_.audio_enabled();
@@ -193,8 +196,22 @@ RunSummary Run::Summarise() const {
   return summary;
 }
 
+// The labels' codes must be those that the module tells, output by output.
+std::string Run::WrongLabels() const {
+  const std::vector<uint32_t>& told = printer_.categories();
+  for (size_t i = 0; names_ && i < told.size() && i < names_->size(); ++i) {
+    const auto category = static_cast<uint32_t>((*names_)[i].category);
+    if (category == told[i]) continue;
+    return options_.labels_path + ": gives output " + std::to_string(i) + " the category " +
+           std::to_string(category) + ", the module " + std::to_string(told[i]);
+  }
+  return "";
+}
+
 ExitCode Run::Conclude() {
   std::vector<std::string> faults = printer_.faults();
+  const std::string wrong_labels = WrongLabels();
+  if (!wrong_labels.empty()) faults.push_back(wrong_labels);
   for (const std::string& fault : hub_.Faults()) faults.push_back(fault);
   if (view_) faults.insert(faults.end(), view_->faults().begin(), view_->faults().end());
 

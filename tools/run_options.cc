@@ -74,7 +74,8 @@ void AddRun(CLI::App* app, ExitCode* exit_code) {
                 "module, no messages of the module");
   run->add_option("--thresholds", options.thresholds_path,
                   "Say what a table of thresholds and cooling times would detect: the tool's own "
-                  "view too, no events of the module");
+                  "view too, no events of the module. Text with tabs between: a line class, "
+                  "threshold, cooling_s, then one for each class of the labels");
   run->add_option("--model", options.model_path,
                   "The model of the tool's view, which must be the module's (default: beside the "
                   "module, ../lib/qz.model)");

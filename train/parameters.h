@@ -10,7 +10,8 @@
 
 namespace qz::train {
 
-using Values = std::vector<float>;
+// Aligned, since the order in which sums are taken follows from where a row begins.
+using Values = std::vector<float, Eigen::aligned_allocator<float>>;
 
 // Where a layer's numbers begin. `bias` holds the normalisation's beta where there is one, and
 // nothing in depthwise layers, which have no bias.

@@ -14,14 +14,16 @@ namespace {
 constexpr size_t kLogistic = 19;
 constexpr size_t kConversion = 20;
 
-// A clip's windows, as sequences of their own.
-Batch WindowsOf(const Batch& features) {
+// As many windows at a time as are quick and small.
+constexpr int kMostWindows = 16;
+
+// Some of a clip's windows, as sequences of their own.
+Batch WindowsOf(const Batch& features, int first, int count) {
   Batch windows;
-  const auto count = static_cast<int>((features.steps() - FramesFor(1)) / 64 + 1);
   windows.Resize(count, FramesFor(1), features.channels());
   for (int w = 0; w < count; ++w) {
     windows.values.middleRows(w * FramesFor(1), FramesFor(1)) =
-        features.values.middleRows(w * 64, FramesFor(1));
+        features.values.middleRows((first + w) * 64, FramesFor(1));
   }
   return windows;
 }
@@ -34,7 +36,16 @@ class Prover {
   }
 
   void Compare(const Batch& features) {
-    const Batch windows = WindowsOf(features);
+    const auto count = static_cast<int>((features.steps() - FramesFor(1)) / 64 + 1);
+    for (int first = 0; first < count; first += kMostWindows) {
+      CompareWindows(WindowsOf(features, first, std::min(kMostWindows, count - first)));
+    }
+  }
+
+  const Proof& proof() const { return proof_; }
+
+ private:
+  void CompareWindows(const Batch& windows) {
     network_.Forward(parameters_, windows, nullptr);
     for (int w = 0; w < windows.sequences; ++w) {
       const auto input = windows.values.middleRows(w * FramesFor(1), FramesFor(1));
@@ -45,9 +56,6 @@ class Prover {
     }
   }
 
-  const Proof& proof() const { return proof_; }
-
- private:
   void CompareOperator(size_t op, int window) {
     kOperators[op].run();
     const Tensor& tensor = kOperators[op].output;

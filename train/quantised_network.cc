@@ -2,6 +2,8 @@
 
 #include <algorithm>
 #include <cmath>
+#include <stdexcept>
+#include <string>
 
 namespace qz::train {
 namespace {
@@ -105,6 +107,13 @@ QuantisedParameters ParametersOf(const model::ModelArrays& arrays) {
     std::copy(layer.weight.begin(), layer.weight.end(), WeightOf(parameters.integers, i).data());
     parameters.weight_step[i].setOnes();
     if (kPlan[i].depthwise()) continue;
+    for (const int32_t bias : layer.bias) {
+      if (std::abs(static_cast<float>(bias)) > kLargestBias) {
+        throw std::runtime_error(std::string(kPlan[i].layout().name) + ": a bias is " +
+                                 std::to_string(bias) +
+                                 ", beyond the 8,000,000 up to which the trainer's sums are exact");
+      }
+    }
     std::copy(layer.bias.begin(), layer.bias.end(),
               RowAt(parameters.integers, i, kParameters.layers[i].bias).data());
     std::copy(layer.scale.begin(), layer.scale.end(), parameters.scale[i].data());

@@ -24,7 +24,8 @@ struct QuantisedParameters {
 
 // For model::Pack.
 model::ModelArrays ArraysOf(const QuantisedParameters& parameters);
-// The inverse, but for the steps, which no device knows: they stay at 1.
+// The inverse, but for the steps, which no device knows: they stay at 1. Throws std::runtime_error
+// where a bias lies beyond what keeps sums exact; what the trainer makes never does.
 QuantisedParameters ParametersOf(const model::ModelArrays& arrays);
 
 class QuantisedNetwork {

@@ -64,6 +64,17 @@ std::string Number(double value) {
   return text;
 }
 
+// What no single value tells.
+void CheckRanges(const Recipe& recipe, const std::string& path) {
+  if (recipe.batch % 2 != 0) {
+    throw std::runtime_error(path + ": batch is " + std::to_string(recipe.batch) +
+                             ", should be even: two threads share it");
+  }
+  if (recipe.lowest_gain > recipe.highest_gain || recipe.lowest_snr > recipe.highest_snr) {
+    throw std::runtime_error(path + ": a lowest gain or SNR is above the highest");
+  }
+}
+
 }  // namespace
 
 void SetInRecipe(const std::string& name, const std::string& value, Recipe* recipe) {
@@ -108,6 +119,8 @@ Recipe ReadRecipe(const std::string& path) {
       throw std::runtime_error(place + error.what());
     }
   }
+  if (file.bad()) throw std::runtime_error(path + ": can't be read: " + std::strerror(errno));
+  CheckRanges(recipe, path);
   return recipe;
 }
 

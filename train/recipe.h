@@ -7,9 +7,9 @@ namespace qz::train {
 
 struct Recipe {
   // The run: sequences are augmented clips; an epoch draws each recording once as the first.
-  int teachers = 3;         // networks over float, each from its own beginning
+  int teachers = 2;         // networks over float, each from its own beginning
   int epochs = 300;         // of each of them
-  int tuning_epochs = 300;  // of the model behind them, in the device's arithmetic
+  int tuning_epochs = 200;  // of the model behind them, in the device's arithmetic
   int batch = 32;           // sequences a step
   int windows = 4;          // network windows a sequence: 382 + 64 x (windows - 1) frames
   double rate = 0.003;      // of learning, at its highest; it falls to 0 along a cosine

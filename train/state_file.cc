@@ -10,7 +10,8 @@
 namespace qz::train {
 namespace {
 
-// The layout's name and version; numbers are as in memory, little-endian.
+// To be raised with every change of the layout, or of what an epoch does. Numbers are as in memory,
+// little-endian; behind them stands their digest.
 constexpr char kMagic[] = "qz training state 1\n";
 
 // Of a hundred teachers and more.
@@ -60,16 +61,19 @@ std::string Fingerprint(const Recipe& recipe, uint64_t seed, const std::vector<C
 void WriteState(const std::string& path, const std::string& fingerprint,
                 const TrainingState& state) {
   std::string bytes = fingerprint;
+  uint64_t digest = model::kDigestOfNothing;
   ForEachField(state, [&](const void* field, size_t size) {
     bytes.append(static_cast<const char*>(field), size);
+    digest = model::Digest(field, size, digest);
   });
+  bytes.append(reinterpret_cast<const char*>(&digest), sizeof(digest));
   model::WriteWholeFile(path, bytes);
 }
 
 std::optional<TrainingState> ReadState(const std::string& path, const std::string& fingerprint) {
   if (!std::filesystem::exists(path)) return std::nullopt;
   const std::vector<uint8_t> bytes = model::ReadWholeFile(path, kMostBytes);
-  if (bytes.size() < fingerprint.size() ||
+  if (bytes.size() < fingerprint.size() + sizeof(uint64_t) ||
       std::memcmp(bytes.data(), fingerprint.data(), fingerprint.size()) != 0) {
     throw std::runtime_error(path +
                              ": is of another run (recipe, seed or clips differ); remove it "
@@ -78,7 +82,7 @@ std::optional<TrainingState> ReadState(const std::string& path, const std::strin
   // As many teachers as the size tells.
   TrainingState state;
   const size_t fields = SizeOf(state), teacher = kParameters.all * sizeof(float);
-  const size_t held = bytes.size() - fingerprint.size();
+  const size_t held = bytes.size() - fingerprint.size() - sizeof(uint64_t);
   if (held < fields || (held - fields) % teacher != 0) {
     throw std::runtime_error(path + ": has " + std::to_string(bytes.size()) +
                              " bytes, which is not whole; remove it to begin anew");
@@ -89,6 +93,10 @@ std::optional<TrainingState> ReadState(const std::string& path, const std::strin
     std::memcpy(field, bytes.data() + next, size);
     next += size;
   });
+  if (model::Digest(bytes.data() + fingerprint.size(), held) !=
+      model::Load<uint64_t>(bytes, next)) {
+    throw std::runtime_error(path + ": is damaged; remove it to begin anew");
+  }
   return state;
 }
 

@@ -19,6 +19,26 @@ namespace {
 constexpr int kEpochsAJudgement = 5;
 constexpr auto kBetweenStates = std::chrono::seconds(30);
 
+void PrintFigures(const TrainingState& state, const QuantisedParameters& quantised,
+                  const std::vector<Clip>& clips, const std::vector<Batch>& features) {
+  const auto line = [&](const char* what, const std::vector<Scores>& scores) {
+    const Figures figures = FiguresOf(scores, clips);
+    std::printf("%-28s mean AP %.4f, ROC AUC %.4f\n", what, figures.average_precision,
+                figures.roc_auc);
+    return figures.average_precision;
+  };
+  std::vector<std::vector<Scores>> taught;
+  for (const Values& teacher : state.teachers) taught.push_back(ScoresOf(teacher, features));
+  const double first = line("float, first teacher", taught[0]);
+  const double together = line("float, all teachers together", MeanLogits(taught));
+  line("first teacher as int8", ScoresOf(QuantisedParameters(state.teachers[0]), features));
+  const double model = line("int8, tuned: the model", ScoresOf(quantised, features));
+  std::printf(
+      "loss of quantisation         %.4f mean AP from the first teacher to the model, %.4f from "
+      "all teachers together\n",
+      first - model, together - model);
+}
+
 // One run from its options to its exit code.
 class Run {
  public:
@@ -26,6 +46,7 @@ class Run {
   tools::ExitCode Execute();
 
  private:
+  void CheckPlaces() const;
   void Load();
   void CheckClasses() const;
   void Train(Trainer* trainer, TrainingState* state);
@@ -50,10 +71,14 @@ tools::ExitCode Run::Execute() {
   Load();
   CheckClasses();
   Trainer trainer(recipe_, options_.seed, options_.threads, learnt_);
-  fingerprint_ = Fingerprint(recipe_, options_.seed, learnt_, judged_clips_);
+  fingerprint_ = Fingerprint(recipe_, options_.seed, learnt_, judged_clips_) + "patience " +
+                 std::to_string(options_.patience) + "\n";
   TrainingState state;
   if (!options_.state_file.empty()) {
     if (auto stopped = ReadState(options_.state_file, fingerprint_)) {
+      if (!trainer.Accepts(*stopped)) {
+        throw std::runtime_error(options_.state_file + ": is no state of this run; remove it");
+      }
       state = std::move(*stopped);
       std::fprintf(stderr, "%s: going on after epoch %d\n", options_.state_file.c_str(),
                    state.epoch);
@@ -64,19 +89,23 @@ tools::ExitCode Run::Execute() {
     std::fprintf(stderr, "qz-train: stopped after epoch %d; %s\n", state.epoch,
                  options_.state_file.empty() ? "nothing is kept without --state"
                                              : "the same command goes on");
-    return tools::kFaultFound;
+    return tools::kNotRunnable;
   }
   if (!Finish(state)) return tools::kFaultFound;
   return skipped_ == 0 ? tools::kFine : tools::kUnreadableInput;
 }
 
-void Run::Load() {
-  // Now, not after an hour.
-  const std::filesystem::path folder = std::filesystem::path(options_.output).parent_path();
-  if (!folder.empty() && !std::filesystem::is_directory(folder)) {
-    throw std::runtime_error(options_.output + ": can't be written: there is no folder " +
-                             folder.string());
+// Now, not after an hour.
+void Run::CheckPlaces() const {
+  if (options_.output == options_.state_file) {
+    throw std::runtime_error(options_.output + ": can't be the model and the state at once");
   }
+  model::CheckWritable(options_.output);
+  if (!options_.state_file.empty()) model::CheckWritable(options_.state_file);
+}
+
+void Run::Load() {
+  CheckPlaces();
   if (!options_.recipe_file.empty()) recipe_ = ReadRecipe(options_.recipe_file);
   labels_ = model::ReadLabels(options_.labels_file);
   ClipList list = LoadClips(dataset::ReadManifest(options_.manifest), labels_);
@@ -93,18 +122,20 @@ void Run::Load() {
                judged_clips_.size(), skipped_);
 }
 
+// Of each class there are some to learn from, and some to judge by.
 void Run::CheckClasses() const {
-  if (options_.hold_out != 0 && judged_clips_.empty()) {
-    throw std::runtime_error(options_.manifest + ": fold " + std::to_string(options_.hold_out) +
-                             " is to be held out, but no readable clip is in it");
-  }
-  for (int output = 0; output < model::kClasses; ++output) {
-    bool found = false;
-    for (const Clip& clip : learnt_) found |= clip.output == output;
-    if (found) continue;
-    throw std::runtime_error(options_.manifest + ": no clip to learn the class '" +
-                             labels_[static_cast<size_t>(output)].class_name + "' from");
-  }
+  const auto check = [&](const std::vector<Clip>& clips, const std::string& purpose) {
+    for (int output = 0; output < model::kClasses; ++output) {
+      bool found = false;
+      for (const Clip& clip : clips) found |= clip.output == output;
+      if (found) continue;
+      throw std::runtime_error(options_.manifest + ": no clip of the class '" +
+                               labels_[static_cast<size_t>(output)].class_name + "' " + purpose);
+    }
+  };
+  check(learnt_, "to learn from");
+  if (options_.hold_out == 0) return;
+  check(judged_clips_, "to judge by in fold " + std::to_string(options_.hold_out));
 }
 
 void Run::Train(Trainer* trainer, TrainingState* state) {
@@ -149,38 +180,25 @@ void Run::KeepState(const TrainingState& state, bool now) {
   last_state_ = std::chrono::steady_clock::now();
 }
 
-// Writes the model, says what the rounding cost and proves the model, on clips that were held out;
-// else, for want of others, on those that were learnt. False if the proof fails.
+// Says what the rounding cost, proves the model and writes it. On clips that were held out; else,
+// for want of others, on those that were learnt. False if the proof fails: nothing is written.
 bool Run::Finish(const TrainingState& state) const {
   const QuantisedParameters quantised(state.average);
   const model::PackedModel packed = model::Pack(ArraysOf(quantised));
-  model::WriteWholeFile(options_.output, std::string(packed.begin(), packed.end()));
-  if (!options_.state_file.empty()) std::filesystem::remove(options_.state_file);
-
   const std::vector<Clip>& clips = judged_clips_.empty() ? learnt_ : judged_clips_;
   std::vector<Batch> features = judged_;
   if (features.empty()) {
     for (const Clip& clip : clips) features.push_back(JudgedFeatures(clip.samples));
   }
-  const auto line = [&](const char* what, const std::vector<Scores>& scores) {
-    const Figures figures = FiguresOf(scores, clips);
-    std::printf("%-28s mean AP %.4f, ROC AUC %.4f\n", what, figures.average_precision,
-                figures.roc_auc);
-    return figures.average_precision;
-  };
   std::printf("%s: on %zu clips that were %s:\n", options_.output.c_str(), clips.size(),
               judged_clips_.empty() ? "learnt from" : "held out");
-  std::vector<std::vector<Scores>> taught;
-  for (const Values& teacher : state.teachers) taught.push_back(ScoresOf(teacher, features));
-  const double of_float = line("float, first teacher", taught[0]);
-  line("float, all teachers together", MeanLogits(taught));
-  line("first teacher as int8", ScoresOf(QuantisedParameters(state.teachers[0]), features));
-  const double of_device = line("int8, tuned: the model", ScoresOf(quantised, features));
-  std::printf("%-28s %.4f mean AP, from the first teacher to the model\n", "loss of quantisation",
-              of_float - of_device);
+  PrintFigures(state, quantised, clips, features);
   const Proof proof = Prove(quantised, packed, features);
   std::printf("%s\n", Sentence(proof).c_str());
-  return proof.difference.empty();
+  if (!proof.difference.empty()) return false;
+  model::WriteWholeFile(options_.output, std::string(packed.begin(), packed.end()));
+  if (!options_.state_file.empty()) std::filesystem::remove(options_.state_file);
+  return true;
 }
 
 }  // namespace

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <optional>
 #include <thread>
 
 namespace qz::train {
@@ -57,6 +58,13 @@ int Trainer::EpochsLeft(const TrainingState& state) const {
   return teachers * recipe_.epochs - state.phase_epoch + recipe_.tuning_epochs;
 }
 
+bool Trainer::Accepts(const TrainingState& state) const {
+  const int epochs = Tuning(state) ? recipe_.tuning_epochs : recipe_.epochs;
+  return state.teachers.size() <= static_cast<size_t>(recipe_.teachers) && state.phase_epoch >= 0 &&
+         state.phase_epoch <= epochs && state.epoch >= state.phase_epoch &&
+         state.epoch <= 200 * 100000;
+}
+
 void Trainer::BeginPhase(TrainingState* state) const {
   state->values =
       Tuning(*state) ? state->teachers[0] : InitialParameters(Mixed(seed_, state->teachers.size()));
@@ -91,7 +99,9 @@ double Trainer::RunEpoch(TrainingState* state) {
   }
   ++state->epoch;
   ++state->phase_epoch;
-  if (!Tuning(*state) && state->phase_epoch == recipe_.epochs) EndTeacher(state->average, state);
+  if (!Tuning(*state) && state->phase_epoch == recipe_.epochs) {
+    EndTeacher(state->best_figure >= 0 ? state->best : state->average, state);
+  }
   return loss / static_cast<double>(steps);
 }
 
@@ -143,9 +153,10 @@ void Trainer::RunShard(const TrainingState& state, const QuantisedParameters* qu
 double Trainer::RunStep(TrainingState* state, const std::vector<size_t>& order, size_t first,
                         uint64_t step) {
   const bool tuning = Tuning(*state);
-  const QuantisedParameters quantised(state->values);
+  std::optional<QuantisedParameters> quantised;
+  if (tuning) quantised.emplace(state->values);
   const auto run = [&](size_t index) {
-    RunShard(*state, tuning ? &quantised : nullptr, order, first, step, index);
+    RunShard(*state, tuning ? &*quantised : nullptr, order, first, step, index);
   };
   std::vector<std::thread> threads;
   for (size_t i = 1; i < kShards; ++i) {
@@ -166,8 +177,8 @@ double Trainer::RunStep(TrainingState* state, const std::vector<size_t>& order, 
   for (const Shard& shard : shards_) {
     if (!tuning) shard.float_network.MoveRunning(kRunningRate, &state->values);
   }
-  const auto memory =
-      static_cast<float>(std::min(recipe_.average, 1 - 1 / (10 + static_cast<double>(step))));
+  const auto memory = static_cast<float>(
+      std::min(recipe_.average, 1 - 1 / (9 + static_cast<double>(state->adam.steps))));
   for (size_t i = 0; i < state->values.size(); ++i) {
     state->average[i] = memory * state->average[i] + (1 - memory) * state->values[i];
   }

@@ -42,6 +42,8 @@ class Trainer {
   }
   // As far as is known.
   int EpochsLeft(const TrainingState& state) const;
+  // False for numbers that no run of this recipe comes to.
+  bool Accepts(const TrainingState& state) const;
   // Ends a teacher's phase: `average` becomes a teacher.
   void EndTeacher(const Values& average, TrainingState* state) const;
 

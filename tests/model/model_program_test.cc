@@ -72,7 +72,7 @@ TEST_F(ModelProgram, ExportsAndImportsToTheByte) {
   EXPECT_THAT(err_, HasSubstr("w1, block 0: the scale of column 0 is nan"));
   EXPECT_FALSE(Exists("x"));
   EXPECT_EQ(Run("$QZ model import " + Path("a.npz") + " -o " + Path("none/x")), 1);
-  EXPECT_THAT(err_, HasSubstr(Path("none/x") + ": cannot write"));
+  EXPECT_THAT(err_, HasSubstr(Path("none/x") + ": can't be written"));
 }
 
 TEST_F(ModelProgram, ShowsTablesAndTensors) {

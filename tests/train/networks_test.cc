@@ -66,16 +66,15 @@ double Similarity(const Matrix& a, const Matrix& b) {
 // gradient that is wrong anywhere on the way does not.
 TEST(FloatNetwork, GradientOfEveryLayerIsItsSlope) {
   const Batch features = SyntheticFeatures(2, 100);
-  const TrainingNoise no_noise;
+  const TrainingNoise noise{0.25f, 3};  // what is put out follows from the seed
   Values parameters = SettledParameters(features);
   FloatNetwork network;
-  const Batch dlogits = RandomGradient(network.Forward(parameters, features, &no_noise));
+  const Batch dlogits = RandomGradient(network.Forward(parameters, features, &noise));
   Values gradient(kParameters.learnt);
   network.Backward(parameters, dlogits, &gradient);
   const auto loss_at = [&](const MatrixView& direction, MatrixView values, float step) {
     values += step * direction;
-    const double loss =
-        Dot(network.Forward(parameters, features, &no_noise).values, dlogits.values);
+    const double loss = Dot(network.Forward(parameters, features, &noise).values, dlogits.values);
     values -= step * direction;
     return loss;
   };

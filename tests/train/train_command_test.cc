@@ -21,7 +21,7 @@ using testing::AllOf;
 using testing::HasSubstr;
 using testing::ThrowsMessage;
 
-// Seven short sounds, one of them held out, and a list with one more that is not there.
+// Six short sounds in each of two folds, one of which is held out, and one that is not there.
 class Commands : public testing::Test {
  protected:
   void SetUp() override {
@@ -34,12 +34,12 @@ class Commands : public testing::Test {
     options_.manifest = folder_.Path("list");
     std::ofstream list(options_.manifest);
     list << "file\tclass\tfold\n";
-    const char* const classes[] = {"dog_bark",      "baby_cry", "rooster", "clock_tick",
-                                   "person_sneeze", "rain",     "dog_bark"};
-    for (int i = 0; i < 7; ++i) {
+    const char* const classes[] = {"dog_bark",   "baby_cry",      "rooster",
+                                   "clock_tick", "person_sneeze", "rain"};
+    for (int i = 0; i < 12; ++i) {
       const std::string name = std::to_string(i) + ".wav";
       WriteTone(folder_.Path(name), 0.1 * (i + 1));
-      list << name << "\t" << classes[i] << "\t" << (i == 6 ? 2 : 1) << "\n";
+      list << name << "\t" << classes[i % 6] << "\t" << 1 + i / 6 << "\n";
     }
     list << "absent.wav\train\t1\n";
   }
@@ -73,30 +73,32 @@ class Commands : public testing::Test {
 TEST_F(Commands, FitWritesASoundModelAndNamesWhatItSkipped) {
   EXPECT_THAT(FitAndListen(),
               AllOf(HasSubstr("skipped: " + folder_.Path("absent.wav") + ": can't be opened"),
-                    HasSubstr("learning from 6 clips, judged by 1, 1 skipped"),
-                    HasSubstr("on 1 clips that were held out"), HasSubstr("loss of quantisation"),
+                    HasSubstr("learning from 6 clips, judged by 6, 1 skipped"),
+                    HasSubstr("on 6 clips that were held out"), HasSubstr("loss of quantisation"),
                     HasSubstr(" of 21 operators: "), HasSubstr(", the same\n")));
   EXPECT_EQ(exit_code_, tools::kUnreadableInput);
   const model::PackedModel model = model::ReadModelFile(options_.output);
   EXPECT_TRUE(model::CheckWeights(model).empty());
-  EXPECT_FALSE(std::filesystem::exists(options_.state_file)) << "nothing is left to go on with";
-
   testing::internal::CaptureStdout();
   EXPECT_EQ(ProveModelCommand(options_.output, options_.manifest), tools::kUnreadableInput);
   EXPECT_THAT(testing::internal::GetCapturedStdout(),
-              AllOf(HasSubstr("on 7 clips: "), HasSubstr(", the same\n")));
+              AllOf(HasSubstr("on 12 clips: "), HasSubstr(", the same\n")));
 }
 
 TEST_F(Commands, RefuseBeforeTheWorkBegins) {
   const auto fit = [&] { TrainCommand(options_); };
   options_.hold_out = 3;
-  EXPECT_THAT(fit, ThrowsMessage<std::runtime_error>(HasSubstr("fold 3 is to be held out, but")));
-  options_.hold_out = 1;
   EXPECT_THAT(fit, ThrowsMessage<std::runtime_error>(
-                       HasSubstr("no clip to learn the class 'baby_cry' from")));
+                       HasSubstr("no clip of the class 'dog_bark' to judge by in fold 3")));
   options_.hold_out = 0;
-  options_.output = folder_.Path("absent/model");
-  EXPECT_THAT(fit, ThrowsMessage<std::runtime_error>(HasSubstr("there is no folder ")));
+  std::ofstream(options_.state_file) << "something";
+  EXPECT_THAT(fit, ThrowsMessage<std::runtime_error>(HasSubstr("state: is of another run")));
+  for (const std::string& place : {folder_.Path("absent/model"), folder_.Path("")}) {
+    options_.output = place;
+    EXPECT_THAT(fit, ThrowsMessage<std::runtime_error>(HasSubstr("be written: "))) << place;
+  }
+  options_.output = options_.state_file;
+  EXPECT_THAT(fit, ThrowsMessage<std::runtime_error>(HasSubstr("the model and the state at once")));
   EXPECT_FALSE(std::filesystem::exists(folder_.Path("model")));
   std::ofstream(folder_.Path("model")) << "four";
   EXPECT_THAT([&] { ProveModelCommand(folder_.Path("model"), options_.manifest); },

@@ -68,8 +68,19 @@ TEST(Trainer, SameSeedSameModelWhateverTheThreadsAndStops) {
     EXPECT_EQ(RunTo(6, &one, *ReadState(file, mark)).average, straight) << stop;
   }
   EXPECT_THROW(ReadState(file, Fingerprint(recipe, 6, clips, {})), std::runtime_error);
+  std::fstream(file, std::ios::in | std::ios::out).seekp(-20000, std::ios::end).put('!');
+  EXPECT_THROW(ReadState(file, mark), std::runtime_error);
   std::filesystem::resize_file(file, std::filesystem::file_size(file) - 1);
   EXPECT_THROW(ReadState(file, mark), std::runtime_error);
+}
+
+// The order of Eigen's sums follows from where a row begins, and with it the last bits.
+TEST(Trainer, NumbersBeginAtTheSamePlaceWhereverTheyLie) {
+  std::vector<std::vector<char>> between;
+  for (size_t i = 1; i < 20; ++i) {
+    between.emplace_back(16 * i);
+    EXPECT_EQ(reinterpret_cast<uintptr_t>(Values(1000 * i).data()) % 32, 0u);
+  }
 }
 
 TEST(Trainer, LearnsTonesAndStillKnowsThemInInt8) {
@@ -142,6 +153,7 @@ TEST(Recipe, IsReadAndRefused) {
     std::ofstream(file) << text;
     return ReadRecipe(file);
   };
+  EXPECT_THROW(ReadRecipe(folder.Path("")), std::runtime_error);
   const Recipe recipe = read("# mine\n\nepochs 7 # few\nrate 0.5\n");
   EXPECT_EQ(recipe.epochs, 7);
   EXPECT_EQ(recipe.rate, 0.5);
@@ -151,6 +163,8 @@ TEST(Recipe, IsReadAndRefused) {
       {"rate 0.1\nepochs 1.5\n", "line 2: epochs is '1.5', should be a whole number from 1 to"},
       {"rate nan\n", "rate is 'nan', should be a number from 0 to 1"},
       {"rate 1x\n", "rate is '1x'"},
+      {"batch 5\n", "batch is 5, should be even"},
+      {"lowest_snr 9\nhighest_snr 8\n", "a lowest gain or SNR is above"},
       {"speed 1\n", "line 1: a recipe knows no 'speed'"}};
   for (const auto& [text, message] : kBad) {
     try {
