@@ -133,9 +133,9 @@ function(qz_room name)
   target_link_libraries(${name} PUBLIC ${room_LINKS} PRIVATE qz_flags)
 endfunction()
 
-# qz_test(NAME SOURCES... LINKS... [STARTS_PROGRAMS] [NEEDS_AVX2]): one suite, run by CTest as one test that fails when it
-# holds none. On a PC it runs once more, under the label without_avx2, on an emulated processor; not so
-# where it STARTS_PROGRAMS, which would run on this one, or NEEDS_AVX2.
+# qz_test(NAME SOURCES... LINKS... [STARTS_PROGRAMS] [NEEDS_AVX2]): one suite, run by CTest as one test that
+# fails when it holds none. On a PC it runs once more, under the label without_avx2, on an emulated processor;
+# not so where it STARTS_PROGRAMS, which would run on this one, or NEEDS_AVX2.
 function(qz_test name)
   cmake_parse_arguments(test "STARTS_PROGRAMS;NEEDS_AVX2" "" "SOURCES;LINKS" ${ARGN})
   add_executable(${name} ${test_SOURCES})

@@ -9,11 +9,11 @@
 namespace qz::model {
 namespace {
 
-using dataset::NpyArray;
+using arrays::NpyArray;
 
 // Room for more than a model's 34 arrays, and for the largest of them in a type of eight bytes, so
 // that what is wrong can be said.
-constexpr dataset::NpzLimits kLimits = {128, 1 << 18};
+constexpr arrays::NpzLimits kLimits = {128, 1 << 18};
 
 std::string ArrayName(const TableLayout& table, const char* array) {
   return std::string(table.name) + "." + array;
@@ -51,8 +51,8 @@ class ArrayTaker {
  private:
   template <typename T>
   void Take(const std::string& name, const std::vector<size_t>& shape, std::vector<T>* values) {
-    constexpr dataset::ElementType kType = dataset::ElementTypeOf<T>();
-    const std::string right = std::string(NameOf(kType)) + " " + dataset::ShapeText(shape);
+    constexpr arrays::ElementType kType = arrays::ElementTypeOf<T>();
+    const std::string right = std::string(NameOf(kType)) + " " + arrays::ShapeText(shape);
     const auto found = found_.find(name);
     if (found == found_.end()) {
       findings_.push_back(name + " is missing; " + right + " would be right.");
@@ -61,9 +61,9 @@ class ArrayTaker {
     const NpyArray& array = found->second;
     if (array.type != kType || array.shape != shape) {
       findings_.push_back(name + " is " + NameOf(array.type) + " " +
-                          dataset::ShapeText(array.shape) + "; " + right + " would be right.");
+                          arrays::ShapeText(array.shape) + "; " + right + " would be right.");
     } else {
-      *values = dataset::ValuesOf<T>(array);
+      *values = arrays::ValuesOf<T>(array);
     }
     found_.erase(found);
   }
@@ -75,7 +75,7 @@ class ArrayTaker {
 }  // namespace
 
 ModelArrays ReadModelArrays(const std::string& path) {
-  return ArrayTaker(dataset::ReadNpz(path, kLimits)).Run();
+  return ArrayTaker(arrays::ReadNpz(path, kLimits)).Run();
 }
 
 void WriteModelArrays(const std::string& path, const ModelArrays& arrays) {
@@ -84,12 +84,12 @@ void WriteModelArrays(const std::string& path, const ModelArrays& arrays) {
     const TableLayout& table = kTables[i];
     const std::vector<size_t> outputs = {static_cast<size_t>(table.outputs)};
     files.emplace_back(ArrayName(table, "weight"),
-                       dataset::MakeArray(WeightShape(table), arrays[i].weight));
-    files.emplace_back(ArrayName(table, "bias"), dataset::MakeArray(outputs, arrays[i].bias));
+                       arrays::MakeArray(WeightShape(table), arrays[i].weight));
+    files.emplace_back(ArrayName(table, "bias"), arrays::MakeArray(outputs, arrays[i].bias));
     if (!table.HasScales()) continue;
-    files.emplace_back(ArrayName(table, "scale"), dataset::MakeArray(outputs, arrays[i].scale));
+    files.emplace_back(ArrayName(table, "scale"), arrays::MakeArray(outputs, arrays[i].scale));
   }
-  dataset::WriteNpz(path, files);
+  arrays::WriteNpz(path, files);
 }
 
 }  // namespace qz::model

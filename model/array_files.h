@@ -12,11 +12,11 @@ namespace qz::model {
 //              [taps][channels]
 //   w6.bias    int32 [outputs], as in LayerArrays
 //   w6.scale   float32 [outputs]; not of w17 and w18
-// Throws dataset::NpyError if the archive can't be read, and PackingError about arrays that are
+// Throws arrays::NpyError if the archive can't be read, and PackingError about arrays that are
 // missing, unknown, or of a wrong type or shape.
 ModelArrays ReadModelArrays(const std::string& path);
 
-// Writes all or nothing, the same bytes for the same arrays. Throws dataset::NpyError. The sizes
+// Writes all or nothing, the same bytes for the same arrays. Throws arrays::NpyError. The sizes
 // are right, as of arrays that come from Unpack.
 void WriteModelArrays(const std::string& path, const ModelArrays& arrays);
 

@@ -5,6 +5,7 @@
 set -euo pipefail
 
 [ $# -eq 1 ] || { echo "usage: cross-validate.sh DATA" >&2; exit 2; }
+data=$(realpath "$1")
 cd "$(dirname "$0")/.."
 folder=build/cross-validation
 folds=(1 2 3 4)
@@ -19,7 +20,7 @@ fit() {
 export -f fit
 export folder
 
-scripts/train-material.sh "$1" $folder
+scripts/train-material.sh "$data" $folder
 printf '%s\n' "${folds[@]}" | xargs -P 2 -I{} bash -c 'fit {}'
 
 models=()
@@ -27,9 +28,9 @@ for fold in "${folds[@]}"; do
   cat $folder/fold-"$fold".txt
   models+=(--fold-model "$fold=$folder/fold-$fold.bin")
 done
-awk '/^loss of quantisation/ { sum += $4; n++ }
-     END { printf "loss of quantisation, mean over %d folds: %.4f mean AP\n\n", n, sum / n }' \
-  $folder/fold-?.txt
+awk '/^loss of quantisation/ { first += $4; all += $14; n++ }
+     END { printf "loss of quantisation, mean over %d folds: %.4f mean AP from the first teacher, %.4f from all " \
+                  "teachers together\n\n", n, first / n, all / n }' $folder/fold-?.txt
 build/host/bin/qz eval $folder/manifest.tsv "${models[@]}"
 printf '\nFor comparison, a random forest on averages of the same features:\n'
 build/host/bin/qz features --manifest $folder/manifest.tsv -o $folder/features

@@ -16,7 +16,7 @@ packages_of() {
       echo sox libsox-fmt-base libsox-fmt-mp3 alsa-utils sound-theme-freedesktop scratch \
         elpa-redtick
       ;;
-    train) echo espeak-ng sox libsox-fmt-base alsa-utils sound-theme-freedesktop ;;
+    train) echo espeak-ng sox libsox-fmt-base sound-theme-freedesktop scratch ;;
     figures) echo python3 python3-numpy python3-sklearn ;;
     lint) echo git clang-format clang-tidy ;;
     counts) echo valgrind python3 ;;

@@ -5,11 +5,12 @@
 set -euo pipefail
 
 [ $# -eq 1 ] || { echo "usage: train.sh DATA" >&2; exit 2; }
+data=$(realpath "$1")
 cd "$(dirname "$0")/.."
 folder=build/train
 committed=model/demonstration.bin
 
-scripts/train-material.sh "$1" $folder
+scripts/train-material.sh "$data" $folder
 build/host/bin/qz-train fit $folder/manifest.tsv --recipe model/demonstration.recipe \
   --state $folder/state -o $folder/demonstration.bin
 

@@ -15,7 +15,7 @@ namespace qz::tools {
 namespace {
 
 constexpr int64_t kProgressIntervalMs = 200;
-constexpr uint64_t kLongAudioSamples = uint64_t{120} * kSampleRateHz;
+constexpr uint64_t kLongAudioSamples = uint64_t{120} * audio::kSampleRateHz;
 
 int64_t SteadyMs() {
   return std::chrono::duration_cast<std::chrono::milliseconds>(
@@ -51,8 +51,9 @@ void Console::Message(const std::string& line) {
 
 void Console::Progress(uint64_t done, uint64_t total) {
   if (total < kLongAudioSamples || !ProgressDue()) return;
-  std::fprintf(stderr, "\r%.0f of %.0f s, %.0f%%\x1b[K", static_cast<double>(done) / kSampleRateHz,
-               static_cast<double>(total) / kSampleRateHz,
+  std::fprintf(stderr, "\r%.0f of %.0f s, %.0f%%\x1b[K",
+               static_cast<double>(done) / audio::kSampleRateHz,
+               static_cast<double>(total) / audio::kSampleRateHz,
                100.0 * static_cast<double>(done) / static_cast<double>(total));
 }
 

@@ -46,7 +46,7 @@ class Eval {
  public:
   explicit Eval(const EvalOptions& options) : options_(options) {}
 
-  ExitCode Execute();
+  programs::ExitCode Execute();
 
  private:
   void Prepare();
@@ -83,11 +83,11 @@ void Eval::Prepare() {
 bool Eval::Score(const PackedModel& packed, ScoredClip* clip) {
   try {
     std::vector<int16_t> samples = dataset::ReadClip(clip->file);
-    if (samples.empty()) throw AudioError(clip->file + ": holds no sound");
+    if (samples.empty()) throw audio::AudioError(clip->file + ": holds no sound");
     clip->samples = samples.size();
     clip->highest = evaluation::ScoreClip(packed, std::move(samples)).highest;
     return true;
-  } catch (const AudioError& error) {
+  } catch (const audio::AudioError& error) {
     console_.Message("qz: skipped: " + std::string(error.what()));
     return false;
   }
@@ -100,7 +100,7 @@ void Eval::ScoreAll() {
   for (Job& job : jobs_) {
     std::vector<ScoredClip> scored;
     for (ScoredClip& clip : job.clips) {
-      if (Interrupted()) return;
+      if (programs::Interrupted()) return;
       if (Score(job.model, &clip)) scored.push_back(clip);
       console_.ClipProgress(++done, all);
     }
@@ -148,18 +148,18 @@ void Eval::Print() {
   console_.Data(options_.json ? evaluation::JsonReport(all) : evaluation::TextReport(all));
 }
 
-ExitCode Eval::Execute() {
-  CatchInterrupt();
+programs::ExitCode Eval::Execute() {
+  programs::CatchInterrupt();
   try {
     Prepare();
     ScoreAll();
-    if (Interrupted()) {
+    if (programs::Interrupted()) {
       console_.Message("qz: interrupted; figures of some clips would mislead");
-      return kNotRunnable;
+      return programs::kNotRunnable;
     }
   } catch (const std::runtime_error& error) {
     console_.Message(std::string("qz: ") + error.what());
-    return kUnreadableInput;
+    return programs::kUnreadableInput;
   }
   Print();
   std::string fault = console_.OutputFault();
@@ -170,13 +170,13 @@ ExitCode Eval::Execute() {
   }
   if (!fault.empty()) {
     console_.Message("qz: " + fault);
-    return kFaultFound;
+    return programs::kFaultFound;
   }
-  return skipped_ > 0 ? kUnreadableInput : kFine;
+  return skipped_ > 0 ? programs::kUnreadableInput : programs::kFine;
 }
 
 }  // namespace
 
-ExitCode EvalCommand(const EvalOptions& options) { return Eval(options).Execute(); }
+programs::ExitCode EvalCommand(const EvalOptions& options) { return Eval(options).Execute(); }
 
 }  // namespace qz::tools

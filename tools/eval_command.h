@@ -22,6 +22,6 @@ struct EvalOptions {
 // Scores the clips of a manifest, each from a fresh start, and prints how well they were told
 // apart: the figures of each part and the means over the parts. Clips that can't be read are named,
 // left out and counted, and make the exit code kUnreadableInput. Says what went wrong itself.
-ExitCode EvalCommand(const EvalOptions& options);
+programs::ExitCode EvalCommand(const EvalOptions& options);
 
 }  // namespace qz::tools

@@ -44,7 +44,7 @@ std::vector<EvalOptions::Part> ParseFoldModels(const std::vector<std::string>& w
 
 }  // namespace
 
-void AddEval(CLI::App* app, ExitCode* exit_code) {
+void AddEval(CLI::App* app, programs::ExitCode* exit_code) {
   CLI::App* eval = app->add_subcommand("eval", "Measure how well a model tells recordings apart");
   const auto line = std::make_shared<EvalLine>();
   EvalOptions& options = line->options;

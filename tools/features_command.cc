@@ -41,7 +41,7 @@ class Features {
  public:
   explicit Features(const FeaturesOptions& options) : options_(options) {}
 
-  ExitCode Execute();
+  programs::ExitCode Execute();
 
  private:
   void ListFiles();
@@ -49,8 +49,8 @@ class Features {
   void AddJob(dataset::Recording sound, const fs::path& folder);
   // Says so if the sound can't be read.
   void Write(const Job& job);
-  ExitCode WriteAll();
-  ExitCode Conclude();
+  programs::ExitCode WriteAll();
+  programs::ExitCode Conclude();
 
   const FeaturesOptions& options_;
   Console console_;
@@ -92,15 +92,15 @@ void Features::Write(const Job& job) {
   std::vector<int16_t> samples;
   try {
     samples = dataset::ReadClip(job.sound.file);
-  } catch (const AudioError& error) {
+  } catch (const audio::AudioError& error) {
     console_.Message("qz: skipped: " + std::string(error.what()));
     return;
   }
-  if (Interrupted()) return;  // in the midst of a sound, perhaps
+  if (programs::Interrupted()) return;  // in the midst of a sound, perhaps
   const size_t frames = dataset::FramesOf(samples.size());
   const fs::path path = folder_ / job.output;
   if (path.has_parent_path()) fs::create_directories(path.parent_path());
-  model::WriteWholeFile(path.string(), dataset::NpyBytes(dataset::MakeArray(
+  model::WriteWholeFile(path.string(), arrays::NpyBytes(arrays::MakeArray(
                                            {frames, dataset::kFeatureChannels},
                                            dataset::FeaturesOf(samples.data(), samples.size()))));
   list_ += job.output + '\t' + job.sound.class_name + '\t' + std::to_string(job.sound.fold) + '\n';
@@ -108,16 +108,16 @@ void Features::Write(const Job& job) {
   ++written_;
 }
 
-ExitCode Features::WriteAll() {
+programs::ExitCode Features::WriteAll() {
   // No list of an earlier run beside arrays of this one.
   if (!options_.manifest.empty()) fs::remove(folder_ / kList);
   size_t done = 0;
   for (const Job& job : jobs_) {
     Write(job);
-    if (Interrupted()) {
+    if (programs::Interrupted()) {
       console_.Message("qz: interrupted after " + std::to_string(written_) + " of " +
                        std::to_string(jobs_.size()) + " clips");
-      return kNotRunnable;
+      return programs::kNotRunnable;
     }
     console_.ClipProgress(++done, jobs_.size());
   }
@@ -127,20 +127,20 @@ ExitCode Features::WriteAll() {
   return Conclude();
 }
 
-ExitCode Features::Conclude() {
+programs::ExitCode Features::Conclude() {
   if (written_ > 0) {
     console_.Message("wrote features of " + std::to_string(frames_) + " frames in " +
                      std::to_string(written_) + (written_ == 1 ? " array" : " arrays") + " to " +
                      options_.output);
   }
-  if (written_ == jobs_.size()) return kFine;
+  if (written_ == jobs_.size()) return programs::kFine;
   console_.Message("qz: skipped " + std::to_string(jobs_.size() - written_) + " of " +
                    std::to_string(jobs_.size()) + " clips");
-  return kUnreadableInput;
+  return programs::kUnreadableInput;
 }
 
-ExitCode Features::Execute() {
-  CatchInterrupt();
+programs::ExitCode Features::Execute() {
+  programs::CatchInterrupt();
   try {
     if (options_.manifest.empty()) {
       ListFiles();
@@ -150,15 +150,17 @@ ExitCode Features::Execute() {
     return WriteAll();
   } catch (const dataset::ManifestError& error) {
     console_.Message(std::string("qz: ") + error.what());
-    return kUnreadableInput;
+    return programs::kUnreadableInput;
   } catch (const std::runtime_error& error) {  // of writing
     console_.Message(std::string("qz: ") + error.what());
-    return kFaultFound;
+    return programs::kFaultFound;
   }
 }
 
 }  // namespace
 
-ExitCode FeaturesCommand(const FeaturesOptions& options) { return Features(options).Execute(); }
+programs::ExitCode FeaturesCommand(const FeaturesOptions& options) {
+  return Features(options).Execute();
+}
 
 }  // namespace qz::tools

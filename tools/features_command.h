@@ -19,6 +19,6 @@ struct FeaturesOptions {
 // Where a name is taken by an earlier sound, a number follows it: NAME-2.npy. Sounds that can't be
 // read are named, left out and counted, and make the exit code kUnreadableInput. Says what went
 // wrong itself.
-ExitCode FeaturesCommand(const FeaturesOptions& options);
+programs::ExitCode FeaturesCommand(const FeaturesOptions& options);
 
 }  // namespace qz::tools

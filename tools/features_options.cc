@@ -7,7 +7,7 @@
 
 namespace qz::tools {
 
-void AddFeatures(CLI::App* app, ExitCode* exit_code) {
+void AddFeatures(CLI::App* app, programs::ExitCode* exit_code) {
   CLI::App* features = app->add_subcommand(
       "features", "Write what the module's front end makes of sound files, as NumPy arrays");
   const auto options = std::make_shared<FeaturesOptions>();

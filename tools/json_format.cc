@@ -8,7 +8,7 @@ namespace {
 
 using Json = nlohmann::ordered_json;
 
-double Seconds(uint64_t samples) { return static_cast<double>(samples) / kSampleRateHz; }
+double Seconds(uint64_t samples) { return static_cast<double>(samples) / audio::kSampleRateHz; }
 
 Json ReportObject(const char* type, const char* receiver_key, uint32_t receiver,
                   const hub::SoundReport& report, const Names& names) {

@@ -6,6 +6,7 @@
 #include <cstdio>
 #include <exception>
 #include <string>
+#include <vector>
 
 #include "commands.h"
 #include "kernel_versions.h"
@@ -19,13 +20,19 @@ void OccupyStandardStreams() {
   }
 }
 
+std::vector<const CLI::App*> CommandsOf(const CLI::App& app) {
+  return app.get_subcommands([](const CLI::App*) { return true; });
+}
+
 int NoCommand(const CLI::App& app) {
   std::string names;
-  for (const CLI::App* command : app.get_subcommands([](const CLI::App*) { return true; })) {
+  for (const CLI::App* command : CommandsOf(app)) {
     names += (names.empty() ? "" : ", ") + command->get_name();
   }
-  std::fprintf(stderr, "qz: no command, should be one of %s (see qz --help)\n", names.c_str());
-  return qz::tools::kUsage;
+  const std::string line = app.get_parent() == nullptr ? "qz" : "qz " + app.get_name();
+  std::fprintf(stderr, "%s: no command, should be one of %s (see %s --help)\n", line.c_str(),
+               names.c_str(), line.c_str());
+  return qz::programs::kUsage;
 }
 
 int Main(int argc, char** argv) {
@@ -37,7 +44,7 @@ int Main(int argc, char** argv) {
     const std::string command = commands.empty() ? "" : commands[0]->get_name() + " ";
     return std::string("qz: ") + error.what() + " (see qz " + command + "--help)\n";
   });
-  qz::tools::ExitCode exit_code = qz::tools::kFine;
+  qz::programs::ExitCode exit_code = qz::programs::kFine;
   qz::tools::AddRun(&app, &exit_code);
   qz::tools::AddProve(&app, &exit_code);
   qz::tools::AddEval(&app, &exit_code);
@@ -46,9 +53,11 @@ int Main(int argc, char** argv) {
   try {
     app.parse(argc, argv);
   } catch (const CLI::ParseError& error) {
-    return app.exit(error) == 0 ? qz::tools::kFine : qz::tools::kUsage;
+    return app.exit(error) == 0 ? qz::programs::kFine : qz::programs::kUsage;
   }
-  return app.get_subcommands().empty() ? NoCommand(app) : exit_code;
+  const CLI::App* last = &app;
+  while (!last->get_subcommands().empty()) last = last->get_subcommands()[0];
+  return CommandsOf(*last).empty() ? exit_code : NoCommand(*last);
 }
 
 }  // namespace
@@ -59,6 +68,6 @@ int main(int argc, char** argv) {
     return Main(argc, argv);
   } catch (const std::exception& error) {
     std::fprintf(stderr, "qz: %s\n", error.what());
-    return qz::tools::kFaultFound;
+    return qz::programs::kFaultFound;
   }
 }

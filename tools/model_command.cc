@@ -31,34 +31,35 @@ void PrintFindings(const std::string& file, const std::vector<std::string>& find
   console->Message(WithoutLastLineEnd(model::FormatFindings(file, findings)));
 }
 
-ExitCode Fail(const std::exception& error, ExitCode exit_code, Console* console) {
+programs::ExitCode Fail(const std::exception& error, programs::ExitCode exit_code,
+                        Console* console) {
   console->Message(std::string("qz: ") + error.what());
   return exit_code;
 }
 
-ExitCode OutputResult(ExitCode result, Console* console) {
+programs::ExitCode OutputResult(programs::ExitCode result, Console* console) {
   const std::string fault = console->OutputFault();
   if (fault.empty()) return result;
   console->Message("qz: " + fault);
-  return kFaultFound;
+  return programs::kFaultFound;
 }
 
-ExitCode ReadModel(const std::string& file, PackedModel* packed, Console* console) {
+programs::ExitCode ReadModel(const std::string& file, PackedModel* packed, Console* console) {
   try {
     *packed = model::ReadModelFile(file);
-    return kFine;
+    return programs::kFine;
   } catch (const std::runtime_error& error) {
-    return Fail(error, kUnreadableInput, console);
+    return Fail(error, programs::kUnreadableInput, console);
   }
 }
 
-ExitCode ReadSoundModel(const std::string& file, PackedModel* packed, Console* console) {
-  const ExitCode result = ReadModel(file, packed, console);
-  if (result != kFine) return result;
+programs::ExitCode ReadSoundModel(const std::string& file, PackedModel* packed, Console* console) {
+  const programs::ExitCode result = ReadModel(file, packed, console);
+  if (result != programs::kFine) return result;
   const std::vector<std::string> findings = model::CheckWeights(*packed);
-  if (findings.empty()) return kFine;
+  if (findings.empty()) return programs::kFine;
   PrintFindings(file, findings, console);
-  return kFaultFound;
+  return programs::kFaultFound;
 }
 
 std::string Counted(size_t count, const char* what) {
@@ -82,28 +83,28 @@ size_t CheckOneTable(const std::string& file, const PackedModel& packed,
 
 }  // namespace
 
-ExitCode ModelCheckCommand(const std::string& file) {
+programs::ExitCode ModelCheckCommand(const std::string& file) {
   Console console;
   PackedModel packed;
-  const ExitCode result = ReadModel(file, &packed, &console);
-  if (result != kFine) return result;
+  const programs::ExitCode result = ReadModel(file, &packed, &console);
+  if (result != programs::kFine) return result;
   if (packed.size() != model::kModelBytes) {
     console.Data(WithoutLastLineEnd(model::FormatFindings(file, model::CheckWeights(packed))));
-    return OutputResult(kFaultFound, &console);
+    return OutputResult(programs::kFaultFound, &console);
   }
   size_t findings = 0;
   for (const model::TableLayout& table : model::kTables) {
     findings += CheckOneTable(file, packed, table, &console);
   }
   console.Data(file + (findings == 0 ? ": sound" : ": not sound: " + Counted(findings, "finding")));
-  return OutputResult(findings == 0 ? kFine : kFaultFound, &console);
+  return OutputResult(findings == 0 ? programs::kFine : programs::kFaultFound, &console);
 }
 
-ExitCode ModelInfoCommand(const std::string& file, const std::string& clip) {
+programs::ExitCode ModelInfoCommand(const std::string& file, const std::string& clip) {
   Console console;
   PackedModel packed;
-  const ExitCode result = ReadSoundModel(file, &packed, &console);
-  if (result != kFine) return result;
+  const programs::ExitCode result = ReadSoundModel(file, &packed, &console);
+  if (result != programs::kFine) return result;
   try {
     std::string text = file + ": " + TablesText(packed, model::Unpack(packed));
     if (!clip.empty()) {
@@ -111,44 +112,44 @@ ExitCode ModelInfoCommand(const std::string& file, const std::string& clip) {
               TensorsText(TensorsOf(packed, evaluation::FeaturesToPlay(dataset::ReadClip(clip))));
     }
     console.Data(WithoutLastLineEnd(text));
-    return OutputResult(kFine, &console);
+    return OutputResult(programs::kFine, &console);
   } catch (const model::PackingError& error) {
     PrintFindings(file, error.findings(), &console);
-    return kFaultFound;
-  } catch (const AudioError& error) {
-    return Fail(error, kUnreadableInput, &console);
+    return programs::kFaultFound;
+  } catch (const audio::AudioError& error) {
+    return Fail(error, programs::kUnreadableInput, &console);
   }
 }
 
-ExitCode ModelImportCommand(const std::string& arrays, const std::string& output) {
+programs::ExitCode ModelImportCommand(const std::string& arrays, const std::string& output) {
   Console console;
   try {
     const PackedModel packed = model::Pack(model::ReadModelArrays(arrays));
     model::WriteWholeFile(output, std::string(packed.begin(), packed.end()));
-    return kFine;
+    return programs::kFine;
   } catch (const model::PackingError& error) {
     PrintFindings(arrays, error.findings(), &console);
-    return kFaultFound;
-  } catch (const dataset::NpyError& error) {
-    return Fail(error, kUnreadableInput, &console);
+    return programs::kFaultFound;
+  } catch (const arrays::NpyError& error) {
+    return Fail(error, programs::kUnreadableInput, &console);
   } catch (const std::runtime_error& error) {  // of writing
-    return Fail(error, kFaultFound, &console);
+    return Fail(error, programs::kFaultFound, &console);
   }
 }
 
-ExitCode ModelExportCommand(const std::string& file, const std::string& output) {
+programs::ExitCode ModelExportCommand(const std::string& file, const std::string& output) {
   Console console;
   PackedModel packed;
-  const ExitCode result = ReadSoundModel(file, &packed, &console);
-  if (result != kFine) return result;
+  const programs::ExitCode result = ReadSoundModel(file, &packed, &console);
+  if (result != programs::kFine) return result;
   try {
     model::WriteModelArrays(output, model::Unpack(packed));
-    return kFine;
+    return programs::kFine;
   } catch (const model::PackingError& error) {
     PrintFindings(file, error.findings(), &console);
-    return kFaultFound;
-  } catch (const dataset::NpyError& error) {
-    return Fail(error, kFaultFound, &console);
+    return programs::kFaultFound;
+  } catch (const arrays::NpyError& error) {
+    return Fail(error, programs::kFaultFound, &console);
   }
 }
 

@@ -10,16 +10,16 @@
 namespace qz::tools {
 
 // Prints table by table whether a packed model is sound, or else what is wrong and where.
-ExitCode ModelCheckCommand(const std::string& file);
+programs::ExitCode ModelCheckCommand(const std::string& file);
 
 // Prints what is in the tables of a sound packed model, and, unless `clip` is empty, what the
 // network's tensors hold while it hears that sound file and the silence behind it.
-ExitCode ModelInfoCommand(const std::string& file, const std::string& clip);
+programs::ExitCode ModelInfoCommand(const std::string& file, const std::string& clip);
 
 // Packs the arrays of an .npz file.
-ExitCode ModelImportCommand(const std::string& arrays, const std::string& output);
+programs::ExitCode ModelImportCommand(const std::string& arrays, const std::string& output);
 
 // The inverse.
-ExitCode ModelExportCommand(const std::string& file, const std::string& output);
+programs::ExitCode ModelExportCommand(const std::string& file, const std::string& output);
 
 }  // namespace qz::tools

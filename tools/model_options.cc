@@ -14,12 +14,12 @@ struct ModelLine {
   std::string other;
 };
 
-using Command = ExitCode (*)(const std::string& file, const std::string& other);
+using Command = programs::ExitCode (*)(const std::string& file, const std::string& other);
 
 // Adds a subcommand of FILE and one more word.
 void AddModelCommand(CLI::App* model, const char* name, const char* about, const char* about_file,
                      CLI::Option* (*add_other)(CLI::App*, std::string*), Command command,
-                     ExitCode* exit_code) {
+                     programs::ExitCode* exit_code) {
   CLI::App* sub = model->add_subcommand(name, about);
   const auto line = std::make_shared<ModelLine>();
   sub->add_option("FILE", line->file, about_file)->required();
@@ -29,9 +29,8 @@ void AddModelCommand(CLI::App* model, const char* name, const char* about, const
 
 }  // namespace
 
-void AddModel(CLI::App* app, ExitCode* exit_code) {
+void AddModel(CLI::App* app, programs::ExitCode* exit_code) {
   CLI::App* model = app->add_subcommand("model", "Check, show, import and export packed models");
-  model->require_subcommand(1);
   const auto output = [](CLI::App* sub, std::string* path) {
     return sub->add_option("-o", *path, "The file to write")->required();
   };

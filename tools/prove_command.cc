@@ -19,17 +19,17 @@ using trace::Kind;
 
 // The audio of a file as the builds get it: whole buffers, the last one filled up with silence.
 struct RawAudio {
-  NamedTemporaryFile file;
+  audio::NamedTemporaryFile file;
   uint64_t buffers = 0;
 };
 
-void Decode(AudioInput* input, RawAudio* audio) {
+void Decode(audio::AudioInput* input, RawAudio* audio) {
   BufferCutter cutter([audio](const int16_t* buffer) {
-    WriteToTemporaryFile(audio->file.descriptor(), buffer, kBufferSamples * sizeof(int16_t));
+    audio::WriteToTemporaryFile(audio->file.descriptor(), buffer, kBufferSamples * sizeof(int16_t));
     ++audio->buffers;
   });
   while (const size_t got = input->Read(cutter.room(), cutter.room_samples())) {
-    if (Interrupted()) throw BuildError("interrupted");
+    if (programs::Interrupted()) throw BuildError("interrupted");
     cutter.Commit(got);
   }
   cutter.Finish();
@@ -82,36 +82,36 @@ std::string FirstDifference(TracedBuild* first, TracedBuild* second, uint64_t bu
 }
 
 // Of two traces that are equal.
-ExitCode Conclude(const Comparison& comparison, const ProveOptions& options, uint64_t buffers,
-                  Console* console) {
+programs::ExitCode Conclude(const Comparison& comparison, const ProveOptions& options,
+                            uint64_t buffers, Console* console) {
   if (comparison.buffers_played() != 2 * buffers) {
     console->Message("qz: the builds played " + Grouped(comparison.buffers_played()) +
                      " buffers of audio each, should be " + Grouped(2 * buffers) +
                      ": all of the file's, once to each nanoapp");
-    return kNotRunnable;
+    return programs::kNotRunnable;
   }
   const std::string apart = comparison.NanoappsDiffer();
   if (!apart.empty()) {
     console->Data("the builds give the same, but what was loaded and what was observed do not: " +
                   apart);
-    return kFaultFound;
+    return programs::kFaultFound;
   }
   if (comparison.tally(trace::kLinkedNanoapp, Kind::kFeatures).records == 0) {
     console->Message("qz: nothing was computed: the detectors took none of " + Grouped(buffers) +
                      " buffers of audio");
-    return kFaultFound;
+    return programs::kFaultFound;
   }
   if (comparison.tally(trace::kLinkedNanoapp, Kind::kOperatorOutput).records == 0) {
     console->Message("qz: the network did not run in " + Grouped(buffers) +
                      " buffers of 2 s of audio, should be from the second one on");
-    return kFaultFound;
+    return programs::kFaultFound;
   }
   PrintTallies(comparison, console);
   console->Data(options.builds[0] + " and " + options.builds[1] + " give the same");
-  return kFine;
+  return programs::kFine;
 }
 
-ExitCode Compare(const ProveOptions& options, const RawAudio& audio, Console* console) {
+programs::ExitCode Compare(const ProveOptions& options, const RawAudio& audio, Console* console) {
   const std::string& path = audio.file.path();
   TracedBuild first(options.builds[0], path, options.host_clients, options.client_nanoapps);
   TracedBuild second(options.builds[1], path, options.host_clients, options.client_nanoapps);
@@ -120,37 +120,37 @@ ExitCode Compare(const ProveOptions& options, const RawAudio& audio, Console* co
       FirstDifference(&first, &second, audio.buffers, &comparison, console);
   if (difference.empty()) return Conclude(comparison, options, audio.buffers, console);
   console->Data("first difference: " + difference);
-  return kFaultFound;
+  return programs::kFaultFound;
 }
 
 }  // namespace
 
-ExitCode ProveCommand(const ProveOptions& options) {
-  CatchInterrupt();
+programs::ExitCode ProveCommand(const ProveOptions& options) {
+  programs::CatchInterrupt();
   Console console;
   std::error_code missing;  // which is told later
   if (std::filesystem::equivalent(options.builds[0], options.builds[1], missing)) {
     console.Message("qz: " + options.builds[0] + " and " + options.builds[1] +
                     " are one folder, should be two builds (see qz prove --help)");
-    return kUsage;
+    return programs::kUsage;
   }
   try {
-    const std::unique_ptr<AudioInput> input = OpenAudio(options.file, /*raw=*/false);
+    const std::unique_ptr<audio::AudioInput> input = audio::OpenAudio(options.file, /*raw=*/false);
     console.Message(input->Description());
     RawAudio audio;
     Decode(input.get(), &audio);
-    const ExitCode result = Compare(options, audio, &console);
+    const programs::ExitCode result = Compare(options, audio, &console);
     const std::string output_fault = console.OutputFault();
     if (output_fault.empty()) return result;
     console.Message("qz: " + output_fault);
-    return kFaultFound;
-  } catch (const AudioError& error) {
+    return programs::kFaultFound;
+  } catch (const audio::AudioError& error) {
     console.Message(std::string("qz: ") + error.what());
-    return kUnreadableInput;
+    return programs::kUnreadableInput;
   } catch (const BuildError& error) {
-    console.Message(Interrupted() ? "qz: interrupted before both traces were compared"
-                                  : std::string("qz: ") + error.what());
-    return kNotRunnable;
+    console.Message(programs::Interrupted() ? "qz: interrupted before both traces were compared"
+                                            : std::string("qz: ") + error.what());
+    return programs::kNotRunnable;
   }
 }
 

@@ -19,6 +19,6 @@ struct ProveOptions {
 // by all that they log and send and by what stands in their memory after each buffer of audio; the
 // same nanoapp linked into qz-trace by every frame and every operator too. Both nanoapps of a build
 // must agree. Prints what was compared, or the first difference; says what went wrong itself.
-ExitCode ProveCommand(const ProveOptions& options);
+programs::ExitCode ProveCommand(const ProveOptions& options);
 
 }  // namespace qz::tools

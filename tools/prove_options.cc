@@ -19,7 +19,7 @@ std::vector<std::string> DefaultBuilds() {
 
 }  // namespace
 
-void AddProve(CLI::App* app, ExitCode* exit_code) {
+void AddProve(CLI::App* app, programs::ExitCode* exit_code) {
   CLI::App* prove = app->add_subcommand(
       "prove",
       "Play a sound file to the detector of two builds, compare all that they say and compute");

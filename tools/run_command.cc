@@ -48,17 +48,17 @@ class Run {
   // Whatever the module still sends at its end needs the clients.
   ~Run() { hub_.End(); }
 
-  ExitCode Execute();
+  programs::ExitCode Execute();
 
  private:
-  bool StartModule(ExitCode* exit_code);
+  bool StartModule(programs::ExitCode* exit_code);
   // Plays the input, of which `first_samples` stand in the cutter's room already.
-  void Stream(AudioInput* input, size_t first_samples);
+  void Stream(audio::AudioInput* input, size_t first_samples);
   void Play(const int16_t* buffer);
   void ReportShortAudio();
   RunSummary Summarise() const;
   std::string WrongLabels() const;
-  ExitCode Conclude();
+  programs::ExitCode Conclude();
 
   const RunOptions& options_;
   Console console_;
@@ -90,20 +90,20 @@ Run::Run(const RunOptions& options)
   }
 }
 
-ExitCode Run::Execute() {
-  CatchInterrupt();
-  std::unique_ptr<AudioInput> input;
+programs::ExitCode Run::Execute() {
+  programs::CatchInterrupt();
+  std::unique_ptr<audio::AudioInput> input;
   size_t first_samples = 0;
   try {
-    input = OpenAudio(options_.file, options_.raw);
+    input = audio::OpenAudio(options_.file, options_.raw);
     // Before anything starts: audio that is bad from its beginning costs one line.
     first_samples = input->Read(cutter_.room(), cutter_.room_samples());
-  } catch (const AudioError& error) {
+  } catch (const audio::AudioError& error) {
     console_.Message(std::string("qz: ") + error.what());
-    return kUnreadableInput;
+    return programs::kUnreadableInput;
   }
 
-  ExitCode exit_code = kFine;
+  programs::ExitCode exit_code = programs::kFine;
   if (!StartModule(&exit_code)) return exit_code;
   console_.Message(input->Description());
   if (view_) {
@@ -120,7 +120,7 @@ ExitCode Run::Execute() {
   try {
     Stream(input.get(), first_samples);
     if (audio_taken && !console_.output_lost()) ReportShortAudio();
-  } catch (const AudioError& error) {
+  } catch (const audio::AudioError& error) {
     broken_off = std::string("qz: ") + error.what();
   }
   clients_.Leave();
@@ -128,10 +128,10 @@ ExitCode Run::Execute() {
   exit_code = Conclude();
   if (broken_off.empty()) return exit_code;
   console_.Message(broken_off);
-  return kUnreadableInput;
+  return programs::kUnreadableInput;
 }
 
-bool Run::StartModule(ExitCode* exit_code) {
+bool Run::StartModule(programs::ExitCode* exit_code) {
   hub_.SetLogHandler([this](chreLogLevel level, uint64_t time_ns, const std::string& line) {
     if (level <= options_.log_level) console_.Message(LogLine(level, time_ns, line));
   });
@@ -139,7 +139,8 @@ bool Run::StartModule(ExitCode* exit_code) {
   hub::LoadFailure failure;
   if (hub_.Start(options_.module_path, &failure)) return true;
   console_.Message("qz: " + failure.sentence);
-  *exit_code = failure.kind == hub::LoadFailure::Kind::kRefused ? kFaultFound : kNotRunnable;
+  *exit_code = failure.kind == hub::LoadFailure::Kind::kRefused ? programs::kFaultFound
+                                                                : programs::kNotRunnable;
   return false;
 }
 
@@ -151,22 +152,22 @@ void Run::Play(const int16_t* buffer) {
   }
 }
 
-void Run::Stream(AudioInput* input, size_t first_samples) {
+void Run::Stream(audio::AudioInput* input, size_t first_samples) {
   if (options_.real_time) hub_.RunInRealTime();
   const auto start = std::chrono::steady_clock::now();
   for (size_t got = first_samples; got > 0 && !console_.output_lost();) {
     cutter_.Commit(got);
     console_.Progress(delivered_samples_, input->ExpectedSamples());
-    got = Interrupted() ? 0 : input->Read(cutter_.room(), cutter_.room_samples());
+    got = programs::Interrupted() ? 0 : input->Read(cutter_.room(), cutter_.room_samples());
   }
   if (console_.output_lost()) return;
   silent_samples_ = cutter_.Finish();
   wall_seconds_ = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
-  if (Interrupted()) console_.Message("interrupted");
+  if (programs::Interrupted()) console_.Message("interrupted");
   if (silent_samples_ > 0) {
     char text[96];
     std::snprintf(text, sizeof(text), "padded the last buffer with %.3f s of silence",
-                  static_cast<double>(silent_samples_) / kSampleRateHz);
+                  static_cast<double>(silent_samples_) / audio::kSampleRateHz);
     console_.Message(text);
   }
 }
@@ -208,7 +209,7 @@ std::string Run::WrongLabels() const {
   return "";
 }
 
-ExitCode Run::Conclude() {
+programs::ExitCode Run::Conclude() {
   std::vector<std::string> faults = printer_.faults();
   const std::string wrong_labels = WrongLabels();
   if (!wrong_labels.empty()) faults.push_back(wrong_labels);
@@ -220,25 +221,25 @@ ExitCode Run::Conclude() {
   summary.faults = faults.size();
   // The pace of the clock on the wall says nothing about speed.
   if (!options_.real_time && wall_seconds_ > 0) {
-    summary.speed = static_cast<double>(delivered_samples_) / kSampleRateHz / wall_seconds_;
+    summary.speed = static_cast<double>(delivered_samples_) / audio::kSampleRateHz / wall_seconds_;
   }
   console_.Data(format_->Summary(summary));
 
   for (const std::string& fault : faults) console_.Message("qz: fault: " + fault);
   const std::string output_fault = console_.OutputFault();
   if (!output_fault.empty()) console_.Message("qz: " + output_fault);
-  return faults.empty() && output_fault.empty() ? kFine : kFaultFound;
+  return faults.empty() && output_fault.empty() ? programs::kFine : programs::kFaultFound;
 }
 
 }  // namespace
 
-ExitCode RunCommand(const RunOptions& options) {
+programs::ExitCode RunCommand(const RunOptions& options) {
   std::optional<Run> run;
   try {
     run.emplace(options);
   } catch (const std::runtime_error& error) {
     std::fprintf(stderr, "qz: %s\n", error.what());
-    return kUnreadableInput;
+    return programs::kUnreadableInput;
   }
   return run->Execute();
 }

@@ -24,6 +24,6 @@ struct RunOptions {
 };
 
 // Plays a file to the nanoapp and prints what its clients receive. Says what went wrong itself.
-ExitCode RunCommand(const RunOptions& options);
+programs::ExitCode RunCommand(const RunOptions& options);
 
 }  // namespace qz::tools

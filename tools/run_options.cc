@@ -40,7 +40,7 @@ void CompletePaths(RunOptions* options) {
   }
 }
 
-ExitCode Run(RunLine line) {
+programs::ExitCode Run(RunLine line) {
   line.options.log_level = static_cast<chreLogLevel>(
       std::find(kLogLevels.begin(), kLogLevels.end(), line.log_level) - kLogLevels.begin());
   if (!line.options.model_path.empty() && !line.options.scores &&
@@ -53,7 +53,7 @@ ExitCode Run(RunLine line) {
 
 }  // namespace
 
-void AddRun(CLI::App* app, ExitCode* exit_code) {
+void AddRun(CLI::App* app, programs::ExitCode* exit_code) {
   CLI::App* run =
       app->add_subcommand("run", "Play a sound file to the detector, print its reports");
   const auto line = std::make_shared<RunLine>();

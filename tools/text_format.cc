@@ -17,15 +17,17 @@ constexpr float kHeard = 0.5f;
 constexpr char kToolsView[] = "tool's view: ";
 
 [[gnu::format(printf, 1, 2)]] std::string Format(const char* format, ...) {
-  char text[512];
-  va_list arguments;
+  va_list arguments, again;
   va_start(arguments, format);
-  std::vsnprintf(text, sizeof(text), format, arguments);
+  va_copy(again, arguments);
+  std::string text(static_cast<size_t>(std::vsnprintf(nullptr, 0, format, arguments)), '\0');
+  std::vsnprintf(text.data(), text.size() + 1, format, again);
+  va_end(again);
   va_end(arguments);
   return text;
 }
 
-double Seconds(uint64_t samples) { return static_cast<double>(samples) / kSampleRateHz; }
+double Seconds(uint64_t samples) { return static_cast<double>(samples) / audio::kSampleRateHz; }
 
 std::string Bar(float confidence) {
   int filled = 0;

@@ -47,8 +47,8 @@ TracedBuild::TracedBuild(const std::string& folder, const std::string& raw_audio
 void TracedBuild::Start(const std::vector<std::string>& command) {
   int ends[2];
   if (pipe2(ends, O_CLOEXEC) != 0) throw BuildError(program_ + ": " + std::strerror(errno));
-  pipe_ = FileDescriptor(ends[0]);
-  const FileDescriptor write_end(ends[1]);
+  pipe_ = programs::FileDescriptor(ends[0]);
+  const programs::FileDescriptor write_end(ends[1]);
 
   std::vector<char*> words;
   words.reserve(command.size() + 1);
@@ -102,7 +102,7 @@ void TracedBuild::Next(trace::Record* record) {
 
 size_t TracedBuild::Read(uint8_t* bytes, size_t size) {
   while (block_read_ == block_.size()) {
-    if (at_end_ || !WaitReadable(pipe_.get())) return 0;
+    if (at_end_ || !programs::WaitReadable(pipe_.get())) return 0;
     block_.resize(kBlockBytes);
     const ssize_t got = read(pipe_.get(), block_.data(), block_.size());
     if (got < 0 && errno != EINTR) throw BuildError(program_ + ": " + std::strerror(errno));
@@ -120,7 +120,7 @@ std::string TracedBuild::AwaitEnd() {
   // Until waitpid() the ended process keeps its number, and with it the group's.
   siginfo_t ended;
   do {
-    if (Interrupted()) kill(-process_, SIGKILL);
+    if (programs::Interrupted()) kill(-process_, SIGKILL);
   } while (waitid(P_PID, static_cast<id_t>(process_), &ended, WEXITED | WNOWAIT) < 0 &&
            errno == EINTR);
   kill(-process_, SIGKILL);

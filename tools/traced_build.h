@@ -43,7 +43,7 @@ class TracedBuild {
   std::string AwaitEnd();
 
   std::string program_;
-  FileDescriptor pipe_{-1};
+  programs::FileDescriptor pipe_{-1};
   pid_t process_ = -1;
   std::vector<uint8_t> block_;  // bytes read ahead,
   size_t block_read_ = 0;       // and how many of them were handed on

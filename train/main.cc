@@ -70,7 +70,7 @@ int Main(int argc, char** argv) {
   try {
     app.parse(argc, argv);
   } catch (const CLI::ParseError& error) {
-    return app.exit(error) == 0 ? qz::tools::kFine : qz::tools::kUsage;
+    return app.exit(error) == 0 ? qz::programs::kFine : qz::programs::kUsage;
   }
   SettleArithmetic();
   return fit->parsed() ? qz::train::TrainCommand(options)
@@ -83,13 +83,13 @@ int main(int argc, char** argv) {
 #if defined(__x86_64__)
   if (!__builtin_cpu_supports("avx2") || !__builtin_cpu_supports("fma")) {
     std::fprintf(stderr, "qz-train: this processor lacks AVX2 or FMA, which it needs\n");
-    return qz::tools::kNotRunnable;
+    return qz::programs::kNotRunnable;
   }
 #endif
   try {
     return Main(argc, argv);
   } catch (const std::exception& error) {
     std::fprintf(stderr, "qz-train: %s\n", error.what());
-    return qz::tools::kUnreadableInput;
+    return qz::programs::kUnreadableInput;
   }
 }

@@ -9,7 +9,7 @@
 
 namespace qz::train {
 
-tools::ExitCode ProveModelCommand(const std::string& model_file, const std::string& manifest) {
+programs::ExitCode ProveModelCommand(const std::string& model_file, const std::string& manifest) {
   const model::PackedModel model = model::ReadSoundModel(model_file);
   // Any sound does: no class is asked for.
   const ClipList list = LoadClips(dataset::ReadManifest(manifest), model::Labels());
@@ -20,8 +20,8 @@ tools::ExitCode ProveModelCommand(const std::string& model_file, const std::stri
   }
   const Proof proof = Prove(ParametersOf(model::Unpack(model)), model, judged);
   std::printf("%s on %zu clips: %s\n", model_file.c_str(), judged.size(), Sentence(proof).c_str());
-  if (!proof.difference.empty() || proof.runs == 0) return tools::kFaultFound;
-  return list.skipped.empty() ? tools::kFine : tools::kUnreadableInput;
+  if (!proof.difference.empty() || proof.runs == 0) return programs::kFaultFound;
+  return list.skipped.empty() ? programs::kFine : programs::kUnreadableInput;
 }
 
 }  // namespace qz::train

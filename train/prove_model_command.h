@@ -8,6 +8,6 @@ namespace qz::train {
 
 // Compares the trainer's integer network with the module's, on every clip of a list. Says what went
 // wrong itself.
-tools::ExitCode ProveModelCommand(const std::string& model_file, const std::string& manifest);
+programs::ExitCode ProveModelCommand(const std::string& model_file, const std::string& manifest);
 
 }  // namespace qz::train

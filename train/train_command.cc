@@ -43,7 +43,7 @@ void PrintFigures(const TrainingState& state, const QuantisedParameters& quantis
 class Run {
  public:
   explicit Run(const TrainOptions& options) : options_(options) {}
-  tools::ExitCode Execute();
+  programs::ExitCode Execute();
 
  private:
   void CheckPlaces() const;
@@ -66,8 +66,8 @@ class Run {
   std::chrono::steady_clock::time_point last_state_ = std::chrono::steady_clock::now();
 };
 
-tools::ExitCode Run::Execute() {
-  tools::CatchInterrupt();
+programs::ExitCode Run::Execute() {
+  programs::CatchInterrupt();
   Load();
   CheckClasses();
   Trainer trainer(recipe_, options_.seed, options_.threads, learnt_);
@@ -89,10 +89,10 @@ tools::ExitCode Run::Execute() {
     std::fprintf(stderr, "qz-train: stopped after epoch %d; %s\n", state.epoch,
                  options_.state_file.empty() ? "nothing is kept without --state"
                                              : "the same command goes on");
-    return tools::kNotRunnable;
+    return programs::kNotRunnable;
   }
-  if (!Finish(state)) return tools::kFaultFound;
-  return skipped_ == 0 ? tools::kFine : tools::kUnreadableInput;
+  if (!Finish(state)) return programs::kFaultFound;
+  return skipped_ == 0 ? programs::kFine : programs::kUnreadableInput;
 }
 
 // Now, not after an hour.
@@ -140,7 +140,7 @@ void Run::CheckClasses() const {
 
 void Run::Train(Trainer* trainer, TrainingState* state) {
   TrainProgress progress(state->epoch);
-  while (!trainer->Done(*state) && !tools::Interrupted()) {
+  while (!trainer->Done(*state) && !programs::Interrupted()) {
     const size_t teachers = state->teachers.size();
     const bool tuning = trainer->Tuning(*state);
     const double loss = trainer->RunEpoch(state);
@@ -150,7 +150,7 @@ void Run::Train(Trainer* trainer, TrainingState* state) {
     }
     progress.Show(tuning ? "tuning" : "teacher " + std::to_string(teachers + 1), state->epoch,
                   trainer->EpochsLeft(*state), loss, figures_ ? &*figures_ : nullptr);
-    KeepState(*state, tools::Interrupted());
+    KeepState(*state, programs::Interrupted());
   }
 }
 
@@ -203,6 +203,6 @@ bool Run::Finish(const TrainingState& state) const {
 
 }  // namespace
 
-tools::ExitCode TrainCommand(const TrainOptions& options) { return Run(options).Execute(); }
+programs::ExitCode TrainCommand(const TrainOptions& options) { return Run(options).Execute(); }
 
 }  // namespace qz::train

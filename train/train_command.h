@@ -20,6 +20,6 @@ struct TrainOptions {
 };
 
 // Learns from a list of recordings and writes a packed model. Says what went wrong itself.
-tools::ExitCode TrainCommand(const TrainOptions& options);
+programs::ExitCode TrainCommand(const TrainOptions& options);
 
 }  // namespace qz::train

@@ -16,7 +16,7 @@ ClipList LoadClips(const std::vector<dataset::Recording>& recordings, const mode
       list.clips.push_back({recording.file, recording.fold,
                             model::OutputOf(labels, recording.class_name),
                             dataset::ReadClip(recording.file)});
-    } catch (const tools::AudioError& error) {
+    } catch (const audio::AudioError& error) {
       list.skipped.emplace_back(error.what());
     }
   }

@@ -56,6 +56,7 @@ std::vector<int32_t> PlainSums(const TableLayout& table, const LayerArrays& arra
   const bool depthwise = table.kind == TableKind::kDepthwise;
   const int channels = depthwise ? table.outputs : table.inputs;
   const int rows = static_cast<int>(in.size()) / channels - table.taps + 1;
+  const int zero_point = table.op == 1 ? 15 : table.op == 4 ? 36 : -128;
   std::vector<int32_t> sums;
   for (int row = 0; row < rows; ++row) {
     for (int out = 0; out < table.outputs; ++out) {
@@ -64,7 +65,7 @@ std::vector<int32_t> PlainSums(const TableLayout& table, const LayerArrays& arra
         for (int input = 0; input < table.inputs; ++input) {
           const int x = in[(row + tap) * channels + (depthwise ? out : input)];
           const int weight = arrays.weight[(tap * table.inputs + input) * table.outputs + out];
-          sum += weight * (x - InputZeroPoint(table));
+          sum += weight * (x - zero_point);
         }
       }
       sums.push_back(sum);
@@ -166,18 +167,18 @@ TEST(Packing, NamesEveryKindOfDefect) {
 
 class ArrayFiles : public testing::Test {
  protected:
-  static constexpr dataset::NpzLimits kLimits = {34, 1 << 18};
-  using Named = std::map<std::string, dataset::NpyArray>;
+  static constexpr arrays::NpzLimits kLimits = {34, 1 << 18};
+  using Named = std::map<std::string, arrays::NpyArray>;
 
   ArrayFiles() { WriteModelArrays(path_, Unpack(Standin())); }
 
   // Of the good archive with a change.
   template <typename Change>
   std::vector<std::string> FindingsAfter(Change change) const {
-    Named arrays = dataset::ReadNpz(path_, kLimits);
+    Named arrays = arrays::ReadNpz(path_, kLimits);
     change(arrays);
     const std::string changed = folder_.Path("changed.npz");
-    dataset::WriteNpz(changed, {arrays.begin(), arrays.end()});
+    arrays::WriteNpz(changed, {arrays.begin(), arrays.end()});
     try {
       ReadModelArrays(changed);
     } catch (const PackingError& error) {
@@ -192,7 +193,7 @@ class ArrayFiles : public testing::Test {
 
 TEST_F(ArrayFiles, HoldAModelToTheByte) {
   EXPECT_TRUE(Pack(ReadModelArrays(path_)) == Standin());
-  const Named arrays = dataset::ReadNpz(path_, kLimits);
+  const Named arrays = arrays::ReadNpz(path_, kLimits);
   EXPECT_EQ(arrays.size(), 34u);
   EXPECT_THAT(arrays.at("w0.weight").shape, ElementsAre(3, 48));
   EXPECT_THAT(arrays.at("w4.weight").shape, ElementsAre(60, 60));
@@ -204,15 +205,15 @@ TEST_F(ArrayFiles, WithWrongArraysAreRefused) {
   EXPECT_THAT(FindingsAfter([](Named&) {}), ElementsAre());
   EXPECT_THAT(FindingsAfter([](Named& arrays) {
                 arrays.erase("w6.scale");
-                arrays["w8.bias"] = dataset::MakeArray<float>({60}, std::vector<float>(60));
+                arrays["w8.bias"] = arrays::MakeArray<float>({60}, std::vector<float>(60));
                 arrays["w10.weight"].shape = {60, 3, 60};
-                arrays["w17.scale"] = dataset::MakeArray<float>({}, {1});
+                arrays["w17.scale"] = arrays::MakeArray<float>({}, {1});
               }),
               ElementsAre("w6.scale is missing; float32 (60,) would be right.",
                           "w8.bias is float32 (60,); int32 (60,) would be right.",
                           "w10.weight is int8 (60, 3, 60); int8 (3, 60, 60) would be right.",
                           "w17.scale is none of a model's arrays."));
-  EXPECT_THROW(ReadModelArrays(folder_.WriteBytes("x.npz", "x")), dataset::NpyError);
+  EXPECT_THROW(ReadModelArrays(folder_.WriteBytes("x.npz", "x")), arrays::NpyError);
 }
 
 }  // namespace

@@ -67,7 +67,7 @@ class Commands : public testing::Test {
 
   const test::TemporaryFolder folder_;
   TrainOptions options_;
-  tools::ExitCode exit_code_ = tools::kFine;
+  programs::ExitCode exit_code_ = programs::kFine;
 };
 
 TEST_F(Commands, FitWritesASoundModelAndNamesWhatItSkipped) {
@@ -76,11 +76,11 @@ TEST_F(Commands, FitWritesASoundModelAndNamesWhatItSkipped) {
                     HasSubstr("learning from 6 clips, judged by 6, 1 skipped"),
                     HasSubstr("on 6 clips that were held out"), HasSubstr("loss of quantisation"),
                     HasSubstr(" of 21 operators: "), HasSubstr(", the same\n")));
-  EXPECT_EQ(exit_code_, tools::kUnreadableInput);
+  EXPECT_EQ(exit_code_, programs::kUnreadableInput);
   const model::PackedModel model = model::ReadModelFile(options_.output);
   EXPECT_TRUE(model::CheckWeights(model).empty());
   testing::internal::CaptureStdout();
-  EXPECT_EQ(ProveModelCommand(options_.output, options_.manifest), tools::kUnreadableInput);
+  EXPECT_EQ(ProveModelCommand(options_.output, options_.manifest), programs::kUnreadableInput);
   EXPECT_THAT(testing::internal::GetCapturedStdout(),
               AllOf(HasSubstr("on 12 clips: "), HasSubstr(", the same\n")));
 }

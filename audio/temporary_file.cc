@@ -9,7 +9,7 @@
 
 #include "audio_input.h"
 
-namespace qz::tools {
+namespace qz::audio {
 namespace {
 
 std::string TemporaryFolder() {
@@ -18,18 +18,18 @@ std::string TemporaryFolder() {
 }
 
 // Fills in the last letters of the path.
-FileDescriptor MakeFile(std::string* path) {
+programs::FileDescriptor MakeFile(std::string* path) {
   *path = TemporaryFolder() + "/qz-XXXXXX";
-  FileDescriptor file(mkostemp(path->data(), O_CLOEXEC));
+  programs::FileDescriptor file(mkostemp(path->data(), O_CLOEXEC));
   if (file.get() < 0) ThrowSystemError(*path, "can't make a temporary file");
   return file;
 }
 
 }  // namespace
 
-FileDescriptor OpenTemporaryFile() {
+programs::FileDescriptor OpenTemporaryFile() {
   std::string path;
-  FileDescriptor file = MakeFile(&path);
+  programs::FileDescriptor file = MakeFile(&path);
   unlink(path.c_str());
   return file;
 }
@@ -38,7 +38,7 @@ NamedTemporaryFile::NamedTemporaryFile() : descriptor_(MakeFile(&path_)) {}
 
 NamedTemporaryFile::~NamedTemporaryFile() { unlink(path_.c_str()); }
 
-void WriteToTemporaryFile(const FileDescriptor& file, const void* bytes, size_t count) {
+void WriteToTemporaryFile(const programs::FileDescriptor& file, const void* bytes, size_t count) {
   const char* rest = static_cast<const char*>(bytes);
   while (count > 0) {
     const ssize_t written = write(file.get(), rest, count);
@@ -54,4 +54,4 @@ void ThrowSystemError(const std::string& name, const char* what) {
   throw AudioError(name + ": " + what + ": " + std::strerror(error));
 }
 
-}  // namespace qz::tools
+}  // namespace qz::audio

@@ -13,7 +13,7 @@
 #include "random.h"
 #include "sound_folder.h"
 
-namespace qz::tools {
+namespace qz::audio {
 namespace {
 
 using testing::AllOf;
@@ -171,4 +171,4 @@ TEST_F(AudioInputTest, RawStreamsArriveInAnyPiecesOfWholeSamples) {
 }
 
 }  // namespace
-}  // namespace qz::tools
+}  // namespace qz::audio

@@ -6,7 +6,7 @@
 
 #include "truncation.h"
 
-namespace qz::tools {
+namespace qz::audio {
 namespace {
 
 constexpr int kLowestRateHz = 1000;
@@ -25,7 +25,7 @@ std::string OneLine(std::string text) {
 
 }  // namespace
 
-SoundFileInput::SoundFileInput(std::string name, FileDescriptor file)
+SoundFileInput::SoundFileInput(std::string name, programs::FileDescriptor file)
     : name_(std::move(name)), file_(std::move(file)) {
   sound_file_.reset(sf_open_fd(file_.get(), SFM_READ, &info_, SF_FALSE));
   if (sound_file_ == nullptr) {
@@ -142,4 +142,4 @@ void SoundFileInput::CheckEnd() const {
   }
 }
 
-}  // namespace qz::tools
+}  // namespace qz::audio

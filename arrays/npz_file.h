@@ -9,7 +9,7 @@
 
 #include "npy_file.h"
 
-namespace qz::dataset {
+namespace qz::arrays {
 
 // What an archive may hold; one that claims more is refused before it is unpacked.
 struct NpzLimits {
@@ -24,4 +24,4 @@ std::map<std::string, NpyArray> ReadNpz(const std::string& path, const NpzLimits
 // file beside `path` that then takes its name. Throws NpyError; `path` is then as it was.
 void WriteNpz(const std::string& path, const std::vector<std::pair<std::string, NpyArray>>& arrays);
 
-}  // namespace qz::dataset
+}  // namespace qz::arrays

@@ -6,12 +6,12 @@
 
 #include "file_descriptor.h"
 
-namespace qz::tools {
+namespace qz::audio {
 
 // All throw AudioError.
 
 // A file without a name: nothing of it stays, however the program ends.
-FileDescriptor OpenTemporaryFile();
+programs::FileDescriptor OpenTemporaryFile();
 
 // A file with a name, for other programs; removed with the object.
 class NamedTemporaryFile {
@@ -22,16 +22,16 @@ class NamedTemporaryFile {
   ~NamedTemporaryFile();
 
   const std::string& path() const { return path_; }
-  const FileDescriptor& descriptor() const { return descriptor_; }
+  const programs::FileDescriptor& descriptor() const { return descriptor_; }
 
  private:
   std::string path_;
-  FileDescriptor descriptor_;
+  programs::FileDescriptor descriptor_;
 };
 
-void WriteToTemporaryFile(const FileDescriptor& file, const void* bytes, size_t count);
+void WriteToTemporaryFile(const programs::FileDescriptor& file, const void* bytes, size_t count);
 
 // Throws AudioError with what errno says: "NAME: WHAT: Reason".
 [[noreturn]] void ThrowSystemError(const std::string& name, const char* what);
 
-}  // namespace qz::tools
+}  // namespace qz::audio

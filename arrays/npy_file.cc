@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <string_view>
 
-namespace qz::dataset {
+namespace qz::arrays {
 namespace {
 
 constexpr std::string_view kMagic = "\x93NUMPY";
@@ -214,4 +214,4 @@ NpyArray ParseNpy(const std::string& bytes, const std::string& name) {
   return array;
 }
 
-}  // namespace qz::dataset
+}  // namespace qz::arrays

@@ -9,7 +9,7 @@
 #include "npz_file.h"
 #include "temporary_folder.h"
 
-namespace qz::dataset {
+namespace qz::arrays {
 namespace {
 
 using testing::ElementsAre;
@@ -60,7 +60,8 @@ TEST(Npy, NamesWhatIsWrong) {
       {Saved(good, "ab").replace(6, 1, "\2"), "x: of version 2.0 of NumPy's format, should be 1.0"},
       {Saved(good, "ab").substr(0, 100), "x: cut off: its header has 118 bytes, there are 90"},
       {Saved(good, "a"), "x: its shape (2,) of int8 takes 2 bytes, there are 1"},
-      {Saved(Header("<f4", "(1073741824, 1073741824, 4)"), ""), "takes more than memory has, there"},
+      {Saved(Header("<f4", "(1073741824, 1073741824, 4)"), ""),
+       "takes more than memory has, there"},
       {Saved(Header("|i1", "(99999999999999999999,)"), ""), "of the header should be of a smaller"},
       {Saved(Header("|i1", "(-1,)"), ""), "of the header should be a digit"},
       {Saved(Header("|i1", "(2)"), "ab"), "of the header should be a comma"},
@@ -171,4 +172,4 @@ TEST_F(Npz, OutlivesAnyByte) {
 }
 
 }  // namespace
-}  // namespace qz::dataset
+}  // namespace qz::arrays

@@ -4,7 +4,7 @@
 
 #include <utility>
 
-namespace qz::tools {
+namespace qz::programs {
 
 // An open file descriptor, closed with the object.
 class FileDescriptor {
@@ -25,4 +25,4 @@ class FileDescriptor {
   int fd_;
 };
 
-}  // namespace qz::tools
+}  // namespace qz::programs

@@ -6,7 +6,7 @@
 #include <stdexcept>
 #include <string>
 
-namespace qz::tools {
+namespace qz::audio {
 
 // The rate of everything that leaves an AudioInput, in Hz.
 constexpr uint32_t kSampleRateHz = 16000;
@@ -39,4 +39,4 @@ class AudioInput {
 // not a regular file is first copied to an unnamed temporary one. Throws AudioError.
 std::unique_ptr<AudioInput> OpenAudio(const std::string& path, bool raw);
 
-}  // namespace qz::tools
+}  // namespace qz::audio

@@ -10,7 +10,7 @@
 #include <utility>
 #include <vector>
 
-namespace qz::dataset {
+namespace qz::arrays {
 
 enum class ElementType { kInt8, kUint16, kInt32, kFloat32 };
 
@@ -65,4 +65,4 @@ std::string NpyBytes(const NpyArray& array);
 // begins with `name`.
 NpyArray ParseNpy(const std::string& bytes, const std::string& name);
 
-}  // namespace qz::dataset
+}  // namespace qz::arrays

@@ -6,7 +6,7 @@
 
 #include "audio_input.h"
 
-namespace qz::tools {
+namespace qz::audio {
 namespace {
 
 constexpr size_t kResampledBlock = 8192;
@@ -82,4 +82,4 @@ void SampleConverter::Resample(const float* mono, size_t count, std::vector<int1
   } while (taken < count || given == resampled_.size());
 }
 
-}  // namespace qz::tools
+}  // namespace qz::audio

@@ -7,7 +7,7 @@
 #include <cstdio>
 #include <memory>
 
-namespace qz::dataset {
+namespace qz::arrays {
 namespace {
 
 constexpr char kSuffix[] = ".npy";
@@ -146,4 +146,4 @@ void WriteNpz(const std::string& path,
   }
 }
 
-}  // namespace qz::dataset
+}  // namespace qz::arrays

@@ -6,7 +6,7 @@
 #include <algorithm>
 #include <cstdint>
 
-namespace qz::tools {
+namespace qz::audio {
 namespace {
 
 // Programs that write to a pipe state a size near 2^31 or 2^32 for "until the end".
@@ -79,4 +79,4 @@ std::string FindTruncation(int fd) {
   return {};
 }
 
-}  // namespace qz::tools
+}  // namespace qz::audio

@@ -1,6 +1,6 @@
 #pragma once
 
-namespace qz::tools {
+namespace qz::programs {
 
 enum ExitCode {
   kFine = 0,
@@ -12,4 +12,4 @@ enum ExitCode {
   kNotRunnable = 4,
 };
 
-}  // namespace qz::tools
+}  // namespace qz::programs

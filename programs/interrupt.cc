@@ -7,7 +7,7 @@
 
 #include <cerrno>
 
-namespace qz::tools {
+namespace qz::programs {
 namespace {
 
 volatile sig_atomic_t interrupted = 0;
@@ -46,4 +46,4 @@ bool WaitReadable(int fd) {
   return false;
 }
 
-}  // namespace qz::tools
+}  // namespace qz::programs

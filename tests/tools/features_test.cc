@@ -9,7 +9,7 @@
 #include "qz_program.h"
 #include "trace_records.h"
 
-namespace qz::dataset {
+namespace qz::tools {
 namespace {
 
 using testing::HasSubstr;
@@ -30,7 +30,9 @@ class Features : public test::QzProgram {
     return WriteSound(name, SF_FORMAT_WAV | SF_FORMAT_PCM_16, 16000, 1, samples);
   }
 
-  NpyArray Array(const std::string& name) const { return ParseNpy(Contents(name), name); }
+  arrays::NpyArray Array(const std::string& name) const {
+    return arrays::ParseNpy(Contents(name), name);
+  }
 
   // The bytes of all frames that the linked nanoapp makes of a headerless file.
   std::string NanoappFeatures(const std::string& raw) {
@@ -52,8 +54,8 @@ class Features : public test::QzProgram {
 
 TEST_F(Features, AreTheNanoappsOwn) {
   ASSERT_EQ(Run("$QZ features " + Wav("a.wav", Sound()) + " -o " + Path("a.npy")), 0) << err_;
-  const NpyArray array = Array("a.npy");
-  EXPECT_EQ(array.type, ElementType::kUint16);
+  const arrays::NpyArray array = Array("a.npy");
+  EXPECT_EQ(array.type, arrays::ElementType::kUint16);
   EXPECT_EQ(array.shape, (std::vector<size_t>{598, 48}));
   EXPECT_TRUE(array.bytes == NanoappFeatures(WriteRaw("a.raw", Sound())));
 }
@@ -98,4 +100,4 @@ TEST_F(Features, OfWrongUseWriteNothing) {
 }
 
 }  // namespace
-}  // namespace qz::dataset
+}  // namespace qz::tools

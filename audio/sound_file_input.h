@@ -10,14 +10,14 @@
 #include "file_descriptor.h"
 #include "sample_converter.h"
 
-namespace qz::tools {
+namespace qz::audio {
 
 // A sound file in any container that libsndfile knows, told by its contents.
 class SoundFileInput final : public AudioInput {
  public:
   // `name` stands for the file in messages; `file` is seekable and stands at its beginning. Throws
   // AudioError.
-  SoundFileInput(std::string name, FileDescriptor file);
+  SoundFileInput(std::string name, programs::FileDescriptor file);
 
   size_t Read(int16_t* samples, size_t count) override;
   std::string Description() const override;
@@ -38,7 +38,7 @@ class SoundFileInput final : public AudioInput {
   bool LengthKnown() const { return info_.frames < SF_COUNT_MAX; }
 
   std::string name_;
-  FileDescriptor file_;
+  programs::FileDescriptor file_;
   SF_INFO info_ = {};
   std::unique_ptr<SNDFILE, CloseSoundFile> sound_file_;
   std::unique_ptr<SampleConverter> converter_;
@@ -49,4 +49,4 @@ class SoundFileInput final : public AudioInput {
   bool at_end_ = false;
 };
 
-}  // namespace qz::tools
+}  // namespace qz::audio

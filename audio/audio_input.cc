@@ -13,16 +13,17 @@
 #include "sound_file_input.h"
 #include "temporary_file.h"
 
-namespace qz::tools {
+namespace qz::audio {
 namespace {
 
 constexpr size_t kCopyBlockBytes = 65536;
 
 // Some containers need seeking, which a pipe can't do.
-FileDescriptor CopyToTemporary(const std::string& name, const FileDescriptor& source) {
-  FileDescriptor copy = OpenTemporaryFile();
+programs::FileDescriptor CopyToTemporary(const std::string& name,
+                                         const programs::FileDescriptor& source) {
+  programs::FileDescriptor copy = OpenTemporaryFile();
   std::vector<char> block(kCopyBlockBytes);
-  while (WaitReadable(source.get())) {
+  while (programs::WaitReadable(source.get())) {
     const ssize_t got = read(source.get(), block.data(), block.size());
     if (got < 0 && (errno == EINTR || errno == EAGAIN)) continue;
     if (got < 0) ThrowSystemError(name, "can't be read");
@@ -40,8 +41,8 @@ FileDescriptor CopyToTemporary(const std::string& name, const FileDescriptor& so
 std::unique_ptr<AudioInput> OpenAudio(const std::string& path, bool raw) {
   const bool standard_input = path == "-";
   const std::string name = standard_input ? "standard input" : path;
-  FileDescriptor file(standard_input ? dup(STDIN_FILENO)
-                                     : open(path.c_str(), O_RDONLY | O_CLOEXEC));
+  programs::FileDescriptor file(standard_input ? dup(STDIN_FILENO)
+                                               : open(path.c_str(), O_RDONLY | O_CLOEXEC));
   if (file.get() < 0) ThrowSystemError(name, "can't be opened");
   struct stat status = {};
   if (fstat(file.get(), &status) != 0) ThrowSystemError(name, "can't be examined");
@@ -57,4 +58,4 @@ std::unique_ptr<AudioInput> OpenAudio(const std::string& path, bool raw) {
   return std::make_unique<SoundFileInput>(name, std::move(file));
 }
 
-}  // namespace qz::tools
+}  // namespace qz::audio

@@ -2,7 +2,7 @@
 // each asks, a second one kills.
 #pragma once
 
-namespace qz::tools {
+namespace qz::programs {
 
 void CatchInterrupt();
 bool Interrupted();
@@ -10,4 +10,4 @@ bool Interrupted();
 // Waits until `fd` can be read or the interrupt comes; true in the first case.
 bool WaitReadable(int fd);
 
-}  // namespace qz::tools
+}  // namespace qz::programs

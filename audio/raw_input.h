@@ -6,13 +6,13 @@
 #include "audio_input.h"
 #include "file_descriptor.h"
 
-namespace qz::tools {
+namespace qz::audio {
 
 // Headerless 16-bit little-endian samples, handed on as they arrive.
 class RawInput final : public AudioInput {
  public:
   // `name` stands for the file in messages.
-  RawInput(std::string name, FileDescriptor file);
+  RawInput(std::string name, programs::FileDescriptor file);
 
   size_t Read(int16_t* samples, size_t count) override;
   std::string Description() const override;
@@ -20,10 +20,10 @@ class RawInput final : public AudioInput {
 
  private:
   std::string name_;
-  FileDescriptor file_;
+  programs::FileDescriptor file_;
   uint64_t expected_samples_ = 0;
   uint64_t bytes_read_ = 0;
   std::optional<uint8_t> half_sample_;  // the first byte of a sample whose second is still to come
 };
 
-}  // namespace qz::tools
+}  // namespace qz::audio

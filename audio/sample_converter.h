@@ -7,7 +7,7 @@
 #include <memory>
 #include <vector>
 
-namespace qz::tools {
+namespace qz::audio {
 
 // Turns frames of any rate and channel count into 16-bit mono samples at 16 kHz: channels are
 // averaged, other rates resampled (band-limited, linear phase, no delay), values rounded to the
@@ -35,4 +35,4 @@ class SampleConverter {
   std::vector<float> resampled_;
 };
 
-}  // namespace qz::tools
+}  // namespace qz::audio
