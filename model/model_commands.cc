@@ -6,6 +6,7 @@
 #include <string>
 
 #include "check_weights.h"
+#include "labels.h"
 #include "model_files.h"
 #include "standin_model.h"
 
@@ -15,6 +16,7 @@ namespace {
 constexpr char kUsage[] =
     "usage: qz-model-tool standin --seed N -o FILE    write a stand-in for trained tables\n"
     "       qz-model-tool check FILE                  refuse a packed model that is not sound\n"
+    "       qz-model-tool labels FILE                 refuse wrong labels of a model's outputs\n"
     "       qz-model-tool embed FILE -o HEADER        turn a sound packed model into a C++ header\n"
     "exit codes: 0 fine, 1 findings, 2 wrong usage, 3 a file that cannot be read or written\n";
 
@@ -89,10 +91,18 @@ int LoadSoundModel(const std::string& file, PackedModel& model) {
   return findings.empty() ? kFine : kFindings;
 }
 
+bool IsOneFile(const Arguments& arguments) {
+  return !arguments.file.empty() && arguments.output.empty() && arguments.seed.empty();
+}
+
+int CheckLabels(const Arguments& arguments) {
+  if (!IsOneFile(arguments)) return Usage("labels needs one FILE");
+  ReadLabels(arguments.file);
+  return kFine;
+}
+
 int Check(const Arguments& arguments) {
-  if (arguments.file.empty() || !arguments.output.empty() || !arguments.seed.empty()) {
-    return Usage("check needs one FILE");
-  }
+  if (!IsOneFile(arguments)) return Usage("check needs one FILE");
   PackedModel model;
   return LoadSoundModel(arguments.file, model);
 }
@@ -117,6 +127,7 @@ int RunModelCommand(const std::vector<std::string>& words) {
     if (!arguments.trouble.empty()) return Usage(arguments.trouble);
     if (command == "standin") return Standin(arguments);
     if (command == "check") return Check(arguments);
+    if (command == "labels") return CheckLabels(arguments);
     if (command == "embed") return Embed(arguments);
     return Usage(command.empty() ? "no subcommand" : "unknown subcommand '" + command + "'");
   } catch (const std::exception& error) {

@@ -17,6 +17,7 @@ enum ModelCommandResult {
 // least one line on stderr.
 //   standin --seed N -o FILE   writes the stand-in model of a seed
 //   check FILE                 checks a packed model
+//   labels FILE                reads the labels of a model's outputs
 //   embed FILE -o HEADER       checks it and writes it as a C++ header
 int RunModelCommand(const std::vector<std::string>& words);
 

@@ -50,6 +50,14 @@ def figures_of(labels, classes, scores, seconds):
     return np.array(rows)
 
 
+def check_folds(labels, classes, folds):
+    for fold in sorted(set(folds) - {0}):
+        for label in labels:
+            for where, chosen in (("in", folds == fold), ("outside", folds != fold)):
+                if label not in classes[chosen]:
+                    raise ValueError(f"no clip of {label} {where} fold {fold}, should be one or more")
+
+
 def print_table(labels, figures):
     print(f"{'class':16}  average precision  ROC AUC  recall")
     for name, row in zip([*labels, "mean"], [*figures, figures.mean(axis=0)]):
@@ -64,6 +72,7 @@ def main():
     clips = rows_of(folder / "features.tsv")
     classes = np.array([clip["class"] for clip in clips])
     folds = np.array([int(clip["fold"]) for clip in clips])
+    check_folds(labels, classes, folds)
     features = [np.load(folder / clip["file"]).astype(float) for clip in clips]
     # A clip of k frames of 25 ms, 10 ms apart, lasts k + 1.5 to k + 2.5 times 10 ms.
     seconds = np.array([(len(clip) + 2) / 100 for clip in features])
@@ -87,4 +96,5 @@ def main():
 try:
     main()
 except (KeyError, OSError, ValueError) as error:
-    sys.exit(f"compare-with-forest.py: {error}")
+    print(f"compare-with-forest.py: {sys.argv[1]}: {error}", file=sys.stderr)
+    sys.exit(3)

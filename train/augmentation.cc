@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstdlib>
 
 #include "clip_features.h"
 
@@ -33,6 +34,17 @@ std::vector<float> MakeNoise(double slope, double white, uint64_t seed) {
   const float gain = static_cast<float>(1 / std::sqrt(MeanSquare(noise)));
   for (float& sample : noise) sample *= gain;
   return noise;
+}
+
+// Before a clip's first loud sample, in samples: 50 ms.
+constexpr int kLongestLead = 800;
+
+// The first sample that is an eighth as loud as the loudest.
+int64_t Onset(const std::vector<int16_t>& samples) {
+  int peak = 0;
+  for (const int sample : samples) peak = std::max(peak, std::abs(sample));
+  const auto loud = [&](int sample) { return 8 * std::abs(sample) >= peak; };
+  return std::find_if(samples.begin(), samples.end(), loud) - samples.begin();
 }
 
 // Places between samples, in 2^-24.
@@ -100,20 +112,23 @@ void Augmentation::Make(size_t first, uint64_t seed, Eigen::Index sequence, Batc
   Mask(&random, sequence, features);
 }
 
-// Somewhere in the sequence, so that most of it can be heard; what lies before and behind it stays
+// Wholly in the sequence, where it fits, and else filling it; what lies before and behind it stays
 // silent.
 void Augmentation::AddClip(const Clip& clip, double gain, model::NumberGenerator* random,
                            Sound* sound) const {
   const auto length = static_cast<int64_t>(clip.samples.size());
-  const bool turned = Happens(recipe_.turn_share, random);
-  const int64_t begin =
-      turned ? static_cast<int64_t>(random->Uniform(0, static_cast<double>(length))) : 0;
+  const bool at_start = Happens(recipe_.start_share, random);
+  int64_t begin = 0;
+  if (at_start) {
+    begin = std::max<int64_t>(Onset(clip.samples) - random->Between(0, kLongestLead), 0);
+  } else if (Happens(recipe_.turn_share, random)) {
+    begin = static_cast<int64_t>(random->Uniform(0, static_cast<double>(length)));
+  }
   const bool other_speed = Happens(recipe_.speed_share, random);
   const double speed =
       other_speed ? std::exp(random->Uniform(-recipe_.speed_range, recipe_.speed_range)) : 1;
   const double room = static_cast<double>(samples_) - static_cast<double>(length) / speed;
-  const double slack = static_cast<double>(samples_) / 16;
-  const double offset = random->Uniform(std::min(room, 0.0) - slack, std::max(room, 0.0));
+  const double offset = at_start ? 0 : random->Uniform(std::min(room, 0.0), std::max(room, 0.0));
 
   const auto step = static_cast<int64_t>(speed * kPhaseOne);
   const float* end = sound->data() + sound->size();

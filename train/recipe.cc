@@ -42,6 +42,7 @@ constexpr Entry kEntries[] = {
     Real("sharpness", &Recipe::sharpness, 0.01, 100),
     Real("lowest_gain", &Recipe::lowest_gain, -90, 90),
     Real("highest_gain", &Recipe::highest_gain, -90, 90),
+    Real("start_share", &Recipe::start_share, 0, 1),
     Real("turn_share", &Recipe::turn_share, 0, 1),
     Real("speed_share", &Recipe::speed_share, 0, 1),
     Real("speed_range", &Recipe::speed_range, 0, 0.9),

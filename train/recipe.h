@@ -24,7 +24,8 @@ struct Recipe {
   // Sound. Shares are of sequences, levels in dB.
   double lowest_gain = -20;
   double highest_gain = 6;
-  double turn_share = 0.5;   // a clip begins anywhere in itself and goes round
+  double start_share = 0.3;  // a clip begins with its first loud sound, and the sequence with it
+  double turn_share = 0.5;   // of the others: a clip begins anywhere in itself and goes round
   double speed_share = 0.5;  // played faster or slower
   double speed_range = 0.15;
   double mix_share = 0.5;  // another clip is added

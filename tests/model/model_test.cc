@@ -119,13 +119,15 @@ TEST_F(ModelTool, NamesUnsoundAndUnreadableModelsAndWritesNothing) {
   EXPECT_EQ(Run("check " + folder_ + "absent.bin"), kFileTrouble);
   EXPECT_THAT(errors_, HasSubstr(folder_ + "absent.bin: cannot open: No such file"));
   EXPECT_EQ(Run("check " + folder_), kFileTrouble);
+  EXPECT_EQ(Run("labels " + model_), kFileTrouble);
+  EXPECT_THAT(errors_, HasSubstr(model_ + ": "));
   EXPECT_EQ(FilesInFolder(), 1);
 }
 
 TEST_F(ModelTool, ExplainsItsUsage) {
   for (const char* line :
-       {"", "melt", "check", "check a b", "check --fast", "embed a", "embed a -o", "standin -o a",
-        "standin --seed 1x -o a", "standin --seed 18446744073709551616 -o a",
+       {"", "melt", "check", "check a b", "check --fast", "labels", "embed a", "embed a -o",
+        "standin -o a", "standin --seed 1x -o a", "standin --seed 18446744073709551616 -o a",
         "standin --seed 1 --seed 2 -o a"}) {
     EXPECT_EQ(Run(line), kWrongUsage) << line;
     EXPECT_THAT(errors_, HasSubstr("usage: qz-model-tool")) << line;
