@@ -10,8 +10,8 @@ float HighestOf(const LayerPlan& plan) {
   return static_cast<float>(plan.highest() * plan.out_scale);
 }
 
-}  // namespace
-
+// Puts out a share of the values and makes the others larger; *mask is what they were multiplied
+// with.
 void DropOut(float share, uint64_t seed, Batch* x, Batch* mask) {
   model::NumberGenerator random(seed);
   mask->Resize(x->sequences, x->steps(), x->channels());
@@ -21,6 +21,8 @@ void DropOut(float share, uint64_t seed, Batch* x, Batch* mask) {
   }
   x->values.array() *= mask->values.array();
 }
+
+}  // namespace
 
 void MaskClamped(const Batch& out, float lowest, float highest, Batch* gradient) {
   const float* const values = out.values.data();

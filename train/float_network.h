@@ -42,10 +42,6 @@ class FloatNetwork {
   bool normalised_ = false;
 };
 
-// Puts out a share of the values and makes the others larger; *mask is what they were multiplied
-// with.
-void DropOut(float share, uint64_t seed, Batch* x, Batch* mask);
-
 // Clears the gradient where the output stands at a limit.
 void MaskClamped(const Batch& out, float lowest, float highest, Batch* gradient);
 

@@ -39,7 +39,7 @@ std::vector<Scores> ScoresOf(const QuantisedParameters& parameters,
   QuantisedNetwork network;
   std::vector<Scores> all;
   for (const Batch& features : judged) {
-    Scores scores = Highest(network.Forward(parameters, features, nullptr));
+    Scores scores = Highest(network.Forward(parameters, features));
     std::transform(scores.begin(), scores.end(), scores.begin(), DeviceScore);
     all.push_back(scores);
   }

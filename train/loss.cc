@@ -1,5 +1,6 @@
 #include "loss.h"
 
+#include <algorithm>
 #include <cmath>
 
 namespace qz::train {
@@ -7,6 +8,9 @@ namespace {
 
 // log(1 + e^x) without overflow.
 double SoftPlus(double x) { return x > 0 ? x + std::log1p(std::exp(-x)) : std::log1p(std::exp(x)); }
+
+// Beyond it a score of 8 bits changes no more.
+constexpr double kFarthestLogit = 6;
 
 double Logistic(double x) { return 1 / (1 + std::exp(-x)); }
 
@@ -48,10 +52,11 @@ double TeachingLoss(const Batch& logits, const Batch& taught, float divisor, Bat
   const double parts = static_cast<double>(divisor) * static_cast<double>(logits.steps());
   double loss = 0;
   for (Eigen::Index i = 0; i < logits.values.size(); ++i) {
-    const auto logit = static_cast<double>(logits.values.data()[i]);
-    const double target = Logistic(static_cast<double>(taught.values.data()[i]));
-    loss += target * SoftPlus(-logit) + (1 - target) * SoftPlus(logit);
-    dlogits->values.data()[i] = static_cast<float>((Logistic(logit) - target) / parts);
+    const auto taught_logit = static_cast<double>(taught.values.data()[i]);
+    const double away = static_cast<double>(logits.values.data()[i]) -
+                        std::clamp(taught_logit, -kFarthestLogit, kFarthestLogit);
+    loss += 0.5 * away * away;
+    dlogits->values.data()[i] = static_cast<float>(away / parts);
   }
   return loss / parts;
 }

@@ -20,8 +20,10 @@ struct LossShape {
 double ClipLoss(const Batch& logits, const Matrix& targets, const LossShape& shape, float divisor,
                 Batch* dlogits);
 
-// The cross-entropy of every window's logistic with that of the teachers' logit: sum over windows
-// and classes, divided by `divisor` and the windows of a sequence, and its gradient.
+// Half the square of every window's distance from the teachers' logit, which counts from -6 to 6:
+// sum over windows and classes, divided by `divisor` and the windows of a sequence, and its
+// gradient. The cross-entropy of the logistics would let sure answers, whose order matters, run
+// together.
 double TeachingLoss(const Batch& logits, const Batch& taught, float divisor, Batch* dlogits);
 
 }  // namespace qz::train

@@ -46,7 +46,7 @@ class Prover {
 
  private:
   void CompareWindows(const Batch& windows) {
-    network_.Forward(parameters_, windows, nullptr);
+    network_.Forward(parameters_, windows);
     for (int w = 0; w < windows.sequences; ++w) {
       const auto input = windows.values.middleRows(w * FramesFor(1), FramesFor(1));
       std::transform(input.data(), input.data() + input.size(), mobilenet_backend_input_ptr,

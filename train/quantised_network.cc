@@ -121,16 +121,12 @@ QuantisedParameters ParametersOf(const model::ModelArrays& arrays) {
   return parameters;
 }
 
-const Batch& QuantisedNetwork::Forward(const QuantisedParameters& parameters, const Batch& features,
-                                       const TrainingNoise* noise) {
+const Batch& QuantisedNetwork::Forward(const QuantisedParameters& parameters,
+                                       const Batch& features) {
   for (size_t i = 0; i < kLayers; ++i) {
     const LayerPlan& plan = kPlan[i];
     LayerTrace& trace = traces_[i];
     trace.in = i == 0 ? features : traces_[i - 1].Result(kPlan[i - 1]);
-    trace.dropout = Batch();
-    if (noise != nullptr && plan.dropout && noise->dropout > 0) {
-      DropOut(noise->dropout, noise->seed + i, &trace.in, &trace.dropout);
-    }
     if (plan.depthwise()) {
       DepthwiseForward(trace.in, WeightOf(parameters.integers, i), &trace.out);
     } else {
@@ -172,7 +168,6 @@ void QuantisedNetwork::Backward(const QuantisedParameters& parameters, const Bat
                           input_gradient);
     }
     WeightOf(*gradient, i).array() += dweight.array().rowwise() / parameters.weight_step[i].array();
-    if (i > 0 && trace.dropout.sequences > 0) dx.values.array() *= trace.dropout.values.array();
     std::swap(dy, dx);
   }
 }

@@ -31,8 +31,7 @@ QuantisedParameters ParametersOf(const model::ModelArrays& arrays);
 class QuantisedNetwork {
  public:
   // Features into the output of operator 18 less its zero point, in steps of 0.256.
-  const Batch& Forward(const QuantisedParameters& parameters, const Batch& features,
-                       const TrainingNoise* noise);
+  const Batch& Forward(const QuantisedParameters& parameters, const Batch& features);
   // `dlogits`: the loss's gradient by the real logits. Adds that by the real weights and biases to
   // *gradient.
   void Backward(const QuantisedParameters& parameters, const Batch& dlogits, Values* gradient);

@@ -14,9 +14,9 @@ struct Recipe {
   int windows = 4;          // network windows a sequence: 382 + 64 x (windows - 1) frames
   double rate = 0.003;      // of learning, at its highest; it falls to 0 along a cosine
   double tuning_rate = 0.001;
-  double decay = 0.02;     // of weights
-  double average = 0.995;  // memory of the weights' moving average, which becomes the model
-  double dropout = 0.2;
+  double decay = 0.02;      // of weights
+  double average = 0.995;   // memory of the weights' moving average, which becomes the model
+  double dropout = 0.2;     // of the teachers
   double smoothing = 0.02;  // of targets
   double positive_weight = 1.5;
   double sharpness = 3;  // of the soft maximum over windows

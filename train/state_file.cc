@@ -12,7 +12,7 @@ namespace {
 
 // To be raised with every change of the layout, or of what an epoch does. Numbers are as in memory,
 // little-endian; behind them stands their digest.
-constexpr char kMagic[] = "qz training state 1\n";
+constexpr char kMagic[] = "qz training state 2\n";
 
 // Of a hundred teachers and more.
 constexpr size_t kMostBytes = 128 << 20;

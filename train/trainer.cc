@@ -133,16 +133,16 @@ void Trainer::RunShard(const TrainingState& state, const QuantisedParameters* qu
     augmentation_.Make(order[place % order.size()], Mixed(Mixed(seed_, step), place),
                        static_cast<Eigen::Index>(s), &shard.features, &shard.targets);
   }
-  const TrainingNoise noise{static_cast<float>(recipe_.dropout),
-                            Mixed(Mixed(seed_ + 2, step), index)};
   const auto divisor = static_cast<float>(recipe_.batch);
   shard.gradient.assign(kParameters.learnt, 0);
   if (quantised == nullptr) {
+    const TrainingNoise noise{static_cast<float>(recipe_.dropout),
+                              Mixed(Mixed(seed_ + 2, step), index)};
     const Batch& logits = shard.float_network.Forward(state.values, shard.features, &noise);
     shard.loss = ClipLoss(logits, shard.targets, loss_shape_, divisor, &shard.dlogits);
     shard.float_network.Backward(state.values, shard.dlogits, &shard.gradient);
   } else {
-    Batch logits = shard.quantised_network.Forward(*quantised, shard.features, &noise);
+    Batch logits = shard.quantised_network.Forward(*quantised, shard.features);
     logits.values *= static_cast<float>(kLogitScale);
     Teach(state, &shard);
     shard.loss = TeachingLoss(logits, shard.taught, divisor, &shard.dlogits);

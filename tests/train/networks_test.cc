@@ -117,7 +117,7 @@ TEST(QuantisedNetwork, FollowsTheFloatNetworkForwardsAndBackwards) {
   FloatNetwork over_float;
   QuantisedNetwork device;
   const Batch logits = over_float.Forward(parameters, features, nullptr);
-  const Batch steps = device.Forward(quantised, features, nullptr);
+  const Batch steps = device.Forward(quantised, features);
   EXPECT_GT(Similarity(logits.values, steps.values), 0.9);
 
   const Batch dlogits = RandomGradient(logits);
