@@ -8,12 +8,12 @@
 #   elpa-redtick             rest.wav: 2012 unfa (freesound 154906), CC BY 3.0
 #   alsa-utils               the ALSA developers, GPL-2
 #   sound-theme-freedesktop  alarm-clock-elapsed.oga: Tim/corsica_s, CC BY-SA 3.0
-#                            phone-incoming-call.oga: Damien Sandras, GPL-2+
 set -euo pipefail
 
 [ $# -eq 1 ] || { echo "usage: make-demo-clip.sh OUT.wav" >&2; exit 2; }
 out=$1
 animal=/usr/share/scratch/Media/Sounds/Animal
+things=/usr/share/scratch/Media/Sounds/Effects
 human=/usr/share/scratch/Media/Sounds/Human
 clock=/usr/share/redtick/resources
 speech=/usr/share/sounds/alsa
@@ -27,9 +27,9 @@ sounds=(
   "baby_cry       2 0.3 4.0 $human/BabyCry.mp3"
   "speech         1 0.0 2.0 $speech/Rear_Left.wav"
   "rooster        1 0.0 4.0 $animal/Rooster.wav"
-  "cough          2 0.3 4.0 $human/Cough-male.wav"
+  "typing         1 0.0 4.0 $things/Typing.mp3"
   "person_sneeze  1 0.0 4.0 $human/Sneeze-female.wav"
-  "telephone      1 0.0 4.0 $effects/phone-incoming-call.oga"
+  "water          1 0.0 4.0 $things/WaterRunning.mp3"
   "clock_tick     7 0.0 2.0 $clock/rest.wav"
 )
 

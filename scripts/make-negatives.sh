@@ -2,7 +2,7 @@
 # Makes sounds that none of the classes answers to, out of what Debian packages offer: synthetic speech in
 # several voices (espeak-ng), the sounds and spoken words of a desktop (sound-theme-freedesktop), and recordings
 # of people, animals and things (scratch), as 16-bit mono WAV of 44.1 kHz. The same files each time. Left out is
-# what scripts/make-demo-clip.sh plays.
+# what scripts/make-demo-clip.sh plays, and what rings.
 # Usage: scripts/make-negatives.sh FOLDER
 set -euo pipefail
 
