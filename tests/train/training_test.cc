@@ -98,6 +98,7 @@ TEST(Trainer, LearnsTonesAndStillKnowsThemInInt8) {
   const TrainingState state = RunTo(123, &trainer);
   EXPECT_TRUE(trainer.Done(state));
   std::vector<Batch> features;
+  features.reserve(clips.size());
   for (const Clip& clip : clips) features.push_back(JudgedFeatures(clip.samples));
   const Figures by_float = FiguresOf(ScoresOf(state.teachers[0], features), clips);
   const Figures by_device =
