@@ -1,5 +1,7 @@
 // The command line of qz eval.
 
+#include <algorithm>
+#include <charconv>
 #include <map>
 #include <memory>
 
@@ -21,11 +23,12 @@ struct EvalLine {
 std::vector<EvalOptions::Part> ParseFoldModels(const std::vector<std::string>& words) {
   std::map<int, std::string> models;
   for (const std::string& word : words) {
-    const size_t equals = word.find('=');
+    const size_t equals = std::min(word.find('='), word.size());
+    const char* const end = word.data() + equals;
     int fold = 0;
-    const bool sound = equals != std::string::npos && equals + 1 < word.size() &&
-                       CLI::detail::lexical_cast(word.substr(0, equals), fold) && fold >= 1 &&
-                       fold <= dataset::kHighestFold;
+    const auto [stop, error] = std::from_chars(word.data(), end, fold);
+    const bool sound = error == std::errc() && stop == end && equals + 1 < word.size() &&
+                       fold >= 1 && fold <= dataset::kHighestFold;
     if (!sound) {
       throw CLI::ValidationError("--fold-model", word +
                                                      " should be FOLD=FILE, with a fold of 1 to " +
