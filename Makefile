@@ -13,7 +13,7 @@ SHOW_COMPARISONS := grep -E '^[0-9]+ comparisons: |not compared: |^[0-9]+ texts 
 # Parallelism is the builds' own; two set-ups at a time would fight over dpkg's lock.
 .NOTPARALLEL:
 
-.PHONY: help run test bench bench-peers counts footprint kernel-gains lint setup clean configure-host build-host \
+.PHONY: help run test bench bench-baselines counts footprint kernel-gains lint setup clean configure-host build-host \
         build-target build-trainer clip demo train cross-validate
 
 help:
@@ -23,7 +23,7 @@ help:
 	@echo 'make train DATA=FOLDER make the demonstration model again; compare with the committed one'
 	@echo 'make cross-validate DATA=FOLDER   measure its recipe on recordings that were not learnt from'
 	@echo 'make bench             time the kernels, the graphs and the whole program'
-	@echo 'make bench-peers       time ours and the libraries that others would use, in one table'
+	@echo 'make bench-baselines       time ours and the libraries that others would use, in one table'
 	@echo 'make counts            count instructions on this PC; compare with bench/instruction_counts.txt'
 	@echo 'make footprint         measure bytes, stack and instructions; compare with docs/footprint.md'
 	@echo 'make kernel-gains      what each kernel costs: its plain text, and those for some processors'
@@ -92,11 +92,11 @@ cross-validate: build-trainer
 	@scripts/setup-debian.sh figures
 	scripts/cross-validate.sh "$(DATA)"
 
-# The programs that time other libraries stand outside this tree, in the folder PEERS. UPDATE=1 rewrites
+# The programs that time other libraries stand outside this tree, in the folder BASELINES. UPDATE=1 rewrites
 # docs/performance.md.
-PEERS ?= ../shared/peers
-bench-peers: build-host
-	UPDATE=$(UPDATE) scripts/bench-peers.sh $(PEERS)
+BASELINES ?= ../shared/peers
+bench-baselines: build-host
+	UPDATE=$(UPDATE) scripts/bench-baselines.sh $(BASELINES)
 
 # UPDATE=1 commits to what is counted.
 counts: build-host

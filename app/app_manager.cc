@@ -1,6 +1,6 @@
-#include "app_manager.h"
+#include "app/app_manager.h"
 
-#include "log_prefix.h"
+#include "classifier/types/log_prefix.h"
 
 namespace tarn::contexthub::sound {
 

@@ -2,14 +2,14 @@
 
 #include <cstdint>
 
-#include "audio_classifier.h"
+#include "app/sound_service.h"
 #include "chre.h"
 #include "chre/fixed_size_vector.h"
-#include "confidence_event.h"
-#include "sound_detection_event_listener_interface.h"
-#include "sound_detection_message_type.h"
-#include "sound_detection_proto_helper.h"
-#include "sound_service.h"
+#include "classifier/audio_classifier.h"
+#include "classifier/types/confidence_event.h"
+#include "classifier/types/sound_detection_event_listener_interface.h"
+#include "proto/sound_detection_message_type.h"
+#include "proto/sound_detection_proto_helper.h"
 
 namespace tarn::contexthub::sound {
 

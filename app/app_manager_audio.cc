@@ -1,8 +1,8 @@
 // The AppManager's microphone: found, requested while a client needs it, released with the last
 // one.
 
-#include "app_manager.h"
-#include "log_prefix.h"
+#include "app/app_manager.h"
+#include "classifier/types/log_prefix.h"
 
 namespace tarn::contexthub::sound {
 namespace {

@@ -3,8 +3,8 @@
 #include <cstring>
 #include <utility>
 
-#include "app_manager.h"
-#include "log_prefix.h"
+#include "app/app_manager.h"
+#include "classifier/types/log_prefix.h"
 
 namespace tarn::contexthub::sound {
 namespace {

@@ -1,6 +1,6 @@
-#include "nanoapp.h"
+#include "app/nanoapp.h"
 
-#include "app_manager.h"
+#include "app/app_manager.h"
 #include "chre/singleton.h"
 
 using AppManagerSingleton = chre::Singleton<tarn::contexthub::sound::AppManager>;

@@ -1,10 +1,10 @@
-#include "sound_service.h"
+#include "app/sound_service.h"
 
 #include <cstring>
 
 #include "chre.h"
-#include "log_prefix.h"
-#include "sound_detection_proto_helper.h"
+#include "classifier/types/log_prefix.h"
+#include "proto/sound_detection_proto_helper.h"
 
 namespace tarn::contexthub::sound {
 namespace {

@@ -3,7 +3,7 @@
 #include <cstdint>
 
 #include "chre/dynamic_vector.h"
-#include "confidence_event.h"
+#include "classifier/types/confidence_event.h"
 
 namespace tarn::contexthub::sound {
 

@@ -1,4 +1,4 @@
-#include "npy_file.h"
+#include "arrays/npy_file.h"
 
 #include <algorithm>
 #include <string_view>
@@ -7,8 +7,8 @@ namespace qz::arrays {
 namespace {
 
 constexpr std::string_view kMagic = "\x93NUMPY";
-constexpr size_t kHeaderPlace = 10;  // behind the magic, two bytes of version and two of length
-constexpr size_t kAlignment = 64;    // of the values in the file
+constexpr size_t kHeaderOffset = 10;  // behind the magic, two bytes of version and two of length
+constexpr size_t kAlignment = 64;     // of the values in the file
 
 struct Type {
   ElementType type;
@@ -38,7 +38,7 @@ class HeaderParser {
       if (!Take(',') && !Sees('}')) Fail("a comma or }");
     }
     SkipSpace();
-    if (place_ != text_.size()) Fail("nothing more");
+    if (location_ != text_.size()) Fail("nothing more");
     if (descr_.empty() || order_.empty() || !has_shape_) {
       throw NpyError(name_ + ": the header should give descr, fortran_order and shape");
     }
@@ -50,20 +50,21 @@ class HeaderParser {
 
  private:
   [[noreturn]] void Fail(const char* right) const {
-    throw NpyError(name_ + ": byte " + std::to_string(kHeaderPlace + place_) +
+    throw NpyError(name_ + ": byte " + std::to_string(kHeaderOffset + location_) +
                    " of the header should be " + right);
   }
 
   void SkipSpace() {
-    while (place_ < text_.size() && (text_[place_] == ' ' || text_[place_] == '\n')) ++place_;
+    while (location_ < text_.size() && (text_[location_] == ' ' || text_[location_] == '\n'))
+      ++location_;
   }
   bool Sees(char wanted) {
     SkipSpace();
-    return place_ < text_.size() && text_[place_] == wanted;
+    return location_ < text_.size() && text_[location_] == wanted;
   }
   bool Take(char wanted) {
     const bool there = Sees(wanted);
-    place_ += there;
+    location_ += there;
     return there;
   }
   void Expect(char wanted) {
@@ -88,12 +89,12 @@ class HeaderParser {
   std::string QuotedText() {
     const char quote = Sees('"') ? '"' : '\'';
     Expect(quote);
-    const size_t begin = place_;
-    while (place_ < text_.size() && text_[place_] != quote) {
-      if (text_[place_] < ' ' || text_[place_] > '~') Fail("printable");
-      ++place_;
+    const size_t begin = location_;
+    while (location_ < text_.size() && text_[location_] != quote) {
+      if (text_[location_] < ' ' || text_[location_] > '~') Fail("printable");
+      ++location_;
     }
-    std::string quoted(text_.substr(begin, place_ - begin));
+    std::string quoted(text_.substr(begin, location_ - begin));
     Expect(quote);
     return quoted;
   }
@@ -102,8 +103,8 @@ class HeaderParser {
     SkipSpace();
     for (const char* word : {"True", "False"}) {
       const size_t length = std::strlen(word);
-      if (text_.substr(place_, length) == word) {
-        place_ += length;
+      if (text_.substr(location_, length) == word) {
+        location_ += length;
         return word;
       }
     }
@@ -122,21 +123,22 @@ class HeaderParser {
 
   size_t Number() {
     SkipSpace();
-    const size_t begin = place_;
+    const size_t begin = location_;
     size_t number = 0;
-    for (; place_ < text_.size() && text_[place_] >= '0' && text_[place_] <= '9'; ++place_) {
+    for (; location_ < text_.size() && text_[location_] >= '0' && text_[location_] <= '9';
+         ++location_) {
       if (__builtin_mul_overflow(number, size_t{10}, &number) ||
-          __builtin_add_overflow(number, static_cast<size_t>(text_[place_] - '0'), &number)) {
+          __builtin_add_overflow(number, static_cast<size_t>(text_[location_] - '0'), &number)) {
         Fail("of a smaller number");
       }
     }
-    if (place_ == begin) Fail("a digit");
+    if (location_ == begin) Fail("a digit");
     return number;
   }
 
   std::string_view text_;
   const std::string& name_;
-  size_t place_ = 0;
+  size_t location_ = 0;
   std::string descr_;
   std::string order_;
   bool has_shape_ = false;
@@ -181,7 +183,7 @@ std::string ShapeText(const std::vector<size_t>& shape) {
 std::string NpyBytes(const NpyArray& array) {
   std::string header = "{'descr': '" + std::string(TypeOf(array.type).descr) +
                        "', 'fortran_order': False, 'shape': " + ShapeText(array.shape) + ", }";
-  const size_t end = kHeaderPlace + header.size() + 1;  // the line end
+  const size_t end = kHeaderOffset + header.size() + 1;  // the line end
   header.append((kAlignment - end % kAlignment) % kAlignment, ' ');
   header += '\n';
   std::string bytes(kMagic);
@@ -190,7 +192,7 @@ std::string NpyBytes(const NpyArray& array) {
 }
 
 NpyArray ParseNpy(const std::string& bytes, const std::string& name) {
-  if (bytes.compare(0, kMagic.size(), kMagic) != 0 || bytes.size() < kHeaderPlace) {
+  if (bytes.compare(0, kMagic.size(), kMagic) != 0 || bytes.size() < kHeaderOffset) {
     throw NpyError(name + ": not an array in NumPy's format");
   }
   const auto byte = [&bytes](size_t i) { return static_cast<uint8_t>(bytes[i]); };
@@ -199,17 +201,17 @@ NpyArray ParseNpy(const std::string& bytes, const std::string& name) {
                    std::to_string(byte(7)) + " of NumPy's format, should be 1.0");
   }
   const size_t length = byte(8) + size_t{256} * byte(9);
-  if (bytes.size() - kHeaderPlace < length) {
+  if (bytes.size() - kHeaderOffset < length) {
     throw NpyError(name + ": cut off: its header has " + std::to_string(length) +
-                   " bytes, there are " + std::to_string(bytes.size() - kHeaderPlace));
+                   " bytes, there are " + std::to_string(bytes.size() - kHeaderOffset));
   }
-  HeaderParser header(std::string_view(bytes).substr(kHeaderPlace, length), name);
+  HeaderParser header(std::string_view(bytes).substr(kHeaderOffset, length), name);
   header.Run();
   if (header.fortran_order()) {
     throw NpyError(name + ": its values are in Fortran order, should be in C order");
   }
   NpyArray array{ParseType(header.descr(), name), header.shape(),
-                 bytes.substr(kHeaderPlace + length)};
+                 bytes.substr(kHeaderOffset + length)};
   CheckSize(array, name);
   return array;
 }

@@ -1,4 +1,4 @@
-#include "npz_file.h"
+#include "arrays/npz_file.h"
 
 #include <unzip.h>
 #include <zip.h>
@@ -57,9 +57,9 @@ class NpzReader {
       }
       unz_file_info64 info;
       const std::string name = NextName(&info);
-      const std::string place = path_ + ": " + name;
-      if (!arrays.emplace(name, ParseNpy(Unpack(info, place), place)).second) {
-        throw NpyError(place + ": is there twice");
+      const std::string location = path_ + ": " + name;
+      if (!arrays.emplace(name, ParseNpy(Unpack(info, location), location)).second) {
+        throw NpyError(location + ": is there twice");
       }
     }
     if (result != UNZ_END_OF_LIST_OF_FILE) {
@@ -84,14 +84,14 @@ class NpzReader {
   }
 
   // The bytes of the current file, whose check sum must be right.
-  std::string Unpack(const unz_file_info64& info, const std::string& place) {
+  std::string Unpack(const unz_file_info64& info, const std::string& location) {
     if (info.uncompressed_size > limits_.file_bytes) {
-      throw NpyError(place + ": has " + std::to_string(info.uncompressed_size) +
+      throw NpyError(location + ": has " + std::to_string(info.uncompressed_size) +
                      " bytes, should have at most " + std::to_string(limits_.file_bytes));
     }
     const bool encrypted = (info.flag & 1) != 0;
     if (encrypted || (info.compression_method != 0 && info.compression_method != Z_DEFLATED)) {
-      throw NpyError(place + ": is encrypted or packed by another method, should be stored or " +
+      throw NpyError(location + ": is encrypted or packed by another method, should be stored or " +
                      "deflated");
     }
     std::string bytes(static_cast<size_t>(info.uncompressed_size), '\0');
@@ -101,7 +101,7 @@ class NpzReader {
     const int closed = unzCloseCurrentFile(archive_.get());
     if (opened != UNZ_OK || got < 0 || static_cast<size_t>(got) != bytes.size() ||
         closed != UNZ_OK) {
-      throw NpyError(place + ": damaged: can't be unpacked, or its check sum is wrong");
+      throw NpyError(location + ": damaged: can't be unpacked, or its check sum is wrong");
     }
     return bytes;
   }

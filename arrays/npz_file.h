@@ -7,7 +7,7 @@
 #include <utility>
 #include <vector>
 
-#include "npy_file.h"
+#include "arrays/npy_file.h"
 
 namespace qz::arrays {
 

@@ -1,4 +1,4 @@
-#include "audio_input.h"
+#include "audio/audio_input.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -7,11 +7,11 @@
 #include <cerrno>
 #include <vector>
 
-#include "file_descriptor.h"
-#include "interrupt.h"
-#include "raw_input.h"
-#include "sound_file_input.h"
-#include "temporary_file.h"
+#include "audio/raw_input.h"
+#include "audio/sound_file_input.h"
+#include "audio/temporary_file.h"
+#include "base/file_descriptor.h"
+#include "base/interrupt.h"
 
 namespace qz::audio {
 namespace {
@@ -19,11 +19,10 @@ namespace {
 constexpr size_t kCopyBlockBytes = 65536;
 
 // Some containers need seeking, which a pipe can't do.
-programs::FileDescriptor CopyToTemporary(const std::string& name,
-                                         const programs::FileDescriptor& source) {
-  programs::FileDescriptor copy = OpenTemporaryFile();
+base::FileDescriptor CopyToTemporary(const std::string& name, const base::FileDescriptor& source) {
+  base::FileDescriptor copy = OpenTemporaryFile();
   std::vector<char> block(kCopyBlockBytes);
-  while (programs::WaitReadable(source.get())) {
+  while (base::WaitReadable(source.get())) {
     const ssize_t got = read(source.get(), block.data(), block.size());
     if (got < 0 && (errno == EINTR || errno == EAGAIN)) continue;
     if (got < 0) ThrowSystemError(name, "can't be read");
@@ -41,8 +40,8 @@ programs::FileDescriptor CopyToTemporary(const std::string& name,
 std::unique_ptr<AudioInput> OpenAudio(const std::string& path, bool raw) {
   const bool standard_input = path == "-";
   const std::string name = standard_input ? "standard input" : path;
-  programs::FileDescriptor file(standard_input ? dup(STDIN_FILENO)
-                                               : open(path.c_str(), O_RDONLY | O_CLOEXEC));
+  base::FileDescriptor file(standard_input ? dup(STDIN_FILENO)
+                                           : open(path.c_str(), O_RDONLY | O_CLOEXEC));
   if (file.get() < 0) ThrowSystemError(name, "can't be opened");
   struct stat status = {};
   if (fstat(file.get(), &status) != 0) ThrowSystemError(name, "can't be examined");

@@ -1,4 +1,4 @@
-#include "raw_input.h"
+#include "audio/raw_input.h"
 
 #include <sys/stat.h>
 #include <unistd.h>
@@ -8,11 +8,11 @@
 #include <cstring>
 #include <utility>
 
-#include "interrupt.h"
+#include "base/interrupt.h"
 
 namespace qz::audio {
 
-RawInput::RawInput(std::string name, programs::FileDescriptor file)
+RawInput::RawInput(std::string name, base::FileDescriptor file)
     : name_(std::move(name)), file_(std::move(file)) {
   struct stat status = {};
   if (fstat(file_.get(), &status) == 0 && S_ISREG(status.st_mode)) {
@@ -26,7 +26,7 @@ std::string RawInput::Description() const {
 
 size_t RawInput::Read(int16_t* samples, size_t count) {
   auto* bytes = reinterpret_cast<uint8_t*>(samples);
-  while (programs::WaitReadable(file_.get())) {
+  while (base::WaitReadable(file_.get())) {
     size_t held = 0;
     if (half_sample_) bytes[held++] = *half_sample_;
     const ssize_t got = read(file_.get(), bytes + held, count * sizeof(int16_t) - held);

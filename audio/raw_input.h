@@ -3,8 +3,8 @@
 #include <optional>
 #include <string>
 
-#include "audio_input.h"
-#include "file_descriptor.h"
+#include "audio/audio_input.h"
+#include "base/file_descriptor.h"
 
 namespace qz::audio {
 
@@ -12,7 +12,7 @@ namespace qz::audio {
 class RawInput final : public AudioInput {
  public:
   // `name` stands for the file in messages.
-  RawInput(std::string name, programs::FileDescriptor file);
+  RawInput(std::string name, base::FileDescriptor file);
 
   size_t Read(int16_t* samples, size_t count) override;
   std::string Description() const override;
@@ -20,7 +20,7 @@ class RawInput final : public AudioInput {
 
  private:
   std::string name_;
-  programs::FileDescriptor file_;
+  base::FileDescriptor file_;
   uint64_t expected_samples_ = 0;
   uint64_t bytes_read_ = 0;
   std::optional<uint8_t> half_sample_;  // the first byte of a sample whose second is still to come

@@ -1,10 +1,10 @@
-#include "sample_converter.h"
+#include "audio/sample_converter.h"
 
 #include <algorithm>
 #include <stdexcept>
 #include <string>
 
-#include "audio_input.h"
+#include "audio/audio_input.h"
 
 namespace qz::audio {
 namespace {
@@ -12,7 +12,7 @@ namespace {
 constexpr size_t kResampledBlock = 8192;
 
 // Far beyond what saturates, near enough that no sum of the resampler overflows.
-constexpr double kLargestMono = 1e6;
+constexpr double kMaxMono = 1e6;
 
 // Floats of this size have no bits below 1: adding it rounds what is below 2^22 to the nearest
 // number, ties to even.
@@ -55,8 +55,8 @@ void SampleConverter::Convert(const float* frames, size_t count, std::vector<int
   for (size_t i = 0; i < count; ++i) {
     double sum = 0;
     for (size_t channel = 0; channel < channels_; ++channel) sum += frames[i * channels_ + channel];
-    mono_[i] = static_cast<float>(
-        std::clamp(sum / static_cast<double>(channels_), -kLargestMono, kLargestMono));
+    mono_[i] =
+        static_cast<float>(std::clamp(sum / static_cast<double>(channels_), -kMaxMono, kMaxMono));
   }
   if (resampler_ == nullptr) {
     Quantise(mono_.data(), count, samples);

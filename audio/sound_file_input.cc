@@ -1,17 +1,17 @@
-#include "sound_file_input.h"
+#include "audio/sound_file_input.h"
 
 #include <algorithm>
 #include <cmath>
 #include <utility>
 
-#include "truncation.h"
+#include "audio/truncation.h"
 
 namespace qz::audio {
 namespace {
 
-constexpr int kLowestRateHz = 1000;
-constexpr int kHighestRateHz = 768000;
-constexpr int kMostChannels = 64;
+constexpr int kMinRateHz = 1000;
+constexpr int kMaxRateHz = 768000;
+constexpr int kMaxChannels = 64;
 constexpr size_t kBlockFrames = 4096;
 
 // libsndfile's messages may begin with "Error : ", span lines and end in a dot.
@@ -25,7 +25,7 @@ std::string OneLine(std::string text) {
 
 }  // namespace
 
-SoundFileInput::SoundFileInput(std::string name, programs::FileDescriptor file)
+SoundFileInput::SoundFileInput(std::string name, base::FileDescriptor file)
     : name_(std::move(name)), file_(std::move(file)) {
   sound_file_.reset(sf_open_fd(file_.get(), SFM_READ, &info_, SF_FALSE));
   if (sound_file_ == nullptr) {
@@ -39,14 +39,14 @@ SoundFileInput::SoundFileInput(std::string name, programs::FileDescriptor file)
 }
 
 void SoundFileInput::CheckHeader() const {
-  if (info_.samplerate < kLowestRateHz || info_.samplerate > kHighestRateHz) {
+  if (info_.samplerate < kMinRateHz || info_.samplerate > kMaxRateHz) {
     throw AudioError(name_ + ": the sample rate is " + std::to_string(info_.samplerate) +
-                     " Hz, should be " + std::to_string(kLowestRateHz) + " to " +
-                     std::to_string(kHighestRateHz));
+                     " Hz, should be " + std::to_string(kMinRateHz) + " to " +
+                     std::to_string(kMaxRateHz));
   }
-  if (info_.channels < 1 || info_.channels > kMostChannels) {
+  if (info_.channels < 1 || info_.channels > kMaxChannels) {
     throw AudioError(name_ + ": " + std::to_string(info_.channels) + " channels, should be 1 to " +
-                     std::to_string(kMostChannels));
+                     std::to_string(kMaxChannels));
   }
   if (info_.frames == 0) throw AudioError(name_ + ": no audio: 0 frames");
 }
@@ -130,14 +130,14 @@ void SoundFileInput::CheckFinite(size_t frames) const {
 }
 
 void SoundFileInput::CheckEnd() const {
-  const std::string place = name_ + ": frame " + std::to_string(frames_decoded_) + ": ";
+  const std::string location = name_ + ": frame " + std::to_string(frames_decoded_) + ": ";
   if (sf_error(sound_file_.get()) != SF_ERR_NO_ERROR) {
-    throw AudioError(place + "corrupt: " + OneLine(sf_strerror(sound_file_.get())));
+    throw AudioError(location + "corrupt: " + OneLine(sf_strerror(sound_file_.get())));
   }
   // The length of an MPEG stream is an estimate.
   const bool exact = LengthKnown() && (info_.format & SF_FORMAT_TYPEMASK) != SF_FORMAT_MPEG;
   if (frames_decoded_ == 0 || (exact && frames_decoded_ < info_.frames)) {
-    throw AudioError(place + "truncated or corrupt: the audio ends here, the header promises " +
+    throw AudioError(location + "truncated or corrupt: the audio ends here, the header promises " +
                      std::to_string(info_.frames) + " frames");
   }
 }

@@ -6,9 +6,9 @@
 #include <string>
 #include <vector>
 
-#include "audio_input.h"
-#include "file_descriptor.h"
-#include "sample_converter.h"
+#include "audio/audio_input.h"
+#include "audio/sample_converter.h"
+#include "base/file_descriptor.h"
 
 namespace qz::audio {
 
@@ -17,7 +17,7 @@ class SoundFileInput final : public AudioInput {
  public:
   // `name` stands for the file in messages; `file` is seekable and stands at its beginning. Throws
   // AudioError.
-  SoundFileInput(std::string name, programs::FileDescriptor file);
+  SoundFileInput(std::string name, base::FileDescriptor file);
 
   size_t Read(int16_t* samples, size_t count) override;
   std::string Description() const override;
@@ -38,7 +38,7 @@ class SoundFileInput final : public AudioInput {
   bool LengthKnown() const { return info_.frames < SF_COUNT_MAX; }
 
   std::string name_;
-  programs::FileDescriptor file_;
+  base::FileDescriptor file_;
   SF_INFO info_ = {};
   std::unique_ptr<SNDFILE, CloseSoundFile> sound_file_;
   std::unique_ptr<SampleConverter> converter_;

@@ -1,4 +1,4 @@
-#include "temporary_file.h"
+#include "audio/temporary_file.h"
 
 #include <fcntl.h>
 #include <unistd.h>
@@ -7,7 +7,7 @@
 #include <cstdlib>
 #include <cstring>
 
-#include "audio_input.h"
+#include "audio/audio_input.h"
 
 namespace qz::audio {
 namespace {
@@ -18,18 +18,18 @@ std::string TemporaryFolder() {
 }
 
 // Fills in the last letters of the path.
-programs::FileDescriptor MakeFile(std::string* path) {
+base::FileDescriptor MakeFile(std::string* path) {
   *path = TemporaryFolder() + "/qz-XXXXXX";
-  programs::FileDescriptor file(mkostemp(path->data(), O_CLOEXEC));
+  base::FileDescriptor file(mkostemp(path->data(), O_CLOEXEC));
   if (file.get() < 0) ThrowSystemError(*path, "can't make a temporary file");
   return file;
 }
 
 }  // namespace
 
-programs::FileDescriptor OpenTemporaryFile() {
+base::FileDescriptor OpenTemporaryFile() {
   std::string path;
-  programs::FileDescriptor file = MakeFile(&path);
+  base::FileDescriptor file = MakeFile(&path);
   unlink(path.c_str());
   return file;
 }
@@ -38,7 +38,7 @@ NamedTemporaryFile::NamedTemporaryFile() : descriptor_(MakeFile(&path_)) {}
 
 NamedTemporaryFile::~NamedTemporaryFile() { unlink(path_.c_str()); }
 
-void WriteToTemporaryFile(const programs::FileDescriptor& file, const void* bytes, size_t count) {
+void WriteToTemporaryFile(const base::FileDescriptor& file, const void* bytes, size_t count) {
   const char* rest = static_cast<const char*>(bytes);
   while (count > 0) {
     const ssize_t written = write(file.get(), rest, count);

@@ -4,14 +4,14 @@
 #include <cstddef>
 #include <string>
 
-#include "file_descriptor.h"
+#include "base/file_descriptor.h"
 
 namespace qz::audio {
 
 // All throw AudioError.
 
 // A file without a name: nothing of it stays, however the program ends.
-programs::FileDescriptor OpenTemporaryFile();
+base::FileDescriptor OpenTemporaryFile();
 
 // A file with a name, for other programs; removed with the object.
 class NamedTemporaryFile {
@@ -22,14 +22,14 @@ class NamedTemporaryFile {
   ~NamedTemporaryFile();
 
   const std::string& path() const { return path_; }
-  const programs::FileDescriptor& descriptor() const { return descriptor_; }
+  const base::FileDescriptor& descriptor() const { return descriptor_; }
 
  private:
   std::string path_;
-  programs::FileDescriptor descriptor_;
+  base::FileDescriptor descriptor_;
 };
 
-void WriteToTemporaryFile(const programs::FileDescriptor& file, const void* bytes, size_t count);
+void WriteToTemporaryFile(const base::FileDescriptor& file, const void* bytes, size_t count);
 
 // Throws AudioError with what errno says: "NAME: WHAT: Reason".
 [[noreturn]] void ThrowSystemError(const std::string& name, const char* what);

@@ -6,7 +6,7 @@
 #include <cstring>
 #include <random>
 
-#include "audio_frontend.h"
+#include "frontend/audio_frontend.h"
 
 namespace {
 

@@ -14,15 +14,15 @@
 #include <cstring>
 #include <vector>
 
-#include "audio_classifier.h"
-#include "audio_frontend.h"
+#include "app/nanoapp.h"
+#include "app/sound_service.h"
 #include "chre.h"
 #include "chrex.h"
-#include "instruction_mark.h"
-#include "mobilenet_backend.h"
-#include "nanoapp.h"
-#include "random.h"
-#include "sound_service.h"
+#include "classifier/audio_classifier.h"
+#include "frontend/audio_frontend.h"
+#include "network/mobilenet_backend.h"
+#include "tests/support/instruction_mark.h"
+#include "tests/support/random.h"
 
 namespace {
 

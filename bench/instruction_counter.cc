@@ -14,7 +14,7 @@
 #include <map>
 #include <string>
 
-#include "instruction_mark.h"
+#include "tests/support/instruction_mark.h"
 
 // What the emulator offers to its plug-ins, version 1 of that interface, as far as it is used here.
 extern "C" {

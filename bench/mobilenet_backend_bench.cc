@@ -7,8 +7,8 @@
 #include <cstring>
 #include <vector>
 
-#include "mobilenet_backend.h"
-#include "random.h"
+#include "network/mobilenet_backend.h"
+#include "tests/support/random.h"
 
 namespace {
 

@@ -4,9 +4,9 @@
 
 #include <cstdint>
 
-#include "audio_classifier.h"
-#include "hub.h"
-#include "random.h"
+#include "classifier/audio_classifier.h"
+#include "hub/hub.h"
+#include "tests/support/random.h"
 
 namespace {
 

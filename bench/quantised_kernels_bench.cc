@@ -7,8 +7,8 @@
 #include <cstring>
 #include <vector>
 
-#include "quantised_kernels.h"
-#include "random.h"
+#include "kernels/quantised/quantised_kernels.h"
+#include "tests/support/random.h"
 
 namespace {
 

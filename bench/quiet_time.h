@@ -46,7 +46,7 @@ double Microseconds(long repetitions, const Work& work) {
 template <typename Work>
 Times Measure(const Work& work) {
   const double warm_us = FromEnvironment("BENCH_WARM_MS", 150) * 1e3;
-  const double most_us = FromEnvironment("BENCH_MAX_MS", 1500) * 1e3;
+  const double max_us = FromEnvironment("BENCH_MAX_MS", 1500) * 1e3;
   const auto wanted = static_cast<size_t>(FromEnvironment("BENCH_SAMPLES", 1500));
   double shortest = Microseconds(1, work);
   for (double spent = shortest; spent < warm_us;) {
@@ -57,7 +57,7 @@ Times Measure(const Work& work) {
   const long repetitions = std::max(1L, static_cast<long>(20 / std::max(shortest, 0.01)) + 1);
 
   std::vector<double> samples;
-  for (double spent = 0; samples.size() < 30 || (samples.size() < wanted && spent < most_us);) {
+  for (double spent = 0; samples.size() < 30 || (samples.size() < wanted && spent < max_us);) {
     const double time = Microseconds(repetitions, work);
     samples.push_back(time / static_cast<double>(repetitions));
     spent += time;

@@ -5,8 +5,8 @@
 #include <random>
 #include <vector>
 
-#include "audio_frontend_tables.h"
-#include "signal_kernels.h"
+#include "frontend/audio_frontend_tables.h"
+#include "kernels/signal/signal_kernels.h"
 
 namespace {
 

@@ -1,13 +1,13 @@
-#include "audio_classifier.h"
+#include "classifier/audio_classifier.h"
 
 #include <algorithm>
 #include <cstring>
 
-#include "audio_frontend.h"
 #include "chre.h"
 #include "chrex.h"
-#include "log_prefix.h"
-#include "mobilenet_backend.h"
+#include "classifier/types/log_prefix.h"
+#include "frontend/audio_frontend.h"
+#include "network/mobilenet_backend.h"
 
 namespace tarn::contexthub::sound {
 namespace {
@@ -72,8 +72,8 @@ void AudioClassifier::Classify(const int16_t* samples, ConfidenceEvent* confiden
   const uint64_t timestamp_ns = chreGetTime() + static_cast<uint64_t>(host_offset_ns);
 
   for (const int16_t* chunk = samples; chunk != samples + kPassSamples; chunk += kHopSamples) {
-    const uint32_t room = kFrameSamples - sample_count;
-    const uint32_t taken = room < kHopSamples ? room : kHopSamples;
+    const uint32_t space = kFrameSamples - sample_count;
+    const uint32_t taken = space < kHopSamples ? space : kHopSamples;
     AppendSamples(chunk, taken);
     if (sample_count == kFrameSamples) {
       ProcessFrame(pass_confidences);

@@ -2,9 +2,9 @@
 
 #include <cstdint>
 
-#include "circular_buffer_lite.h"
-#include "confidence_event.h"
-#include "sound_detection_event_listener_interface.h"
+#include "classifier/circular_buffer_lite.h"
+#include "classifier/types/confidence_event.h"
+#include "classifier/types/sound_detection_event_listener_interface.h"
 
 namespace tarn::contexthub::sound {
 

@@ -1,11 +1,11 @@
 // The second half of AudioClassifier: from the network's scores to detections and the periodic
 // report.
 
-#include "audio_classifier.h"
 #include "chre.h"
-#include "detection_tables.h"
-#include "log_prefix.h"
-#include "mobilenet_backend.h"
+#include "classifier/audio_classifier.h"
+#include "classifier/detection_tables.h"
+#include "classifier/types/log_prefix.h"
+#include "network/mobilenet_backend.h"
 
 namespace tarn::contexthub::sound {
 namespace {

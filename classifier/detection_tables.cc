@@ -1,4 +1,4 @@
-#include "detection_tables.h"
+#include "classifier/detection_tables.h"
 
 namespace tarn::contexthub::sound {
 

@@ -2,7 +2,7 @@
 
 #include <cstdint>
 
-#include "confidence_event.h"
+#include "classifier/types/confidence_event.h"
 
 namespace tarn::contexthub::sound {
 

@@ -1,8 +1,8 @@
-#include "clip.h"
+#include "dataset/clip.h"
 
 #include <memory>
 
-#include "audio_input.h"
+#include "audio/audio_input.h"
 
 namespace qz::dataset {
 

@@ -1,9 +1,9 @@
-#include "clip_features.h"
+#include "dataset/clip_features.h"
 
 #include <algorithm>
 #include <mutex>
 
-#include "audio_frontend.h"
+#include "frontend/audio_frontend.h"
 
 namespace qz::dataset {
 namespace {

@@ -1,4 +1,4 @@
-#include "manifest.h"
+#include "dataset/manifest.h"
 
 #include <cerrno>
 #include <cstring>
@@ -29,19 +29,19 @@ int FoldOf(const std::string& text) {
 }
 
 Recording ParseLine(const std::string& line, const std::filesystem::path& folder,
-                    const std::string& place) {
+                    const std::string& location) {
   const std::vector<std::string> fields = Fields(line);
   if (fields.size() != 3) {
-    throw ManifestError(place + std::to_string(fields.size()) +
+    throw ManifestError(location + std::to_string(fields.size()) +
                         " fields, should be 3 between tabs: file, class, fold");
   }
-  if (fields[0] == "-") throw ManifestError(place + "the file is -, should be a file's name");
-  if (fields[0].empty()) throw ManifestError(place + "no file name before the first tab");
-  if (fields[1].empty()) throw ManifestError(place + "no class between the tabs");
+  if (fields[0] == "-") throw ManifestError(location + "the file is -, should be a file's name");
+  if (fields[0].empty()) throw ManifestError(location + "no file name before the first tab");
+  if (fields[1].empty()) throw ManifestError(location + "no class between the tabs");
   const int fold = FoldOf(fields[2]);
   if (fold < 0) {
-    throw ManifestError(place + "the fold is '" + fields[2] + "', should be 0 to " +
-                        std::to_string(kHighestFold));
+    throw ManifestError(location + "the fold is '" + fields[2] + "', should be 0 to " +
+                        std::to_string(kMaxFold));
   }
   return {(folder / fields[0]).string(), fields[1], fold};
 }
@@ -59,17 +59,18 @@ std::vector<Recording> ReadManifest(const std::string& path) {
   for (int number = 1; std::getline(file, line); ++number) {
     if (!line.empty() && line.back() == '\r') line.pop_back();
     if (line.empty() || line[0] == '#') continue;
-    const std::string place = path + ": line " + std::to_string(number) + ": ";
+    const std::string location = path + ": line " + std::to_string(number) + ": ";
     if (headed) {
-      recordings.push_back(ParseLine(line, folder, place));
+      recordings.push_back(ParseLine(line, folder, location));
       // In two folds it would be learnt from and measured.
       const auto [before, is_new] = lines.emplace(recordings.back().file, number);
       if (!is_new) {
-        throw ManifestError(place + recordings.back().file + " stands in line " +
+        throw ManifestError(location + recordings.back().file + " stands in line " +
                             std::to_string(before->second) + " already");
       }
     } else if (line != kHeader) {
-      throw ManifestError(place + "the first line should be: file, class, fold, with tabs between");
+      throw ManifestError(location +
+                          "the first line should be: file, class, fold, with tabs between");
     }
     headed = true;
   }

@@ -20,7 +20,7 @@ class ManifestError : public std::runtime_error {
   using std::runtime_error::runtime_error;
 };
 
-constexpr int kHighestFold = 99;
+constexpr int kMaxFold = 99;
 
 // The recordings in the order of their lines. Empty lines and lines that begin with # say nothing;
 // names of files that are not absolute start from the manifest's own folder. Throws ManifestError.

@@ -1,4 +1,4 @@
-#include "clip_scores.h"
+#include "evaluation/clip_scores.h"
 
 #include <algorithm>
 #include <cstring>
@@ -6,10 +6,10 @@
 #include <string>
 #include <utility>
 
-#include "clip_features.h"
-#include "digest.h"
-#include "loaded_network.h"
-#include "operators.h"
+#include "base/digest.h"
+#include "dataset/clip_features.h"
+#include "network/loaded/loaded_network.h"
+#include "network/operators.h"
 
 namespace qz::evaluation {
 namespace {
@@ -29,7 +29,7 @@ size_t FramesAround(size_t samples) {
 void RunOperators(uint64_t* digest) {
   for (const Operator& each : kOperators) {
     each.run();
-    *digest = model::Digest(BytesOf(each.output), each.output.Bytes(), *digest);
+    *digest = base::Digest(BytesOf(each.output), each.output.Bytes(), *digest);
   }
 }
 
@@ -55,7 +55,7 @@ ClipScores ScoreFeatures(const model::PackedModel& model, const std::vector<uint
   }
   std::copy(model.begin(), model.end(), loaded_tables);
   ClipScores scores;
-  scores.digest = model::kDigestOfNothing;
+  scores.digest = base::kEmptyDigest;
   for (size_t first = 0; first + kInput.Bytes() <= features.size();
        first += kFramesBetweenRuns * kInput.channels) {
     std::transform(features.data() + first, features.data() + first + kInput.Bytes(),
@@ -63,7 +63,7 @@ ClipScores ScoreFeatures(const model::PackedModel& model, const std::vector<uint
     RunOperators(&scores.digest);
     Scores& run = scores.runs.emplace_back();
     std::memcpy(run.data(), mobilenet_backend_output_ptr, sizeof run);
-    for (size_t i = 0; i < run.size(); ++i) scores.highest[i] = std::max(scores.highest[i], run[i]);
+    for (size_t i = 0; i < run.size(); ++i) scores.max[i] = std::max(scores.max[i], run[i]);
   }
   return scores;
 }

@@ -8,7 +8,7 @@
 #include <cstdint>
 #include <vector>
 
-#include "reference_network.h"
+#include "model/reference_network.h"
 
 namespace qz::evaluation {
 
@@ -17,7 +17,7 @@ using Scores = std::array<float, model::kClasses>;
 
 struct ClipScores {
   std::vector<Scores> runs;  // of each network run, in order
-  Scores highest{};          // over the runs
+  Scores max{};              // over the runs
   // 64-bit FNV-1a over all bytes that the 21 operators put out, run by run; the floats of the last
   // operator little-endian.
   uint64_t digest = 0;

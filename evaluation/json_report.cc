@@ -1,6 +1,6 @@
 #include <nlohmann/json.hpp>
 
-#include "report.h"
+#include "evaluation/report.h"
 
 namespace qz::evaluation {
 namespace {
@@ -13,17 +13,17 @@ void Append(const Merit& merit, Json* object) {
   (*object)["recall"] = merit.recall;
 }
 
-Json FiguresObject(const Figures& figures, const model::Labels& labels) {
-  Json object = {{"clips", figures.clips},
-                 {"audio_s", static_cast<double>(figures.samples) / kSampleRateHz},
-                 {"false_alarms_allowed", figures.allowed_false_alarms},
+Json MetricsObject(const Metrics& metrics, const model::Labels& labels) {
+  Json object = {{"clips", metrics.clips},
+                 {"audio_s", static_cast<double>(metrics.samples) / kSampleRateHz},
+                 {"false_alarms_allowed", metrics.allowed_false_alarms},
                  {"classes", Json::array()}};
   for (size_t i = 0; i < labels.size(); ++i) {
-    Json of_class = {{"class", labels[i].class_name}, {"clips", figures.classes[i].clips}};
-    Append(figures.classes[i].merit, &of_class);
+    Json of_class = {{"class", labels[i].class_name}, {"clips", metrics.classes[i].clips}};
+    Append(metrics.classes[i].merit, &of_class);
     object["classes"].push_back(std::move(of_class));
   }
-  Append(figures.mean, &object["mean"]);
+  Append(metrics.mean, &object["mean"]);
   return object;
 }
 
@@ -31,13 +31,13 @@ Json FiguresObject(const Figures& figures, const model::Labels& labels) {
 
 std::string JsonReport(const Evaluation& evaluation) {
   Json parts = Json::array();
-  std::vector<Figures> figures;
+  std::vector<Metrics> metrics;
   for (const Part& part : evaluation.parts) {
     Json object = {{"model", part.model}, {"fold", nullptr}};
     if (part.fold > 0) object["fold"] = part.fold;
-    object.update(FiguresObject(part.figures, evaluation.labels));
+    object.update(MetricsObject(part.metrics, evaluation.labels));
     parts.push_back(std::move(object));
-    figures.push_back(part.figures);
+    metrics.push_back(part.metrics);
   }
   Json confusion;
   for (size_t i = 0; i < evaluation.labels.size(); ++i) {
@@ -49,7 +49,7 @@ std::string JsonReport(const Evaluation& evaluation) {
   }
   Json object = {
       {"type", "evaluation"}, {"manifest", evaluation.manifest}, {"skipped", evaluation.skipped}};
-  object.update(FiguresObject(MeanOverFolds(figures), evaluation.labels));
+  object.update(MetricsObject(MeanOverFolds(metrics), evaluation.labels));
   object["parts"] = std::move(parts);
   object["confusion"] = std::move(confusion);
   // Names of files and classes are whatever bytes they are.

@@ -1,4 +1,4 @@
-#include "ranking.h"
+#include "evaluation/ranking.h"
 
 #include <algorithm>
 #include <cmath>
@@ -25,8 +25,8 @@ std::vector<Tie> Ranked(const std::vector<float>& scores, const std::vector<bool
   }
   std::vector<std::pair<float, bool>> clips;
   for (size_t i = 0; i < scores.size(); ++i) {
-    const float lowest = -std::numeric_limits<float>::infinity();
-    clips.emplace_back(std::isnan(scores[i]) ? lowest : scores[i], positives[i]);
+    const float min = -std::numeric_limits<float>::infinity();
+    clips.emplace_back(std::isnan(scores[i]) ? min : scores[i], positives[i]);
   }
   std::sort(clips.begin(), clips.end(), [](const auto& a, const auto& b) { return a > b; });
 
@@ -71,14 +71,14 @@ std::optional<double> RocAuc(const std::vector<float>& scores, const std::vector
 std::optional<double> RecallAtFalseAlarms(const std::vector<float>& scores,
                                           const std::vector<bool>& positives, size_t allowed) {
   Tie above;
-  double heard = 0;
+  double detected = 0;
   for (const Tie& tie : Ranked(scores, positives)) {
     above.positives += tie.positives;
     above.negatives += tie.negatives;
-    if (above.negatives <= static_cast<double>(allowed)) heard = above.positives;
+    if (above.negatives <= static_cast<double>(allowed)) detected = above.positives;
   }
   if (above.positives == 0) return std::nullopt;
-  return heard / above.positives;
+  return detected / above.positives;
 }
 
 }  // namespace qz::evaluation

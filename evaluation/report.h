@@ -5,8 +5,8 @@
 #include <string>
 #include <vector>
 
-#include "figures.h"
-#include "labels.h"
+#include "evaluation/metrics.h"
+#include "model/labels.h"
 
 namespace qz::evaluation {
 
@@ -14,7 +14,7 @@ namespace qz::evaluation {
 struct Part {
   std::string model;
   int fold = 0;  // 0: the folds of the clips don't matter
-  Figures figures;
+  Metrics metrics;
 };
 
 struct Evaluation {

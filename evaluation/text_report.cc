@@ -1,7 +1,7 @@
 #include <algorithm>
 #include <cstdio>
 
-#include "report.h"
+#include "evaluation/report.h"
 
 namespace qz::evaluation {
 namespace {
@@ -50,21 +50,21 @@ std::string FoldTable(const std::vector<Part>& parts) {
       {"fold", "clips", "average precision", "ROC AUC", "recall", "false alarms allowed"}};
   for (const Part& part : parts) {
     Row& row =
-        rows.emplace_back(Row{std::to_string(part.fold), std::to_string(part.figures.clips)});
-    Append(part.figures.mean, &row);
-    row.push_back(std::to_string(part.figures.allowed_false_alarms));
+        rows.emplace_back(Row{std::to_string(part.fold), std::to_string(part.metrics.clips)});
+    Append(part.metrics.mean, &row);
+    row.push_back(std::to_string(part.metrics.allowed_false_alarms));
   }
   return Table(rows);
 }
 
-std::string ClassTable(const model::Labels& labels, const Figures& figures) {
+std::string ClassTable(const model::Labels& labels, const Metrics& metrics) {
   std::vector<Row> rows = {{"class", "clips", "average precision", "ROC AUC", "recall"}};
   for (size_t i = 0; i < labels.size(); ++i) {
-    const ClassFigures& of_class = figures.classes[i];
+    const ClassMetrics& of_class = metrics.classes[i];
     Row& row = rows.emplace_back(Row{labels[i].name, std::to_string(of_class.clips)});
     Append(of_class.merit, &row);
   }
-  Append(figures.mean, &rows.emplace_back(Row{"mean", ""}));
+  Append(metrics.mean, &rows.emplace_back(Row{"mean", ""}));
   return Table(rows);
 }
 
@@ -86,9 +86,9 @@ std::string ConfusionTable(const model::Labels& labels, const Confusion& confusi
 
 std::string TextReport(const Evaluation& evaluation) {
   const bool crossed = evaluation.parts.size() > 1;
-  std::vector<Figures> figures;
-  for (const Part& part : evaluation.parts) figures.push_back(part.figures);
-  const Figures mean = MeanOverFolds(figures);
+  std::vector<Metrics> metrics;
+  for (const Part& part : evaluation.parts) metrics.push_back(part.metrics);
+  const Metrics mean = MeanOverFolds(metrics);
 
   std::string text = evaluation.manifest + ": " + std::to_string(mean.clips) + " clips, " +
                      Fixed(static_cast<double>(mean.samples) / kSampleRateHz, 1) + " s of audio";

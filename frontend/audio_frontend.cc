@@ -1,11 +1,11 @@
-#include "audio_frontend.h"
+#include "frontend/audio_frontend.h"
 
 #include <cstring>
 #include <new>
 
-#include "audio_frontend_tables.h"
-#include "real_fft.h"
-#include "signal_kernels.h"
+#include "frontend/audio_frontend_tables.h"
+#include "frontend/real_fft.h"
+#include "kernels/signal/signal_kernels.h"
 
 namespace {
 

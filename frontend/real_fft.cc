@@ -1,10 +1,10 @@
-#include "real_fft.h"
+#include "frontend/real_fft.h"
 
 #include <cstring>
 
-#include "audio_frontend.h"
-#include "audio_frontend_tables.h"
-#include "signal_kernels.h"
+#include "frontend/audio_frontend.h"
+#include "frontend/audio_frontend_tables.h"
+#include "kernels/signal/signal_kernels.h"
 
 namespace qz::frontend {
 namespace {

@@ -1,6 +1,6 @@
-#include "clients.h"
+#include "hub/clients.h"
 
-#include "messages.h"
+#include "hub/messages.h"
 
 namespace qz::hub {
 namespace {

@@ -3,7 +3,7 @@
 #include <cstdint>
 #include <vector>
 
-#include "hub.h"
+#include "hub/hub.h"
 
 namespace qz::hub {
 

@@ -1,4 +1,4 @@
-#include "heap.h"
+#include "hub/heap.h"
 
 #include <cstdio>
 #include <cstdlib>
@@ -25,10 +25,10 @@ void* Heap::Allocate(uint32_t bytes) {
 void Heap::Free(void* block) {
   if (block == nullptr) return;
   if (live_.erase(block) == 0) {
-    char sentence[96];
-    std::snprintf(sentence, sizeof(sentence), "chreHeapFree of %p, %s", block,
+    char message[96];
+    std::snprintf(message, sizeof(message), "chreHeapFree of %p, %s", block,
                   freed_.count(block) != 0 ? "which was freed before" : "which is no block");
-    faults_.emplace_back(sentence);
+    faults_.emplace_back(message);
     return;
   }
   freed_.insert(block);

@@ -1,4 +1,4 @@
-#include "hub.h"
+#include "hub/hub.h"
 
 #include <chrono>
 #include <thread>
@@ -191,11 +191,11 @@ bool Hub::SendMessageToHost(void* message, size_t size, uint32_t type, uint16_t 
   return Post(fault_plan_.refuse_host_messages, {deliver, release});
 }
 
-bool Hub::Post(bool refused, Parcel parcel) {
+bool Hub::Post(bool refused, QueuedEvent queued) {
   if (refused) {
-    parcel.release();
+    queued.release();
   } else {
-    queue_.push_back(std::move(parcel));
+    queue_.push_back(std::move(queued));
   }
   return !refused;
 }
@@ -231,10 +231,10 @@ bool Hub::RequestClockRate(uint32_t request) {
 
 void Hub::RunQueue() {
   while (!queue_.empty()) {
-    const Parcel parcel = std::move(queue_.front());
+    const QueuedEvent queued = std::move(queue_.front());
     queue_.pop_front();
-    parcel.deliver();
-    parcel.release();
+    queued.deliver();
+    queued.release();
   }
 }
 

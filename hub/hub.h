@@ -9,9 +9,9 @@
 #include <string>
 #include <vector>
 
-#include "heap.h"
-#include "nanoapp_module.h"
-#include "runtime.h"
+#include "hub/heap.h"
+#include "hub/nanoapp_module.h"
+#include "hub/runtime/runtime.h"
 
 namespace qz::hub {
 
@@ -123,13 +123,13 @@ class Hub final : public Runtime {
   bool RequestClockRate(uint32_t request) override;
 
  private:
-  struct Parcel {
+  struct QueuedEvent {
     std::function<void()> deliver;
     std::function<void()> release;  // runs once, delivered or not
   };
 
   // Queues the parcel, or releases it at once if it is refused; false then.
-  bool Post(bool refused, Parcel parcel);
+  bool Post(bool refused, QueuedEvent queued);
   void RunQueue();
   bool StartNanoapp(const chreNslNanoappInfo& info, const std::string& name, LoadFailure* failure);
   void CallNanoapp(uint32_t sender, uint16_t type, const void* data);
@@ -138,7 +138,7 @@ class Hub final : public Runtime {
   Heap heap_;
   std::unique_ptr<NanoappModule> module_;
   const chreNslNanoappInfo* nanoapp_ = nullptr;
-  std::deque<Parcel> queue_;
+  std::deque<QueuedEvent> queue_;
   std::vector<AudioSource> sources_;
   std::map<uint16_t, MessageHandler> endpoints_;
   std::map<uint32_t, EventHandler> clients_;

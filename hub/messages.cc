@@ -1,4 +1,4 @@
-#include "messages.h"
+#include "hub/messages.h"
 
 #include "sound_detection.pb.h"
 

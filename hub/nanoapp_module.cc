@@ -1,4 +1,4 @@
-#include "nanoapp_module.h"
+#include "hub/nanoapp_module.h"
 
 #include <dlfcn.h>
 

@@ -14,7 +14,7 @@ struct LoadFailure {
     kRefused,      // its record is not one that this hub runs
   };
   Kind kind = Kind::kNotLoadable;
-  std::string sentence;  // names the file, the value found and what would have been right
+  std::string message;  // names the file, the value found and what would have been right
 };
 
 // Empty when the hub runs modules with this record, else a sentence that names the first wrong

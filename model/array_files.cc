@@ -1,10 +1,10 @@
-#include "array_files.h"
+#include "model/array_files.h"
 
 #include <map>
 #include <utility>
 #include <vector>
 
-#include "npz_file.h"
+#include "arrays/npz_file.h"
 
 namespace qz::model {
 namespace {

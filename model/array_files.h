@@ -3,7 +3,7 @@
 
 #include <string>
 
-#include "packing.h"
+#include "model/packing.h"
 
 namespace qz::model {
 

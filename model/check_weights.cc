@@ -1,4 +1,4 @@
-#include "check_weights.h"
+#include "model/check_weights.h"
 
 #include <cmath>
 #include <cstdio>
@@ -29,11 +29,11 @@ class TableChecker {
     return (depthwise() ? "channel " : "column ") + std::to_string(column);
   }
 
-  void Report(const char* what, int column, const std::string& place, const std::string& value,
+  void Report(const char* what, int column, const std::string& location, const std::string& value,
               const std::string& right) {
     findings_.push_back(std::string(table_.name) + (depthwise() ? ", group " : ", block ") +
                         std::to_string(column / table_.BlockColumns()) + ": the " + what + " of " +
-                        ColumnName(column) + place + " is " + value + "; " + right + ".");
+                        ColumnName(column) + location + " is " + value + "; " + right + ".");
   }
 
   // Calls visit(weight, place) for every weight of a column.
@@ -41,20 +41,20 @@ class TableChecker {
   void ForEachWeight(int column, Visit visit) const {
     for (int tap = 0; tap < table_.taps; ++tap) {
       for (int input = 0; input < table_.inputs; ++input) {
-        std::string place;
-        if (table_.taps > 1) place += ", tap " + std::to_string(tap);
-        if (!depthwise()) place += ", input channel " + std::to_string(input);
-        visit(int{Load<int8_t>(model_, table_.WeightOffset(tap, input, column))}, place);
+        std::string location;
+        if (table_.taps > 1) location += ", tap " + std::to_string(tap);
+        if (!depthwise()) location += ", input channel " + std::to_string(input);
+        visit(int{Load<int8_t>(model_, table_.WeightOffset(tap, input, column))}, location);
       }
     }
   }
 
   void CheckColumn(int column) {
     int sum = 0;
-    ForEachWeight(column, [&](int weight, const std::string& place) {
+    ForEachWeight(column, [&](int weight, const std::string& location) {
       sum += weight;
       if (weight == -128) {
-        Report("weight", column, place, "-128", "weights lie from -127 to 127");
+        Report("weight", column, location, "-128", "weights lie from -127 to 127");
       }
     });
     if (depthwise()) CheckDepthwiseBias(column, 128 * sum);
@@ -83,8 +83,8 @@ class TableChecker {
                               std::to_string(table_.outputs) + " are real) and holds 0";
     const int32_t bias = Load<int32_t>(model_, table_.BiasOffset(column));
     if (bias != 0) Report("bias", column, "", std::to_string(bias), right);
-    ForEachWeight(column, [&](int weight, const std::string& place) {
-      if (weight != 0) Report("weight", column, place, std::to_string(weight), right);
+    ForEachWeight(column, [&](int weight, const std::string& location) {
+      if (weight != 0) Report("weight", column, location, std::to_string(weight), right);
     });
     if (!table_.HasScales()) return;
     // By its bits: padding is zero bytes, and a negative zero is not.

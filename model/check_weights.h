@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "weight_layout.h"
+#include "model/weight_layout.h"
 
 namespace qz::model {
 

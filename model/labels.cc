@@ -1,4 +1,4 @@
-#include "labels.h"
+#include "model/labels.h"
 
 #include <cerrno>
 #include <cstring>
@@ -23,22 +23,23 @@ bool IsCategory(const std::string& text) {
          text.find_first_not_of("0123456789") == std::string::npos && std::stoi(text) <= 255;
 }
 
-Label ParseLine(std::string line, int output, const std::string& place) {
+Label ParseLine(std::string line, int output, const std::string& location) {
   const std::string number = TakeField(&line);
   if (number != std::to_string(output)) {
-    throw std::runtime_error(place + "the output is '" + number + "', should be " +
+    throw std::runtime_error(location + "the output is '" + number + "', should be " +
                              std::to_string(output));
   }
   const std::string category = TakeField(&line);
   if (!IsCategory(category)) {
-    throw std::runtime_error(place + "the category is '" + category + "', should be 0 to 255");
+    throw std::runtime_error(location + "the category is '" + category + "', should be 0 to 255");
   }
   Label label;
   label.category = std::stoi(category);
   label.class_name = TakeField(&line);
   label.name = line;
   if (label.class_name.empty() || label.name.empty()) {
-    throw std::runtime_error(place + "should be: output, category, class, name, with tabs between");
+    throw std::runtime_error(location +
+                             "should be: output, category, class, name, with tabs between");
   }
   return label;
 }
@@ -52,18 +53,18 @@ Labels ReadLabels(const std::string& path) {
   int lines = 0;
   for (std::string line; std::getline(file, line); ++lines) {
     if (!line.empty() && line.back() == '\r') line.pop_back();
-    const std::string place = path + ": line " + std::to_string(lines + 1) + ": ";
+    const std::string location = path + ": line " + std::to_string(lines + 1) + ": ";
     if (lines == 0 && line != kHeader) {
-      throw std::runtime_error(place +
+      throw std::runtime_error(location +
                                "should be: output, category, class, name, with tabs between");
     }
-    if (lines > kClasses) throw std::runtime_error(place + "should not be: there are 5 outputs");
+    if (lines > kClasses) throw std::runtime_error(location + "should not be: there are 5 outputs");
     if (lines == 0) continue;
-    const Label label = ParseLine(line, lines - 1, place);
+    const Label label = ParseLine(line, lines - 1, location);
     for (int i = 0; i < lines - 1; ++i) {
       const Label& before = labels[static_cast<size_t>(i)];
       if (before.class_name == label.class_name || before.category == label.category) {
-        throw std::runtime_error(place + "class or category stands in the line of output " +
+        throw std::runtime_error(location + "class or category stands in the line of output " +
                                  std::to_string(i) + " already");
       }
     }

@@ -5,7 +5,7 @@
 #include <array>
 #include <string>
 
-#include "reference_network.h"
+#include "model/reference_network.h"
 
 namespace qz::model {
 

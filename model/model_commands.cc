@@ -1,20 +1,20 @@
-#include "model_commands.h"
+#include "model/model_commands.h"
 
 #include <cstdint>
 #include <cstdio>
 #include <exception>
 #include <string>
 
-#include "check_weights.h"
-#include "labels.h"
-#include "model_files.h"
-#include "standin_model.h"
+#include "model/check_weights.h"
+#include "model/labels.h"
+#include "model/model_files.h"
+#include "model/synthetic_model.h"
 
 namespace qz::model {
 namespace {
 
 constexpr char kUsage[] =
-    "usage: qz-model-tool standin --seed N -o FILE    write a stand-in for trained tables\n"
+    "usage: qz-model-tool synthetic --seed N -o FILE    write a stand-in for trained tables\n"
     "       qz-model-tool check FILE                  refuse a packed model that is not sound\n"
     "       qz-model-tool labels FILE                 refuse wrong labels of a model's outputs\n"
     "       qz-model-tool embed FILE -o HEADER        turn a sound packed model into a C++ header\n"
@@ -69,26 +69,26 @@ bool ParseSeed(const std::string& text, uint64_t& seed) {
   return !text.empty();
 }
 
-int Standin(const Arguments& arguments) {
+int Synthetic(const Arguments& arguments) {
   uint64_t seed;
   if (arguments.output.empty() || !arguments.file.empty()) {
-    return Usage("standin needs --seed N and -o FILE");
+    return Usage("synthetic needs --seed N and -o FILE");
   }
   if (!ParseSeed(arguments.seed, seed)) {
     return Usage("--seed needs an integer from 0 to 18446744073709551615, not '" + arguments.seed +
                  "'");
   }
-  const PackedModel model = MakeStandinModel(seed);
+  const PackedModel model = MakeSyntheticModel(seed);
   WriteWholeFile(arguments.output, std::string(model.begin(), model.end()));
-  return kFine;
+  return kSuccess;
 }
 
 // Reads and checks; prints the findings.
-int LoadSoundModel(const std::string& file, PackedModel& model) {
+int LoadValidModel(const std::string& file, PackedModel& model) {
   model = ReadModelFile(file);
   const std::vector<std::string> findings = CheckWeights(model);
   std::fputs(FormatFindings(file, findings).c_str(), stderr);
-  return findings.empty() ? kFine : kFindings;
+  return findings.empty() ? kSuccess : kFindings;
 }
 
 bool IsOneFile(const Arguments& arguments) {
@@ -98,13 +98,13 @@ bool IsOneFile(const Arguments& arguments) {
 int CheckLabels(const Arguments& arguments) {
   if (!IsOneFile(arguments)) return Usage("labels needs one FILE");
   ReadLabels(arguments.file);
-  return kFine;
+  return kSuccess;
 }
 
 int Check(const Arguments& arguments) {
   if (!IsOneFile(arguments)) return Usage("check needs one FILE");
   PackedModel model;
-  return LoadSoundModel(arguments.file, model);
+  return LoadValidModel(arguments.file, model);
 }
 
 int Embed(const Arguments& arguments) {
@@ -112,10 +112,10 @@ int Embed(const Arguments& arguments) {
     return Usage("embed needs one FILE and -o HEADER");
   }
   PackedModel model;
-  const int result = LoadSoundModel(arguments.file, model);
-  if (result != kFine) return result;
+  const int result = LoadValidModel(arguments.file, model);
+  if (result != kSuccess) return result;
   WriteWholeFile(arguments.output, TablesHeader(model));
-  return kFine;
+  return kSuccess;
 }
 
 }  // namespace
@@ -125,7 +125,7 @@ int RunModelCommand(const std::vector<std::string>& words) {
   const Arguments arguments = Parse(words);
   try {
     if (!arguments.trouble.empty()) return Usage(arguments.trouble);
-    if (command == "standin") return Standin(arguments);
+    if (command == "synthetic") return Synthetic(arguments);
     if (command == "check") return Check(arguments);
     if (command == "labels") return CheckLabels(arguments);
     if (command == "embed") return Embed(arguments);

@@ -7,7 +7,7 @@
 namespace qz::model {
 
 enum ModelCommandResult {
-  kFine = 0,
+  kSuccess = 0,
   kFindings = 1,     // the packed model is not sound; the findings stand on stderr
   kWrongUsage = 2,   // the command line was not understood
   kFileTrouble = 3,  // a file cannot be read or written; a file to be written stays as it was

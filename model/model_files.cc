@@ -1,4 +1,4 @@
-#include "model_files.h"
+#include "model/model_files.h"
 
 #include <cerrno>
 #include <cstdio>
@@ -7,7 +7,7 @@
 #include <memory>
 #include <stdexcept>
 
-#include "check_weights.h"
+#include "model/check_weights.h"
 
 namespace qz::model {
 namespace {
@@ -39,7 +39,7 @@ std::vector<uint8_t> ReadWholeFile(const std::string& path, size_t most) {
   return bytes;
 }
 
-PackedModel ReadSoundModel(const std::string& path) {
+PackedModel ReadValidModel(const std::string& path) {
   PackedModel model = ReadModelFile(path);
   const std::vector<std::string> findings = CheckWeights(model);
   if (findings.empty()) return model;

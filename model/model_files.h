@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "weight_layout.h"
+#include "model/weight_layout.h"
 
 namespace qz::model {
 
@@ -18,7 +18,7 @@ inline PackedModel ReadModelFile(const std::string& path) { return ReadWholeFile
 
 // A packed model that the checker passes. Throws std::runtime_error: why it can't be read, or the
 // first finding and how many more there are.
-PackedModel ReadSoundModel(const std::string& path);
+PackedModel ReadValidModel(const std::string& path);
 
 // Throws as WriteWholeFile would, before there is anything to write.
 void CheckWritable(const std::string& path);

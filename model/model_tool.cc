@@ -1,6 +1,6 @@
 // qz-model-tool: makes, checks and embeds packed models.
 
-#include "model_commands.h"
+#include "model/model_commands.h"
 
 int main(int argc, char** argv) {
   return qz::model::RunModelCommand({argv + (argc > 0 ? 1 : 0), argv + argc});

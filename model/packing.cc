@@ -1,10 +1,10 @@
-#include "packing.h"
+#include "model/packing.h"
 
 #include <cmath>
 #include <limits>
 #include <utility>
 
-#include "check_weights.h"
+#include "model/check_weights.h"
 
 namespace qz::model {
 namespace {
@@ -14,7 +14,7 @@ std::string Headline(const std::vector<std::string>& findings) {
   return findings.front() + (more > 0 ? " And " + std::to_string(more) + " more findings." : "");
 }
 
-std::string Place(const TableLayout& table, const char* array, const std::string& index) {
+std::string Location(const TableLayout& table, const char* array, const std::string& index) {
   return std::string(table.name) + "." + array + "[" + index + "]";
 }
 
@@ -25,11 +25,11 @@ size_t WeightIndex(const TableLayout& table, int tap, int input, int output) {
 }
 
 // The place of a weight, with the indices that the array has.
-std::string WeightPlace(const TableLayout& table, int tap, int input, int output) {
+std::string WeightLocation(const TableLayout& table, int tap, int input, int output) {
   std::string index;
   if (table.taps > 1) index += std::to_string(tap) + ",";
   if (table.kind != TableKind::kDepthwise) index += std::to_string(input) + ",";
-  return Place(table, "weight", index + std::to_string(output));
+  return Location(table, "weight", index + std::to_string(output));
 }
 
 bool FitsInt32(int64_t value) {
@@ -74,7 +74,7 @@ class TablePacker {
       for (int input = 0; input < table_.inputs; ++input) {
         const int8_t weight = arrays_.weight[WeightIndex(table_, tap, input, output)];
         if (weight == -128) {
-          Report(WeightPlace(table_, tap, input, output) + " is -128",
+          Report(WeightLocation(table_, tap, input, output) + " is -128",
                  "weights lie from -127 to 127");
         }
         Store(model_, table_.WeightOffset(tap, input, output), weight);
@@ -87,7 +87,7 @@ class TablePacker {
   void PackBias(int output, int sum) {
     const int32_t bias = arrays_.bias[static_cast<size_t>(output)];
     const std::string what =
-        Place(table_, "bias", std::to_string(output)) + " is " + std::to_string(bias);
+        Location(table_, "bias", std::to_string(output)) + " is " + std::to_string(bias);
     if (table_.kind == TableKind::kDepthwise && bias != 0) {
       Report(what, "operator " + std::to_string(table_.op) + " has no biases: 0 would be right");
     }
@@ -104,7 +104,7 @@ class TablePacker {
   void PackScale(int output) {
     const float scale = arrays_.scale[static_cast<size_t>(output)];
     const std::string what =
-        Place(table_, "scale", std::to_string(output)) + " is " + ExactText(scale);
+        Location(table_, "scale", std::to_string(output)) + " is " + ExactText(scale);
     if (!std::isfinite(scale) || scale < 0) {
       Report(what, "scales are finite and not negative");
     } else if (table_.fixed_scale != 0 && scale != table_.fixed_scale) {
@@ -135,7 +135,7 @@ LayerArrays UnpackTable(const PackedModel& model, const TableLayout& table,
     const int64_t bias =
         Load<int32_t>(model, table.BiasOffset(output)) + int64_t{InputZeroPoint(table)} * sum;
     if (!FitsInt32(bias)) {
-      findings.push_back(Place(table, "bias", std::to_string(output)) + " would be " +
+      findings.push_back(Location(table, "bias", std::to_string(output)) + " would be " +
                          std::to_string(bias) +
                          " without the input's zero point; that must fit into 32 bits.");
     }

@@ -1,4 +1,4 @@
-#include "reference_network.h"
+#include "model/reference_network.h"
 
 #include <algorithm>
 #include <cmath>

@@ -6,7 +6,7 @@
 #include <cstdint>
 #include <vector>
 
-#include "weight_layout.h"
+#include "model/weight_layout.h"
 
 namespace qz::model {
 

@@ -1,15 +1,15 @@
-#include "synthetic_features.h"
+#include "model/synthetic_features.h"
 
 #include <algorithm>
 #include <array>
 
-#include "number_generator.h"
+#include "base/number_generator.h"
 
 namespace qz::model {
 namespace {
 
-constexpr double kSmallestFeature = 33;  // of amplitude 1
-constexpr double kLargestFeature = 251;
+constexpr double kMinFeature = 33;  // of amplitude 1
+constexpr double kMaxFeature = 251;
 constexpr double kSubtractionDepth = 48;  // -16 x ln(0.05): the subtraction's floor
 
 double Distance(double a, double b) { return a < b ? b - a : a - b; }
@@ -26,8 +26,8 @@ class Scene {
     Tensor window(kInputRows, kInputChannels);
     for (int row = 0; row < kInputRows; ++row) {
       for (int c = 0; c < kInputChannels; ++c) {
-        const double cell = std::min(At(row, c), kLargestFeature);
-        const int feature = cell < kSmallestFeature ? 0 : static_cast<int>(cell);
+        const double cell = std::min(At(row, c), kMaxFeature);
+        const int feature = cell < kMinFeature ? 0 : static_cast<int>(cell);
         window.Row(row)[c] = static_cast<int8_t>(std::min(feature - 128, 127));
       }
     }
@@ -163,7 +163,7 @@ class Scene {
     }
   }
 
-  NumberGenerator random_;
+  base::NumberGenerator random_;
   std::array<double, static_cast<size_t>(kInputRows* kInputChannels)> cells_{};
 };
 

@@ -3,7 +3,7 @@
 
 #include <cstdint>
 
-#include "reference_network.h"
+#include "model/reference_network.h"
 
 namespace qz::model {
 

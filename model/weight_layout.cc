@@ -1,4 +1,4 @@
-#include "weight_layout.h"
+#include "model/weight_layout.h"
 
 namespace qz::model {
 

@@ -1,12 +1,12 @@
-#include "mobilenet_backend.h"
+#include "network/mobilenet_backend.h"
 
 #include <algorithm>
 
-#include "arena_plan.h"
+#include "kernels/quantised/quantised_kernels.h"
 #include "logistic_table.h"
 #include "model_weights.h"
-#include "operators.h"
-#include "quantised_kernels.h"
+#include "network/arena_plan.h"
+#include "network/operators.h"
 
 namespace {
 
@@ -50,18 +50,18 @@ void Depthwise(const int8_t* const* in_rows, const void* w, Tensor out, int16_t 
 
 void Pointwise(Tensor in, const void* w, Tensor out) {
   const orra_fp32_requant_params params{kFromZero, kMin, kMax};
-  for (size_t row = 0; row < out.rows; row += kMostRows) {
+  for (size_t row = 0; row < out.rows; row += kMaxRows) {
     orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
-        std::min(out.rows - row, kMostRows), out.channels, in.channels, At(in) + row * in.channels,
+        std::min(out.rows - row, kMaxRows), out.channels, in.channels, At(in) + row * in.channels,
         in.channels, w, At(out) + row * out.channels, out.channels, kBlockStride, &params);
   }
 }
 
 void Convolution(Tensor in, const int8_t* const* in_tiles, const void* w, Tensor out) {
   const orra_fp32_requant_params params{kFromZero, kMin, kMax};
-  for (size_t row = 0; row < out.rows; row += kMostRows) {
+  for (size_t row = 0; row < out.rows; row += kMaxRows) {
     orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
-        std::min(out.rows - row, kMostRows), out.channels, in.channels,
+        std::min(out.rows - row, kMaxRows), out.channels, in.channels,
         kTileEntries * sizeof(const int8_t*), in_tiles + row / kRowsPerTile * kTileEntries, w,
         At(out) + row * out.channels, out.channels, kBlockStride, 0, nullptr, &params);
   }

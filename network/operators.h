@@ -3,8 +3,8 @@
 
 #include <cstddef>
 
-#include "arena_plan.h"
-#include "mobilenet_backend.h"
+#include "network/arena_plan.h"
+#include "network/mobilenet_backend.h"
 
 namespace qz {
 

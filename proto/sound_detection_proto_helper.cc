@@ -1,10 +1,10 @@
-#include "sound_detection_proto_helper.h"
+#include "proto/sound_detection_proto_helper.h"
 
 #include <pb_decode.h>
 #include <pb_encode.h>
 
 #include "chre.h"
-#include "log_prefix.h"
+#include "classifier/types/log_prefix.h"
 
 namespace tarn::contexthub::sound {
 namespace {

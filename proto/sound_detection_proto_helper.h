@@ -4,8 +4,8 @@
 
 #include <cstdint>
 
-#include "chre_buffer.h"
-#include "confidence_event.h"
+#include "classifier/types/confidence_event.h"
+#include "proto/chre_buffer.h"
 #include "sound_detection.nanopb.h"
 
 namespace tarn::contexthub::sound {

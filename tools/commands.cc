@@ -1,19 +1,19 @@
-#include "commands.h"
+#include "tools/commands.h"
 
 namespace qz::tools {
 namespace {
 
-constexpr int kMostClients = 64;
+constexpr int kMaxClients = 64;
 
 }  // namespace
 
 void AddClientOptions(CLI::App* command, uint32_t* host_clients, uint32_t* client_nanoapps,
-                      int least_nanoapps) {
+                      int min_nanoapps) {
   command->add_option("--host-clients", *host_clients, "Host clients to connect")
-      ->check(CLI::Range(0, kMostClients))
+      ->check(CLI::Range(0, kMaxClients))
       ->capture_default_str();
   command->add_option("--client-nanoapps", *client_nanoapps, "Client nanoapps to register")
-      ->check(CLI::Range(least_nanoapps, kMostClients))
+      ->check(CLI::Range(min_nanoapps, kMaxClients))
       ->capture_default_str();
 }
 

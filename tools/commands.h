@@ -5,19 +5,19 @@
 #include <CLI/CLI.hpp>
 #include <filesystem>
 
-#include "exit_code.h"
+#include "base/exit_code.h"
 
 namespace qz::tools {
 
-void AddRun(CLI::App* app, programs::ExitCode* exit_code);
-void AddProve(CLI::App* app, programs::ExitCode* exit_code);
-void AddEval(CLI::App* app, programs::ExitCode* exit_code);
-void AddFeatures(CLI::App* app, programs::ExitCode* exit_code);
-void AddModel(CLI::App* app, programs::ExitCode* exit_code);
+void AddRun(CLI::App* app, base::ExitCode* exit_code);
+void AddProve(CLI::App* app, base::ExitCode* exit_code);
+void AddEval(CLI::App* app, base::ExitCode* exit_code);
+void AddFeatures(CLI::App* app, base::ExitCode* exit_code);
+void AddModel(CLI::App* app, base::ExitCode* exit_code);
 
 // Clients of a detector: --host-clients up to 64, --client-nanoapps from `least_nanoapps` to 64.
 void AddClientOptions(CLI::App* command, uint32_t* host_clients, uint32_t* client_nanoapps,
-                      int least_nanoapps);
+                      int min_nanoapps);
 
 // The build folder that this program, bin/qz, lies in.
 std::filesystem::path OwnBuild();

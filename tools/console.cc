@@ -1,4 +1,4 @@
-#include "console.h"
+#include "tools/console.h"
 
 #include <signal.h>
 #include <unistd.h>
@@ -9,7 +9,7 @@
 #include <cstdlib>
 #include <cstring>
 
-#include "audio_input.h"
+#include "audio/audio_input.h"
 
 namespace qz::tools {
 namespace {

@@ -1,8 +1,8 @@
-#include "kernel_versions.h"
+#include "tools/kernel_versions.h"
 
 #ifdef QZ_KERNELS_X86_64
-#include "choices.h"
-#include "processor.h"
+#include "kernels/x86_64/choices.h"
+#include "kernels/x86_64/processor.h"
 #endif
 
 namespace qz::tools {

@@ -8,8 +8,8 @@
 #include <string>
 #include <vector>
 
-#include "commands.h"
-#include "kernel_versions.h"
+#include "tools/commands.h"
+#include "tools/kernel_versions.h"
 
 namespace {
 
@@ -32,7 +32,7 @@ int NoCommand(const CLI::App& app) {
   const std::string line = app.get_parent() == nullptr ? "qz" : "qz " + app.get_name();
   std::fprintf(stderr, "%s: no command, should be one of %s (see %s --help)\n", line.c_str(),
                names.c_str(), line.c_str());
-  return qz::programs::kUsage;
+  return qz::base::kUsage;
 }
 
 int Main(int argc, char** argv) {
@@ -44,7 +44,7 @@ int Main(int argc, char** argv) {
     const std::string command = commands.empty() ? "" : commands[0]->get_name() + " ";
     return std::string("qz: ") + error.what() + " (see qz " + command + "--help)\n";
   });
-  qz::programs::ExitCode exit_code = qz::programs::kFine;
+  qz::base::ExitCode exit_code = qz::base::kSuccess;
   qz::tools::AddRun(&app, &exit_code);
   qz::tools::AddProve(&app, &exit_code);
   qz::tools::AddEval(&app, &exit_code);
@@ -53,7 +53,7 @@ int Main(int argc, char** argv) {
   try {
     app.parse(argc, argv);
   } catch (const CLI::ParseError& error) {
-    return app.exit(error) == 0 ? qz::programs::kFine : qz::programs::kUsage;
+    return app.exit(error) == 0 ? qz::base::kSuccess : qz::base::kUsage;
   }
   const CLI::App* last = &app;
   while (!last->get_subcommands().empty()) last = last->get_subcommands()[0];
@@ -68,6 +68,6 @@ int main(int argc, char** argv) {
     return Main(argc, argv);
   } catch (const std::exception& error) {
     std::fprintf(stderr, "qz: %s\n", error.what());
-    return qz::programs::kFaultFound;
+    return qz::base::kFaultFound;
   }
 }

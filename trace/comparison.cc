@@ -1,4 +1,4 @@
-#include "comparison.h"
+#include "trace/comparison.h"
 
 #include <algorithm>
 #include <cstdio>
@@ -38,8 +38,8 @@ std::string Quoted(const std::vector<uint8_t>& text) {
 }
 
 // The value that starts at a byte, as its readers take it.
-std::string ValueAt(const Record& record, size_t place, size_t size) {
-  const uint8_t* bytes = record.bytes.data() + place;
+std::string ValueAt(const Record& record, size_t location, size_t size) {
+  const uint8_t* bytes = record.bytes.data() + location;
   if (size == 1) return std::to_string(static_cast<int8_t>(bytes[0]));
   if (size == 2) return std::to_string(bytes[0] | bytes[1] << 8);
   // Scores are multiples of 1/256.
@@ -55,7 +55,7 @@ std::string ValueAt(const Record& record, size_t place, size_t size) {
 std::string Comparison::Compare(const Record& first, const Record& second) {
   const KindWords& words = WordsOf(first.kind);
   if (first.kind != second.kind) {
-    return Differ(Place(first, ""), words.name, WordsOf(second.kind).name);
+    return Differ(Location(first, ""), words.name, WordsOf(second.kind).name);
   }
   const struct {
     const char* name;
@@ -66,7 +66,7 @@ std::string Comparison::Compare(const Record& first, const Record& second) {
                 {"time in ns", first.time_ns, second.time_ns}};
   for (const auto& field : fields) {
     if (field.first == field.second) continue;
-    return Differ(Place(first, std::string(", ") + field.name), std::to_string(field.first),
+    return Differ(Location(first, std::string(", ") + field.name), std::to_string(field.first),
                   std::to_string(field.second));
   }
   if (first.bytes != second.bytes) return BytesDiffer(first, second);
@@ -89,61 +89,61 @@ void Comparison::Count(const Record& record) {
   for (const uint8_t byte : record.bytes) Digest(byte, 1, &tally);
 }
 
-std::string Comparison::Differ(const std::string& place, const std::string& first,
+std::string Comparison::Differ(const std::string& location, const std::string& first,
                                const std::string& second) const {
-  return place + ": " + first + " in " + first_name_ + ", " + second + " in " + second_name_;
+  return location + ": " + first + " in " + first_name_ + ", " + second + " in " + second_name_;
 }
 
 std::string Comparison::BytesDiffer(const Record& first, const Record& second) const {
   if (first.kind == Kind::kLogLine) {
-    return Differ(Place(first, ""), Quoted(first.bytes), Quoted(second.bytes));
+    return Differ(Location(first, ""), Quoted(first.bytes), Quoted(second.bytes));
   }
   if (first.bytes.size() != second.bytes.size()) {
-    return Differ(Place(first, ", size"), std::to_string(first.bytes.size()) + " bytes",
+    return Differ(Location(first, ", size"), std::to_string(first.bytes.size()) + " bytes",
                   std::to_string(second.bytes.size()) + " bytes");
   }
-  const auto place = static_cast<size_t>(
+  const auto location = static_cast<size_t>(
       std::mismatch(first.bytes.begin(), first.bytes.end(), second.bytes.begin()).first -
       first.bytes.begin());
-  std::string detail = ", byte " + std::to_string(place);
+  std::string detail = ", byte " + std::to_string(location);
   size_t size = 0;
   if (first.kind == Kind::kFeatures) {
     size = 2;
-    detail = ", channel " + std::to_string(place / size);
+    detail = ", channel " + std::to_string(location / size);
   } else if (first.kind == Kind::kOperatorOutput && first.type > 0) {
     size = first.number == kScoresOperator ? 4 : 1;
-    detail = ", row " + std::to_string(place / size / first.type) + ", channel " +
-             std::to_string(place / size % first.type);
+    detail = ", row " + std::to_string(location / size / first.type) + ", channel " +
+             std::to_string(location / size % first.type);
   } else if (first.kind == Kind::kMemory && first.type > 0) {
     size = 1;
-    detail = ", frame " + std::to_string(place / first.type) + ", channel " +
-             std::to_string(place % first.type);
+    detail = ", frame " + std::to_string(location / first.type) + ", channel " +
+             std::to_string(location % first.type);
   }
   if (size == 0 || first.bytes.size() % size != 0) {
-    return Differ(Place(first, detail), std::to_string(first.bytes[place]),
-                  std::to_string(second.bytes[place]));
+    return Differ(Location(first, detail), std::to_string(first.bytes[location]),
+                  std::to_string(second.bytes[location]));
   }
-  const size_t start = place / size * size;
-  return Differ(Place(first, detail), ValueAt(first, start, size), ValueAt(second, start, size));
+  const size_t start = location / size * size;
+  return Differ(Location(first, detail), ValueAt(first, start, size), ValueAt(second, start, size));
 }
 
-std::string Comparison::Place(const Record& record, const std::string& detail) const {
-  std::string place = WordsOf(record.kind).name;
+std::string Comparison::Location(const Record& record, const std::string& detail) const {
+  std::string location = WordsOf(record.kind).name;
   if (record.kind == Kind::kFeatures) {
-    place += " of frame " + std::to_string(seen(record.kind));
+    location += " of frame " + std::to_string(seen(record.kind));
   } else if (record.kind == Kind::kOperatorOutput) {
-    place = "network run " + std::to_string(seen(record.kind) / kOperatorsPerRun) + ", operator " +
-            std::to_string(record.number);
+    location = "network run " + std::to_string(seen(record.kind) / kOperatorsPerRun) +
+               ", operator " + std::to_string(record.number);
   } else if (record.kind == Kind::kMemory) {
-    place += " after buffer " + std::to_string(seen(record.kind) / kWatchedObjectCount) + ", ";
-    place += record.number < kWatchedObjectCount ? kWatchedObjects[record.number].name
-                                                 : "object " + std::to_string(record.number);
+    location += " after buffer " + std::to_string(seen(record.kind) / kWatchedObjectCount) + ", ";
+    location += record.number < kWatchedObjectCount ? kWatchedObjects[record.number].name
+                                                    : "object " + std::to_string(record.number);
   } else if (record.kind != Kind::kEnd) {
-    place += " " + std::to_string(seen(record.kind));
+    location += " " + std::to_string(seen(record.kind));
   }
   char time[32];
   std::snprintf(time, sizeof(time), "%.3f s", static_cast<double>(record.time_ns) * 1e-9);
-  return place + detail + " (" + kNanoappNames[nanoapp_] + " at " + time + ")";
+  return location + detail + " (" + kNanoappNames[nanoapp_] + " at " + time + ")";
 }
 
 std::string Comparison::NanoappsDiffer() const {

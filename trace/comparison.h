@@ -4,7 +4,7 @@
 #include <string>
 #include <vector>
 
-#include "trace_records.h"
+#include "trace/trace_records.h"
 
 namespace qz::trace {
 
@@ -41,11 +41,11 @@ class Comparison {
  private:
   void Count(const Record& record);
   // "place: `first` in the one, `second` in the other".
-  std::string Differ(const std::string& place, const std::string& first,
+  std::string Differ(const std::string& location, const std::string& first,
                      const std::string& second) const;
   std::string BytesDiffer(const Record& first, const Record& second) const;
   // The record that is compared, its nanoapp and the time on the hub's clock.
-  std::string Place(const Record& record, const std::string& detail) const;
+  std::string Location(const Record& record, const std::string& detail) const;
   uint64_t seen(Kind kind) const { return tally(nanoapp_, kind).records; }
 
   std::string first_name_;

@@ -1,4 +1,4 @@
-#include "object_in_memory.h"
+#include "trace/object_in_memory.h"
 
 #include <link.h>
 
@@ -52,7 +52,7 @@ bool Names(const std::string& symbol, const std::string& name) {
 
 }  // namespace
 
-const uint8_t* FindObject(const void* inside, const std::string& name, size_t least_bytes,
+const uint8_t* FindObject(const void* inside, const std::string& name, size_t min_bytes,
                           std::string* wrong) {
   LoadedFile loaded{reinterpret_cast<uintptr_t>(inside), "", 0};
   dl_iterate_phdr(LookAt, &loaded);
@@ -69,7 +69,7 @@ const uint8_t* FindObject(const void* inside, const std::string& name, size_t le
     for (const ElfW(Sym) & symbol :
          ReadTable<ElfW(Sym)>(&file, section.sh_offset, section.sh_size / sizeof(ElfW(Sym)))) {
       // Both classes of file keep the type in the same four bits.
-      if (ELF32_ST_TYPE(symbol.st_info) != STT_OBJECT || symbol.st_size < least_bytes ||
+      if (ELF32_ST_TYPE(symbol.st_info) != STT_OBJECT || symbol.st_size < min_bytes ||
           symbol.st_name >= names.size() || !Names(names.data() + symbol.st_name, name)) {
         continue;
       }
@@ -77,7 +77,7 @@ const uint8_t* FindObject(const void* inside, const std::string& name, size_t le
     }
   }
   *wrong = loaded.path + ": no symbol of an object " + name + " of at least " +
-           std::to_string(least_bytes) + " bytes, should be a file that was not stripped";
+           std::to_string(min_bytes) + " bytes, should be a file that was not stripped";
   return nullptr;
 }
 

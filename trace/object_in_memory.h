@@ -10,7 +10,7 @@ namespace qz::trace {
 // its file, which knows objects of unnamed namespaces too. Several may have that name; the one
 // meant has at least `least_bytes`. Null with one sentence in `*wrong` if it isn't there, as in a
 // file without symbols.
-const uint8_t* FindObject(const void* inside, const std::string& name, size_t least_bytes,
+const uint8_t* FindObject(const void* inside, const std::string& name, size_t min_bytes,
                           std::string* wrong);
 
 }  // namespace qz::trace

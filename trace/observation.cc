@@ -3,9 +3,9 @@
 
 #include <cstring>
 
-#include "audio_frontend.h"
-#include "operators.h"
-#include "recorder.h"
+#include "frontend/audio_frontend.h"
+#include "network/operators.h"
+#include "trace/recorder.h"
 
 namespace qz::trace {
 namespace {

@@ -10,7 +10,7 @@
 #include <vector>
 
 #include "chre_nanoapp_info.h"
-#include "recorder.h"
+#include "trace/recorder.h"
 
 extern "C" const chreNslNanoappInfo _chreNslDsoNanoappInfo;
 
@@ -26,8 +26,8 @@ struct Options {
   unsigned client_nanoapps = 0;
 };
 
-bool Complain(const std::string& sentence) {
-  std::fprintf(stderr, "qz-trace: %s\n", sentence.c_str());
+bool Complain(const std::string& message) {
+  std::fprintf(stderr, "qz-trace: %s\n", message.c_str());
   return false;
 }
 
@@ -61,7 +61,7 @@ bool Trace(uint32_t nanoapp, const Options& options, Recorder* recorder) {
   hub::LoadFailure failure;
   if (nanoapp == kLoadedModule ? !hub.Start(options.module, &failure)
                                : !hub.StartLinked(_chreNslDsoNanoappInfo, &failure)) {
-    return Complain(failure.sentence);
+    return Complain(failure.message);
   }
   std::string wrong;
   if (!recorder->WatchMemory(&wrong)) {
@@ -70,11 +70,11 @@ bool Trace(uint32_t nanoapp, const Options& options, Recorder* recorder) {
     return Complain(wrong);
   }
   clients.Connect(options.host_clients, options.client_nanoapps);
-  bool fine = PlayFile(options.raw_file, &hub, recorder);
+  bool success = PlayFile(options.raw_file, &hub, recorder);
   clients.Leave();
   hub.End();
-  for (const std::string& fault : hub.Faults()) fine = Complain("fault: " + fault);
-  return fine;
+  for (const std::string& fault : hub.Faults()) success = Complain("fault: " + fault);
+  return success;
 }
 
 int Main(int argc, char** argv) {

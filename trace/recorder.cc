@@ -1,8 +1,8 @@
-#include "recorder.h"
+#include "trace/recorder.h"
 
 #include <utility>
 
-#include "object_in_memory.h"
+#include "trace/object_in_memory.h"
 
 namespace qz::trace {
 namespace {

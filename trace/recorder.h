@@ -4,9 +4,9 @@
 #include <string>
 #include <vector>
 
-#include "clients.h"
-#include "hub.h"
-#include "trace_records.h"
+#include "hub/clients.h"
+#include "hub/hub.h"
+#include "trace/trace_records.h"
 
 namespace qz::trace {
 

@@ -1,4 +1,4 @@
-#include "trace_records.h"
+#include "trace/trace_records.h"
 
 #include <string>
 
@@ -9,9 +9,9 @@ constexpr size_t kHeadBytes = 21;
 
 size_t IndexOf(Kind kind) { return static_cast<size_t>(kind) - 1; }
 
-uint64_t LittleEndian(const std::vector<uint8_t>& bytes, size_t place, size_t size) {
+uint64_t LittleEndian(const std::vector<uint8_t>& bytes, size_t location, size_t size) {
   uint64_t value = 0;
-  for (size_t i = size; i-- > 0;) value = value << 8 | bytes[place + i];
+  for (size_t i = size; i-- > 0;) value = value << 8 | bytes[location + i];
   return value;
 }
 
@@ -53,9 +53,9 @@ void Reader::Next(Record* record) {
   record->type = static_cast<uint32_t>(LittleEndian(head, 5, 4));
   record->time_ns = LittleEndian(head, 9, 8);
   const size_t size = LittleEndian(head, 17, 4);
-  if (size > kMostRecordBytes) {
+  if (size > kMaxRecordBytes) {
     Fail("it has " + std::to_string(size) + " bytes, should be at most " +
-         std::to_string(kMostRecordBytes));
+         std::to_string(kMaxRecordBytes));
   }
   Fill(&record->bytes, size);
   if (record->kind == Kind::kEnd) {

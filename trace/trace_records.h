@@ -55,7 +55,7 @@ struct Record {
 };
 
 // No record has more: the largest object has 41,040.
-constexpr size_t kMostRecordBytes = 65536;
+constexpr size_t kMaxRecordBytes = 65536;
 
 // Appends the `size` low bytes of `value`, the lowest first.
 void AppendLittleEndian(uint64_t value, size_t size, std::vector<uint8_t>* bytes);

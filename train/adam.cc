@@ -1,4 +1,4 @@
-#include "adam.h"
+#include "train/adam.h"
 
 #include <cmath>
 
@@ -16,7 +16,7 @@ void Adam::Step(const Values& gradient, float rate, float decay, Values* values)
   const double count = static_cast<double>(steps);
   const float mean_correction = static_cast<float>(1 / (1 - std::pow(0.9, count)));
   const float square_correction = static_cast<float>(1 / (1 - std::pow(0.99, count)));
-  for (size_t i = 0; i < kParameters.learnt; ++i) {
+  for (size_t i = 0; i < kParameters.trained; ++i) {
     const float g = gradient[i];
     mean[i] = kMeanMemory * mean[i] + (1 - kMeanMemory) * g;
     square[i] = kSquareMemory * square[i] + (1 - kSquareMemory) * g * g;

@@ -2,14 +2,14 @@
 
 #include <cstdint>
 
-#include "parameters.h"
+#include "train/parameters.h"
 
 namespace qz::train {
 
 // Adam with decoupled weight decay, over the learnt numbers.
 struct Adam {
-  Values mean = Values(kParameters.learnt);
-  Values square = Values(kParameters.learnt);
+  Values mean = Values(kParameters.trained);
+  Values square = Values(kParameters.trained);
   uint64_t steps = 0;
 
   // Weights decay by rate x decay; biases and normalisations do not.

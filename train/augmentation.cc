@@ -1,10 +1,10 @@
-#include "augmentation.h"
+#include "train/augmentation.h"
 
 #include <algorithm>
 #include <cmath>
 #include <cstdlib>
 
-#include "clip_features.h"
+#include "dataset/clip_features.h"
 
 namespace qz::train {
 namespace {
@@ -19,11 +19,11 @@ double MeanSquare(const std::vector<float>& sound) {
   return sum / static_cast<double>(sound.size());
 }
 
-bool Happens(double share, model::NumberGenerator* random) { return random->Unit() < share; }
+bool Happens(double share, base::NumberGenerator* random) { return random->Unit() < share; }
 
 // `slope`: how much of each sample stays in the next; 0 is white. Two of them make a noise between.
 std::vector<float> MakeNoise(double slope, double white, uint64_t seed) {
-  model::NumberGenerator random(seed);
+  base::NumberGenerator random(seed);
   std::vector<float> noise(kNoiseSamples);
   double slow = 0;
   for (float& sample : noise) {
@@ -37,7 +37,7 @@ std::vector<float> MakeNoise(double slope, double white, uint64_t seed) {
 }
 
 // Before a clip's first loud sample, in samples: 50 ms.
-constexpr int kLongestLead = 800;
+constexpr int kMaxLead = 800;
 
 // The first sample that is an eighth as loud as the loudest.
 int64_t Onset(const std::vector<int16_t>& samples) {
@@ -90,14 +90,14 @@ Augmentation::Augmentation(const Recipe& recipe, const std::vector<Clip>& clips)
 
 void Augmentation::Make(size_t first, uint64_t seed, Eigen::Index sequence, Batch* features,
                         Matrix* targets) const {
-  model::NumberGenerator random(seed);
+  base::NumberGenerator random(seed);
   Sound sound(samples_);
   targets->row(sequence).setZero();
   const auto add = [&](const Clip& clip, double gain) {
     AddClip(clip, gain, &random, &sound);
     if (clip.output >= 0) (*targets)(sequence, clip.output) = 1;
   };
-  const double gain = random.Uniform(recipe_.lowest_gain, recipe_.highest_gain);
+  const double gain = random.Uniform(recipe_.min_gain, recipe_.max_gain);
   add(clips_[first], FromDecibels(gain));
   if (Happens(recipe_.mix_share, &random)) {
     const Clip& other =
@@ -114,21 +114,21 @@ void Augmentation::Make(size_t first, uint64_t seed, Eigen::Index sequence, Batc
 
 // Wholly in the sequence, where it fits, and else filling it; what lies before and behind it stays
 // silent.
-void Augmentation::AddClip(const Clip& clip, double gain, model::NumberGenerator* random,
+void Augmentation::AddClip(const Clip& clip, double gain, base::NumberGenerator* random,
                            Sound* sound) const {
   const auto length = static_cast<int64_t>(clip.samples.size());
   const bool at_start = Happens(recipe_.start_share, random);
   int64_t begin = 0;
   if (at_start) {
-    begin = std::max<int64_t>(Onset(clip.samples) - random->Between(0, kLongestLead), 0);
+    begin = std::max<int64_t>(Onset(clip.samples) - random->Between(0, kMaxLead), 0);
   } else if (Happens(recipe_.turn_share, random)) {
     begin = static_cast<int64_t>(random->Uniform(0, static_cast<double>(length)));
   }
   const bool other_speed = Happens(recipe_.speed_share, random);
   const double speed =
       other_speed ? std::exp(random->Uniform(-recipe_.speed_range, recipe_.speed_range)) : 1;
-  const double room = static_cast<double>(samples_) - static_cast<double>(length) / speed;
-  const double offset = at_start ? 0 : random->Uniform(std::min(room, 0.0), std::max(room, 0.0));
+  const double space = static_cast<double>(samples_) - static_cast<double>(length) / speed;
+  const double offset = at_start ? 0 : random->Uniform(std::min(space, 0.0), std::max(space, 0.0));
 
   const auto step = static_cast<int64_t>(speed * kPhaseOne);
   const float* end = sound->data() + sound->size();
@@ -142,12 +142,12 @@ void Augmentation::AddClip(const Clip& clip, double gain, model::NumberGenerator
   AddPart(clip.samples, begin - 1, level, step, std::max(phase, int64_t{0}), end, &out);
 }
 
-void Augmentation::AddNoise(model::NumberGenerator* random, Sound* sound) const {
+void Augmentation::AddNoise(base::NumberGenerator* random, Sound* sound) const {
   const Sound& noise =
       noises_[static_cast<size_t>(random->Between(0, static_cast<int>(noises_.size()) - 1))];
   const auto begin = static_cast<size_t>(random->Between(0, static_cast<int>(kNoiseSamples) - 1));
   const double level = std::sqrt(MeanSquare(*sound)) *
-                       FromDecibels(-random->Uniform(recipe_.lowest_snr, recipe_.highest_snr));
+                       FromDecibels(-random->Uniform(recipe_.min_snr, recipe_.max_snr));
   for (size_t i = 0; i < sound->size(); ++i) {
     (*sound)[i] += static_cast<float>(level) * noise[(begin + i) % kNoiseSamples];
   }
@@ -155,7 +155,7 @@ void Augmentation::AddNoise(model::NumberGenerator* random, Sound* sound) const 
 
 // Another microphone: louder low or high channels, all channels a place up or down. What was
 // silent stays so.
-void Augmentation::Colour(model::NumberGenerator* random, Eigen::Index sequence,
+void Augmentation::Colour(base::NumberGenerator* random, Eigen::Index sequence,
                           Batch* features) const {
   auto rows = features->values.middleRows(sequence * features->steps(), features->steps());
   const double tilt = random->Uniform(-recipe_.tilt, recipe_.tilt);
@@ -178,11 +178,11 @@ void Augmentation::Colour(model::NumberGenerator* random, Eigen::Index sequence,
   }
 }
 
-void Augmentation::Mask(model::NumberGenerator* random, Eigen::Index sequence,
+void Augmentation::Mask(base::NumberGenerator* random, Eigen::Index sequence,
                         Batch* features) const {
   auto rows = features->values.middleRows(sequence * features->steps(), features->steps());
   for (int i = 0; i < recipe_.time_masks; ++i) {
-    const int length = random->Between(0, recipe_.longest_time_mask);
+    const int length = random->Between(0, recipe_.max_time_mask);
     const int begin = random->Between(0, static_cast<int>(rows.rows()) - length);
     rows.middleRows(begin, length).setZero();
   }

@@ -5,10 +5,10 @@
 #include <cstdint>
 #include <vector>
 
-#include "matrix.h"
-#include "number_generator.h"
-#include "recipe.h"
-#include "training_set.h"
+#include "base/number_generator.h"
+#include "train/matrix.h"
+#include "train/recipe.h"
+#include "train/training_set.h"
 
 namespace qz::train {
 
@@ -26,10 +26,10 @@ class Augmentation {
  private:
   using Sound = std::vector<float>;
 
-  void AddClip(const Clip& clip, double gain, model::NumberGenerator* random, Sound* sound) const;
-  void AddNoise(model::NumberGenerator* random, Sound* sound) const;
-  void Colour(model::NumberGenerator* random, Eigen::Index sequence, Batch* features) const;
-  void Mask(model::NumberGenerator* random, Eigen::Index sequence, Batch* features) const;
+  void AddClip(const Clip& clip, double gain, base::NumberGenerator* random, Sound* sound) const;
+  void AddNoise(base::NumberGenerator* random, Sound* sound) const;
+  void Colour(base::NumberGenerator* random, Eigen::Index sequence, Batch* features) const;
+  void Mask(base::NumberGenerator* random, Eigen::Index sequence, Batch* features) const;
 
   const Recipe& recipe_;
   const std::vector<Clip>& clips_;

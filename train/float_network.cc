@@ -1,19 +1,17 @@
-#include "float_network.h"
+#include "train/float_network.h"
 
-#include "number_generator.h"
+#include "base/number_generator.h"
 
 namespace qz::train {
 namespace {
 
-float LowestOf(const LayerPlan& plan) { return static_cast<float>(plan.lowest() * plan.out_scale); }
-float HighestOf(const LayerPlan& plan) {
-  return static_cast<float>(plan.highest() * plan.out_scale);
-}
+float MinOf(const LayerPlan& plan) { return static_cast<float>(plan.min() * plan.out_scale); }
+float MaxOf(const LayerPlan& plan) { return static_cast<float>(plan.max() * plan.out_scale); }
 
 // Puts out a share of the values and makes the others larger; *mask is what they were multiplied
 // with.
 void DropOut(float share, uint64_t seed, Batch* x, Batch* mask) {
-  model::NumberGenerator random(seed);
+  base::NumberGenerator random(seed);
   mask->Resize(x->sequences, x->steps(), x->channels());
   const float kept = 1 / (1 - share);
   for (Eigen::Index i = 0; i < mask->values.size(); ++i) {
@@ -24,11 +22,11 @@ void DropOut(float share, uint64_t seed, Batch* x, Batch* mask) {
 
 }  // namespace
 
-void MaskClamped(const Batch& out, float lowest, float highest, Batch* gradient) {
+void MaskClamped(const Batch& out, float min, float max, Batch* gradient) {
   const float* const values = out.values.data();
   float* const g = gradient->values.data();
   for (Eigen::Index i = 0; i < out.values.size(); ++i) {
-    const bool inside = (values[i] > lowest) & (values[i] < highest);
+    const bool inside = (values[i] > min) & (values[i] < max);
     g[i] = inside ? g[i] : 0.0f;
   }
 }
@@ -57,7 +55,7 @@ const Batch& FloatNetwork::Forward(const Values& parameters, const Batch& featur
         trace.out.values.rowwise() += bias.row(0);
       }
     }
-    trace.out.values = trace.out.values.cwiseMax(LowestOf(plan)).cwiseMin(HighestOf(plan));
+    trace.out.values = trace.out.values.cwiseMax(MinOf(plan)).cwiseMin(MaxOf(plan));
     if (plan.pooled) PoolForward(trace.out, &trace.pooled);
   }
   return traces_.back().out;
@@ -73,7 +71,7 @@ void FloatNetwork::Backward(const Values& parameters, const Batch& dlogits, Valu
       PoolBackward(trace.out, dy, &dx);
       std::swap(dy, dx);
     }
-    MaskClamped(trace.out, LowestOf(plan), HighestOf(plan), &dy);
+    MaskClamped(trace.out, MinOf(plan), MaxOf(plan), &dy);
     Batch* const input_gradient = i == 0 ? nullptr : &dx;
     if (plan.depthwise()) {
       DepthwiseBackward(trace.in, WeightOf(parameters, i), dy, WeightOf(*gradient, i),

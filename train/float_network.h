@@ -4,8 +4,8 @@
 #include <array>
 #include <cstdint>
 
-#include "layers.h"
-#include "parameters.h"
+#include "train/layers.h"
+#include "train/parameters.h"
 
 namespace qz::train {
 
@@ -43,6 +43,6 @@ class FloatNetwork {
 };
 
 // Clears the gradient where the output stands at a limit.
-void MaskClamped(const Batch& out, float lowest, float highest, Batch* gradient);
+void MaskClamped(const Batch& out, float min, float max, Batch* gradient);
 
 }  // namespace qz::train

@@ -1,4 +1,4 @@
-#include "layers.h"
+#include "train/layers.h"
 
 namespace qz::train {
 namespace {

@@ -3,7 +3,7 @@
 // (written to *dx, unless null). Convolutions are valid: `taps` - 1 steps fewer come out.
 #pragma once
 
-#include "matrix.h"
+#include "train/matrix.h"
 
 namespace qz::train {
 

@@ -1,4 +1,4 @@
-#include "loss.h"
+#include "train/loss.h"
 
 #include <algorithm>
 #include <cmath>
@@ -25,12 +25,12 @@ double ClipLoss(const Batch& logits, const Matrix& targets, const LossShape& sha
   for (int s = 0; s < logits.sequences; ++s) {
     for (Eigen::Index c = 0; c < logits.channels(); ++c) {
       const auto column = logits.values.col(c).segment(s * windows, windows);
-      const double highest = static_cast<double>(column.maxCoeff());
+      const double max = static_cast<double>(column.maxCoeff());
       double sum = 0;
       for (Eigen::Index w = 0; w < windows; ++w) {
-        sum += std::exp(sharpness * (static_cast<double>(column(w)) - highest));
+        sum += std::exp(sharpness * (static_cast<double>(column(w)) - max));
       }
-      const double logit = highest + std::log(sum / static_cast<double>(windows)) / sharpness;
+      const double logit = max + std::log(sum / static_cast<double>(windows)) / sharpness;
       const double smoothing = static_cast<double>(shape.smoothing);
       const double target = smoothing + (1 - 2 * smoothing) * static_cast<double>(targets(s, c));
       const double weight = static_cast<double>(shape.positive_weight(c));
@@ -39,7 +39,7 @@ double ClipLoss(const Batch& logits, const Matrix& targets, const LossShape& sha
       const double slope =
           ((1 - target) * score - weight * target * (1 - score)) / static_cast<double>(divisor);
       for (Eigen::Index w = 0; w < windows; ++w) {
-        const double share = std::exp(sharpness * (static_cast<double>(column(w)) - highest)) / sum;
+        const double share = std::exp(sharpness * (static_cast<double>(column(w)) - max)) / sum;
         dlogits->values(s * windows + w, c) = static_cast<float>(slope * share);
       }
     }
@@ -47,14 +47,14 @@ double ClipLoss(const Batch& logits, const Matrix& targets, const LossShape& sha
   return loss / static_cast<double>(divisor);
 }
 
-double TeachingLoss(const Batch& logits, const Batch& taught, float divisor, Batch* dlogits) {
+double TeachingLoss(const Batch& logits, const Batch& distilled, float divisor, Batch* dlogits) {
   dlogits->Resize(logits.sequences, logits.steps(), logits.channels());
   const double parts = static_cast<double>(divisor) * static_cast<double>(logits.steps());
   double loss = 0;
   for (Eigen::Index i = 0; i < logits.values.size(); ++i) {
-    const auto taught_logit = static_cast<double>(taught.values.data()[i]);
+    const auto distillation_target = static_cast<double>(distilled.values.data()[i]);
     const double away = static_cast<double>(logits.values.data()[i]) -
-                        std::clamp(taught_logit, -kFarthestLogit, kFarthestLogit);
+                        std::clamp(distillation_target, -kFarthestLogit, kFarthestLogit);
     loss += 0.5 * away * away;
     dlogits->values.data()[i] = static_cast<float>(away / parts);
   }

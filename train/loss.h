@@ -1,7 +1,7 @@
 #pragma once
 
-#include "matrix.h"
-#include "reference_network.h"
+#include "model/reference_network.h"
+#include "train/matrix.h"
 
 namespace qz::train {
 
@@ -24,6 +24,6 @@ double ClipLoss(const Batch& logits, const Matrix& targets, const LossShape& sha
 // sum over windows and classes, divided by `divisor` and the windows of a sequence, and its
 // gradient. The cross-entropy of the logistics would let sure answers, whose order matters, run
 // together.
-double TeachingLoss(const Batch& logits, const Batch& taught, float divisor, Batch* dlogits);
+double TeachingLoss(const Batch& logits, const Batch& distilled, float divisor, Batch* dlogits);
 
 }  // namespace qz::train

@@ -8,8 +8,8 @@
 #include <exception>
 #include <filesystem>
 
-#include "prove_model_command.h"
-#include "train_command.h"
+#include "train/prove_model_command.h"
+#include "train/train_command.h"
 
 namespace {
 
@@ -70,7 +70,7 @@ int Main(int argc, char** argv) {
   try {
     app.parse(argc, argv);
   } catch (const CLI::ParseError& error) {
-    return app.exit(error) == 0 ? qz::programs::kFine : qz::programs::kUsage;
+    return app.exit(error) == 0 ? qz::base::kSuccess : qz::base::kUsage;
   }
   SettleArithmetic();
   return fit->parsed() ? qz::train::TrainCommand(options)
@@ -83,13 +83,13 @@ int main(int argc, char** argv) {
 #if defined(__x86_64__)
   if (!__builtin_cpu_supports("avx2") || !__builtin_cpu_supports("fma")) {
     std::fprintf(stderr, "qz-train: this processor lacks AVX2 or FMA, which it needs\n");
-    return qz::programs::kNotRunnable;
+    return qz::base::kNotRunnable;
   }
 #endif
   try {
     return Main(argc, argv);
   } catch (const std::exception& error) {
     std::fprintf(stderr, "qz-train: %s\n", error.what());
-    return qz::programs::kUnreadableInput;
+    return qz::base::kUnreadableInput;
   }
 }

@@ -1,15 +1,15 @@
-#include "parameters.h"
+#include "train/parameters.h"
 
 #include <cmath>
 
-#include "layers.h"
-#include "number_generator.h"
+#include "base/number_generator.h"
+#include "train/layers.h"
 
 namespace qz::train {
 namespace {
 
 // A depthwise channel passes its middle step on, with a little of its neighbours.
-void DrawDepthwise(MatrixView w, model::NumberGenerator* random) {
+void DrawDepthwise(MatrixView w, base::NumberGenerator* random) {
   for (Eigen::Index t = 0; t < w.rows(); ++t) {
     for (Eigen::Index c = 0; c < w.cols(); ++c) {
       w(t, c) = static_cast<float>((t == 1 ? 0.5 : 0.0) + 0.3 * random->Bell());
@@ -18,7 +18,7 @@ void DrawDepthwise(MatrixView w, model::NumberGenerator* random) {
 }
 
 // Deviation sqrt(2 / inputs) keeps the spread of rectified values from layer to layer.
-void DrawDense(MatrixView w, double gain, model::NumberGenerator* random) {
+void DrawDense(MatrixView w, double gain, base::NumberGenerator* random) {
   const double deviation = gain * std::sqrt(2.0 / static_cast<double>(w.rows()));
   for (Eigen::Index i = 0; i < w.size(); ++i) {
     w.data()[i] = static_cast<float>(3 * deviation * random->Bell());
@@ -28,18 +28,18 @@ void DrawDense(MatrixView w, double gain, model::NumberGenerator* random) {
 }  // namespace
 
 Values InitialParameters(uint64_t seed) {
-  model::NumberGenerator random(seed);
+  base::NumberGenerator random(seed);
   Values values(kParameters.all);
   for (size_t i = 0; i < kLayers; ++i) {
-    const LayerPlace& place = kParameters.layers[i];
+    const LayerOffsets& location = kParameters.layers[i];
     if (kPlan[i].depthwise()) {
       DrawDepthwise(WeightOf(values, i), &random);
     } else {
       DrawDense(WeightOf(values, i), kPlan[i].normalised ? 1 : 0.5, &random);
     }
     if (!kPlan[i].normalised) continue;
-    RowAt(values, i, place.gamma).setOnes();
-    RowAt(values, i, place.variance).setOnes();
+    RowAt(values, i, location.gamma).setOnes();
+    RowAt(values, i, location.variance).setOnes();
   }
   return values;
 }
@@ -47,12 +47,12 @@ Values InitialParameters(uint64_t seed) {
 void FoldNormalisations(Values* values) {
   for (size_t i = 0; i < kLayers; ++i) {
     if (!kPlan[i].normalised) continue;
-    const LayerPlace& place = kParameters.layers[i];
+    const LayerOffsets& location = kParameters.layers[i];
     const RowVector scale =
-        RowAt(*values, i, place.gamma).array() *
-        (RowAt(*values, i, place.variance).array() + kNormalisationFloor).sqrt().inverse();
+        RowAt(*values, i, location.gamma).array() *
+        (RowAt(*values, i, location.variance).array() + kNormalisationFloor).sqrt().inverse();
     WeightOf(*values, i).array().rowwise() *= scale.array();
-    RowAt(*values, i, place.bias) -= RowAt(*values, i, place.mean).cwiseProduct(scale);
+    RowAt(*values, i, location.bias) -= RowAt(*values, i, location.mean).cwiseProduct(scale);
   }
 }
 

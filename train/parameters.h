@@ -5,8 +5,8 @@
 #include <array>
 #include <vector>
 
-#include "matrix.h"
-#include "plan.h"
+#include "train/matrix.h"
+#include "train/plan.h"
 
 namespace qz::train {
 
@@ -15,7 +15,7 @@ using Values = std::vector<float, Eigen::aligned_allocator<float>>;
 
 // Where a layer's numbers begin. `bias` holds the normalisation's beta where there is one, and
 // nothing in depthwise layers, which have no bias.
-struct LayerPlace {
+struct LayerOffsets {
   size_t weight = 0;    // weight_rows x outputs
   size_t bias = 0;      // outputs
   size_t gamma = 0;     // outputs, of normalised layers, as are the next two
@@ -24,8 +24,8 @@ struct LayerPlace {
 };
 
 struct ParameterPlan {
-  std::array<LayerPlace, kLayers> layers;
-  size_t learnt = 0;  // numbers that gradients move; the running ones stand behind them
+  std::array<LayerOffsets, kLayers> layers;
+  size_t trained = 0;  // numbers that gradients move; the running ones stand behind them
   size_t all = 0;
 };
 
@@ -41,7 +41,7 @@ constexpr ParameterPlan MakeParameterPlan() {
     plan.layers[i].gamma = next;
     if (kPlan[i].normalised) next += outputs;
   }
-  plan.learnt = next;
+  plan.trained = next;
   for (size_t i = 0; i < kLayers; ++i) {
     if (!kPlan[i].normalised) continue;
     const size_t outputs = static_cast<size_t>(kPlan[i].outputs());

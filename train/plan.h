@@ -10,7 +10,7 @@
 #include <array>
 #include <cstddef>
 
-#include "weight_layout.h"
+#include "model/weight_layout.h"
 
 namespace qz::train {
 
@@ -38,8 +38,8 @@ struct LayerPlan {
   constexpr int weight_rows() const { return layout().taps * layout().inputs; }
   constexpr int outputs() const { return layout().outputs; }
   // What the output, less its zero point, is clamped to.
-  constexpr int lowest() const { return -128 - zero_point; }
-  constexpr int highest() const { return 127 - zero_point; }
+  constexpr int min() const { return -128 - zero_point; }
+  constexpr int max() const { return 127 - zero_point; }
 };
 
 constexpr size_t kLayers = model::kTableCount;

@@ -1,27 +1,28 @@
-#include "prove_model_command.h"
+#include "train/prove_model_command.h"
 
 #include <cstdio>
 
-#include "model_files.h"
-#include "packing.h"
-#include "proof.h"
-#include "training_set.h"
+#include "model/model_files.h"
+#include "model/packing.h"
+#include "train/equivalence.h"
+#include "train/training_set.h"
 
 namespace qz::train {
 
-programs::ExitCode ProveModelCommand(const std::string& model_file, const std::string& manifest) {
-  const model::PackedModel model = model::ReadSoundModel(model_file);
+base::ExitCode ProveModelCommand(const std::string& model_file, const std::string& manifest) {
+  const model::PackedModel model = model::ReadValidModel(model_file);
   // Any sound does: no class is asked for.
   const ClipList list = LoadClips(dataset::ReadManifest(manifest), model::Labels());
-  std::vector<Batch> judged;
-  for (const Clip& clip : list.clips) judged.push_back(JudgedFeatures(clip.samples));
+  std::vector<Batch> validated;
+  for (const Clip& clip : list.clips) validated.push_back(ValidationFeatures(clip.samples));
   for (const std::string& line : list.skipped) {
     std::fprintf(stderr, "qz-train: skipped: %s\n", line.c_str());
   }
-  const Proof proof = Prove(ParametersOf(model::Unpack(model)), model, judged);
-  std::printf("%s on %zu clips: %s\n", model_file.c_str(), judged.size(), Sentence(proof).c_str());
-  if (!proof.difference.empty() || proof.runs == 0) return programs::kFaultFound;
-  return list.skipped.empty() ? programs::kFine : programs::kUnreadableInput;
+  const EquivalenceCheck check = Prove(ParametersOf(model::Unpack(model)), model, validated);
+  std::printf("%s on %zu clips: %s\n", model_file.c_str(), validated.size(),
+              Message(check).c_str());
+  if (!check.difference.empty() || check.runs == 0) return base::kFaultFound;
+  return list.skipped.empty() ? base::kSuccess : base::kUnreadableInput;
 }
 
 }  // namespace qz::train

@@ -2,12 +2,12 @@
 
 #include <string>
 
-#include "exit_code.h"
+#include "base/exit_code.h"
 
 namespace qz::train {
 
 // Compares the trainer's integer network with the module's, on every clip of a list. Says what went
 // wrong itself.
-programs::ExitCode ProveModelCommand(const std::string& model_file, const std::string& manifest);
+base::ExitCode ProveModelCommand(const std::string& model_file, const std::string& manifest);
 
 }  // namespace qz::train

@@ -1,4 +1,4 @@
-#include "quantised_network.h"
+#include "train/quantised_network.h"
 
 #include <algorithm>
 #include <cmath>
@@ -9,7 +9,7 @@ namespace qz::train {
 namespace {
 
 // With the largest products, 180 x 255 x 127, and this every sum stays below 2^24.
-constexpr float kLargestBias = 8'000'000;
+constexpr float kMaxBias = 8'000'000;
 
 // Of the fixed-point layers: multiplier / 2^(31 + shift).
 struct FixedFactor {
@@ -38,8 +38,8 @@ void Requantise(const QuantisedParameters& parameters, size_t layer, Batch* x) {
     x->values.array().rowwise() *= parameters.scale[layer].array();
     x->values = x->values.array().rint();
   }
-  x->values = x->values.cwiseMax(static_cast<float>(plan.lowest()))
-                  .cwiseMin(static_cast<float>(plan.highest()));
+  x->values =
+      x->values.cwiseMax(static_cast<float>(plan.min())).cwiseMin(static_cast<float>(plan.max()));
 }
 
 // The step of each output's weights: fixed, or so that the largest becomes 127.
@@ -74,7 +74,7 @@ QuantisedParameters::QuantisedParameters(const Values& folded) : integers(kParam
     const RowVector step = weight_step[i] * static_cast<float>(plan.in_scale);
     const size_t bias = kParameters.layers[i].bias;
     RowAt(integers, i, bias) =
-        (RowAt(folded, i, bias).array() / step.array()).rint().max(-kLargestBias).min(kLargestBias);
+        (RowAt(folded, i, bias).array() / step.array()).rint().max(-kMaxBias).min(kMaxBias);
     scale[i] = IsFixed(plan) ? RowVector::Constant(
                                    weight.cols(),
                                    static_cast<float>(i + 1 == kLayers ? kFactor18 : kFactor17))
@@ -108,7 +108,7 @@ QuantisedParameters ParametersOf(const model::ModelArrays& arrays) {
     parameters.weight_step[i].setOnes();
     if (kPlan[i].depthwise()) continue;
     for (const int32_t bias : layer.bias) {
-      if (std::abs(static_cast<float>(bias)) > kLargestBias) {
+      if (std::abs(static_cast<float>(bias)) > kMaxBias) {
         throw std::runtime_error(std::string(kPlan[i].layout().name) + ": a bias is " +
                                  std::to_string(bias) +
                                  ", beyond the 8,000,000 up to which the trainer's sums are exact");
@@ -142,7 +142,7 @@ const Batch& QuantisedNetwork::Forward(const QuantisedParameters& parameters,
 
 void QuantisedNetwork::Backward(const QuantisedParameters& parameters, const Batch& dlogits,
                                 Values* gradient) {
-  Values by_integer(kParameters.learnt);
+  Values by_integer(kParameters.trained);
   Batch dy = dlogits;
   dy.values *= static_cast<float>(kLogitScale);
   Batch dx;
@@ -153,8 +153,7 @@ void QuantisedNetwork::Backward(const QuantisedParameters& parameters, const Bat
       PoolBackward(trace.out, dy, &dx);
       std::swap(dy, dx);
     }
-    MaskClamped(trace.out, static_cast<float>(plan.lowest()), static_cast<float>(plan.highest()),
-                &dy);
+    MaskClamped(trace.out, static_cast<float>(plan.min()), static_cast<float>(plan.max()), &dy);
     dy.values.array().rowwise() *= parameters.scale[i].array();
     Batch* const input_gradient = i == 0 ? nullptr : &dx;
     MatrixView dweight = WeightOf(by_integer, i);

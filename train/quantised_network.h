@@ -8,8 +8,8 @@
 #include <array>
 #include <cstdint>
 
-#include "float_network.h"
-#include "packing.h"
+#include "model/packing.h"
+#include "train/float_network.h"
 
 namespace qz::train {
 

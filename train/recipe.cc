@@ -1,4 +1,4 @@
-#include "recipe.h"
+#include "train/recipe.h"
 
 #include <cerrno>
 #include <cmath>
@@ -40,8 +40,8 @@ constexpr Entry kEntries[] = {
     Real("smoothing", &Recipe::smoothing, 0, 0.49),
     Real("positive_weight", &Recipe::positive_weight, 0.01, 100),
     Real("sharpness", &Recipe::sharpness, 0.01, 100),
-    Real("lowest_gain", &Recipe::lowest_gain, -90, 90),
-    Real("highest_gain", &Recipe::highest_gain, -90, 90),
+    Real("lowest_gain", &Recipe::min_gain, -90, 90),
+    Real("highest_gain", &Recipe::max_gain, -90, 90),
     Real("start_share", &Recipe::start_share, 0, 1),
     Real("turn_share", &Recipe::turn_share, 0, 1),
     Real("speed_share", &Recipe::speed_share, 0, 1),
@@ -49,12 +49,12 @@ constexpr Entry kEntries[] = {
     Real("mix_share", &Recipe::mix_share, 0, 1),
     Real("mix_range", &Recipe::mix_range, 0, 90),
     Real("noise_share", &Recipe::noise_share, 0, 1),
-    Real("lowest_snr", &Recipe::lowest_snr, -90, 90),
-    Real("highest_snr", &Recipe::highest_snr, -90, 90),
+    Real("lowest_snr", &Recipe::min_snr, -90, 90),
+    Real("highest_snr", &Recipe::max_snr, -90, 90),
     Real("tilt", &Recipe::tilt, 0, 200),
     Real("shift_share", &Recipe::shift_share, 0, 1),
     Whole("time_masks", &Recipe::time_masks, 0, 100),
-    Whole("longest_time_mask", &Recipe::longest_time_mask, 1, 382),
+    Whole("longest_time_mask", &Recipe::max_time_mask, 1, 382),
     Whole("channel_masks", &Recipe::channel_masks, 0, 48),
     Whole("widest_channel_mask", &Recipe::widest_channel_mask, 1, 48),
 };
@@ -71,7 +71,7 @@ void CheckRanges(const Recipe& recipe, const std::string& path) {
     throw std::runtime_error(path + ": batch is " + std::to_string(recipe.batch) +
                              ", should be even: two threads share it");
   }
-  if (recipe.lowest_gain > recipe.highest_gain || recipe.lowest_snr > recipe.highest_snr) {
+  if (recipe.min_gain > recipe.max_gain || recipe.min_snr > recipe.max_snr) {
     throw std::runtime_error(path + ": a lowest gain or SNR is above the highest");
   }
 }
@@ -110,14 +110,14 @@ Recipe ReadRecipe(const std::string& path) {
     std::istringstream words(line.substr(0, line.find('#')));
     std::string name, value, more;
     if (!(words >> name)) continue;
-    const std::string place = path + ": line " + std::to_string(number) + ": ";
+    const std::string location = path + ": line " + std::to_string(number) + ": ";
     if (!(words >> value) || words >> more) {
-      throw std::runtime_error(place + "should be a name and a value");
+      throw std::runtime_error(location + "should be a name and a value");
     }
     try {
       SetInRecipe(name, value, &recipe);
     } catch (const std::runtime_error& error) {
-      throw std::runtime_error(place + error.what());
+      throw std::runtime_error(location + error.what());
     }
   }
   if (file.bad()) throw std::runtime_error(path + ": can't be read: " + std::strerror(errno));

@@ -22,8 +22,8 @@ struct Recipe {
   double sharpness = 3;  // of the soft maximum over windows
 
   // Sound. Shares are of sequences, levels in dB.
-  double lowest_gain = -20;
-  double highest_gain = 6;
+  double min_gain = -20;
+  double max_gain = 6;
   double start_share = 0.3;  // a clip begins with its first loud sound, and the sequence with it
   double turn_share = 0.5;   // of the others: a clip begins anywhere in itself and goes round
   double speed_share = 0.5;  // played faster or slower
@@ -31,14 +31,14 @@ struct Recipe {
   double mix_share = 0.5;  // another clip is added
   double mix_range = 6;    // its gain relative to the first
   double noise_share = 0.4;
-  double lowest_snr = 5;
-  double highest_snr = 35;
+  double min_snr = 5;
+  double max_snr = 35;
 
   // Features.
   double tilt = 12;          // up to this much from the middle to an end of the channels
   double shift_share = 0.3;  // all channels a place up or down
   int time_masks = 2;
-  int longest_time_mask = 40;  // frames
+  int max_time_mask = 40;  // frames
   int channel_masks = 1;
   int widest_channel_mask = 6;
 };

@@ -1,11 +1,11 @@
-#include "state_file.h"
+#include "train/state_file.h"
 
 #include <cstring>
 #include <filesystem>
 #include <stdexcept>
 
-#include "digest.h"
-#include "model_files.h"
+#include "base/digest.h"
+#include "model/model_files.h"
 
 namespace qz::train {
 namespace {
@@ -15,13 +15,13 @@ namespace {
 constexpr char kMagic[] = "qz training state 2\n";
 
 // Of a hundred teachers and more.
-constexpr size_t kMostBytes = 128 << 20;
+constexpr size_t kMaxBytes = 128 << 20;
 
 std::string DigestOf(const std::vector<Clip>& clips) {
-  uint64_t digest = model::kDigestOfNothing;
+  uint64_t digest = base::kEmptyDigest;
   for (const Clip& clip : clips) {
-    digest = model::Digest(&clip.output, sizeof(clip.output), digest);
-    digest = model::Digest(clip.samples.data(), clip.samples.size() * sizeof(int16_t), digest);
+    digest = base::Digest(&clip.output, sizeof(clip.output), digest);
+    digest = base::Digest(clip.samples.data(), clip.samples.size() * sizeof(int16_t), digest);
   }
   return std::to_string(clips.size()) + " clips, digest " + std::to_string(digest);
 }
@@ -32,7 +32,7 @@ void ForEachField(State& state, Visit visit) {
   visit(&state.epoch, sizeof(state.epoch));
   visit(&state.phase_epoch, sizeof(state.phase_epoch));
   visit(&state.best_epoch, sizeof(state.best_epoch));
-  visit(&state.best_figure, sizeof(state.best_figure));
+  visit(&state.best_metric, sizeof(state.best_metric));
   visit(&state.adam.steps, sizeof(state.adam.steps));
   const auto visit_values = [&](auto& values) {
     visit(values.data(), values.size() * sizeof(float));
@@ -52,19 +52,19 @@ size_t SizeOf(const TrainingState& state) {
 
 }  // namespace
 
-std::string Fingerprint(const Recipe& recipe, uint64_t seed, const std::vector<Clip>& learnt,
-                        const std::vector<Clip>& judged) {
+std::string Fingerprint(const Recipe& recipe, uint64_t seed, const std::vector<Clip>& trained,
+                        const std::vector<Clip>& validated) {
   return kMagic + Describe(recipe) + "seed " + std::to_string(seed) + "\nlearns from " +
-         DigestOf(learnt) + "\njudged by " + DigestOf(judged) + "\n";
+         DigestOf(trained) + "\njudged by " + DigestOf(validated) + "\n";
 }
 
 void WriteState(const std::string& path, const std::string& fingerprint,
                 const TrainingState& state) {
   std::string bytes = fingerprint;
-  uint64_t digest = model::kDigestOfNothing;
+  uint64_t digest = base::kEmptyDigest;
   ForEachField(state, [&](const void* field, size_t size) {
     bytes.append(static_cast<const char*>(field), size);
-    digest = model::Digest(field, size, digest);
+    digest = base::Digest(field, size, digest);
   });
   bytes.append(reinterpret_cast<const char*>(&digest), sizeof(digest));
   model::WriteWholeFile(path, bytes);
@@ -72,7 +72,7 @@ void WriteState(const std::string& path, const std::string& fingerprint,
 
 std::optional<TrainingState> ReadState(const std::string& path, const std::string& fingerprint) {
   if (!std::filesystem::exists(path)) return std::nullopt;
-  const std::vector<uint8_t> bytes = model::ReadWholeFile(path, kMostBytes);
+  const std::vector<uint8_t> bytes = model::ReadWholeFile(path, kMaxBytes);
   if (bytes.size() < fingerprint.size() + sizeof(uint64_t) ||
       std::memcmp(bytes.data(), fingerprint.data(), fingerprint.size()) != 0) {
     throw std::runtime_error(path +
@@ -93,8 +93,7 @@ std::optional<TrainingState> ReadState(const std::string& path, const std::strin
     std::memcpy(field, bytes.data() + next, size);
     next += size;
   });
-  if (model::Digest(bytes.data() + fingerprint.size(), held) !=
-      model::Load<uint64_t>(bytes, next)) {
+  if (base::Digest(bytes.data() + fingerprint.size(), held) != model::Load<uint64_t>(bytes, next)) {
     throw std::runtime_error(path + ": is damaged; remove it to begin anew");
   }
   return state;

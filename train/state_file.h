@@ -4,13 +4,13 @@
 #include <optional>
 #include <string>
 
-#include "trainer.h"
+#include "train/trainer.h"
 
 namespace qz::train {
 
 // What a run depends on, as text: recipe, seed, clips.
-std::string Fingerprint(const Recipe& recipe, uint64_t seed, const std::vector<Clip>& learnt,
-                        const std::vector<Clip>& judged);
+std::string Fingerprint(const Recipe& recipe, uint64_t seed, const std::vector<Clip>& trained,
+                        const std::vector<Clip>& validated);
 
 // Writes all or nothing. Throws std::runtime_error naming the file and the cause.
 void WriteState(const std::string& path, const std::string& fingerprint,

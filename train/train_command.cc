@@ -1,36 +1,36 @@
-#include "train_command.h"
+#include "train/train_command.h"
 
 #include <cstdio>
 #include <filesystem>
 #include <optional>
 #include <stdexcept>
 
-#include "interrupt.h"
-#include "model_files.h"
-#include "packing.h"
-#include "proof.h"
-#include "state_file.h"
-#include "train_progress.h"
-#include "trainer.h"
+#include "base/interrupt.h"
+#include "model/model_files.h"
+#include "model/packing.h"
+#include "train/equivalence.h"
+#include "train/state_file.h"
+#include "train/train_progress.h"
+#include "train/trainer.h"
 
 namespace qz::train {
 namespace {
 
-constexpr int kEpochsAJudgement = 5;
+constexpr int kEpochsAValidation = 5;
 constexpr auto kBetweenStates = std::chrono::seconds(30);
 
-void PrintFigures(const TrainingState& state, const QuantisedParameters& quantised,
+void PrintMetrics(const TrainingState& state, const QuantisedParameters& quantised,
                   const std::vector<Clip>& clips, const std::vector<Batch>& features) {
   const auto line = [&](const char* what, const std::vector<Scores>& scores) {
-    const Figures figures = FiguresOf(scores, clips);
-    std::printf("%-28s mean AP %.4f, ROC AUC %.4f\n", what, figures.average_precision,
-                figures.roc_auc);
-    return figures.average_precision;
+    const Metrics metrics = MetricsOf(scores, clips);
+    std::printf("%-28s mean AP %.4f, ROC AUC %.4f\n", what, metrics.average_precision,
+                metrics.roc_auc);
+    return metrics.average_precision;
   };
-  std::vector<std::vector<Scores>> taught;
-  for (const Values& teacher : state.teachers) taught.push_back(ScoresOf(teacher, features));
-  const double first = line("float, first teacher", taught[0]);
-  const double together = line("float, all teachers together", MeanLogits(taught));
+  std::vector<std::vector<Scores>> distilled;
+  for (const Values& teacher : state.teachers) distilled.push_back(ScoresOf(teacher, features));
+  const double first = line("float, first teacher", distilled[0]);
+  const double together = line("float, all teachers together", MeanLogits(distilled));
   line("first teacher as int8", ScoresOf(QuantisedParameters(state.teachers[0]), features));
   const double model = line("int8, tuned: the model", ScoresOf(quantised, features));
   std::printf(
@@ -43,35 +43,35 @@ void PrintFigures(const TrainingState& state, const QuantisedParameters& quantis
 class Run {
  public:
   explicit Run(const TrainOptions& options) : options_(options) {}
-  programs::ExitCode Execute();
+  base::ExitCode Execute();
 
  private:
-  void CheckPlaces() const;
+  void CheckOffsets() const;
   void Load();
   void CheckClasses() const;
   void Train(Trainer* trainer, TrainingState* state);
-  void Judge(Trainer* trainer, bool tuning, TrainingState* state);
+  void Validate(Trainer* trainer, bool tuning, TrainingState* state);
   void KeepState(const TrainingState& state, bool now);
   bool Finish(const TrainingState& state) const;
 
   const TrainOptions& options_;
   Recipe recipe_;
   model::Labels labels_;
-  std::vector<Clip> learnt_;
-  std::vector<Clip> judged_clips_;
-  std::vector<Batch> judged_;
+  std::vector<Clip> trained_;
+  std::vector<Clip> validation_clips_;
+  std::vector<Batch> validated_;
   size_t skipped_ = 0;
-  std::optional<Figures> figures_;
+  std::optional<Metrics> metrics_;
   std::string fingerprint_;
   std::chrono::steady_clock::time_point last_state_ = std::chrono::steady_clock::now();
 };
 
-programs::ExitCode Run::Execute() {
-  programs::CatchInterrupt();
+base::ExitCode Run::Execute() {
+  base::CatchInterrupt();
   Load();
   CheckClasses();
-  Trainer trainer(recipe_, options_.seed, options_.threads, learnt_);
-  fingerprint_ = Fingerprint(recipe_, options_.seed, learnt_, judged_clips_) + "patience " +
+  Trainer trainer(recipe_, options_.seed, options_.threads, trained_);
+  fingerprint_ = Fingerprint(recipe_, options_.seed, trained_, validation_clips_) + "patience " +
                  std::to_string(options_.patience) + "\n";
   TrainingState state;
   if (!options_.state_file.empty()) {
@@ -89,14 +89,14 @@ programs::ExitCode Run::Execute() {
     std::fprintf(stderr, "qz-train: stopped after epoch %d; %s\n", state.epoch,
                  options_.state_file.empty() ? "nothing is kept without --state"
                                              : "the same command goes on");
-    return programs::kNotRunnable;
+    return base::kNotRunnable;
   }
-  if (!Finish(state)) return programs::kFaultFound;
-  return skipped_ == 0 ? programs::kFine : programs::kUnreadableInput;
+  if (!Finish(state)) return base::kFaultFound;
+  return skipped_ == 0 ? base::kSuccess : base::kUnreadableInput;
 }
 
 // Now, not after an hour.
-void Run::CheckPlaces() const {
+void Run::CheckOffsets() const {
   if (options_.output == options_.state_file) {
     throw std::runtime_error(options_.output + ": can't be the model and the state at once");
   }
@@ -105,7 +105,7 @@ void Run::CheckPlaces() const {
 }
 
 void Run::Load() {
-  CheckPlaces();
+  CheckOffsets();
   if (!options_.recipe_file.empty()) recipe_ = ReadRecipe(options_.recipe_file);
   labels_ = model::ReadLabels(options_.labels_file);
   ClipList list = LoadClips(dataset::ReadManifest(options_.manifest), labels_);
@@ -115,11 +115,11 @@ void Run::Load() {
   }
   for (Clip& clip : list.clips) {
     const bool held_out = options_.hold_out != 0 && clip.fold == options_.hold_out;
-    (held_out ? judged_clips_ : learnt_).push_back(std::move(clip));
+    (held_out ? validation_clips_ : trained_).push_back(std::move(clip));
   }
-  for (const Clip& clip : judged_clips_) judged_.push_back(JudgedFeatures(clip.samples));
-  std::fprintf(stderr, "learning from %zu clips, judged by %zu, %zu skipped\n", learnt_.size(),
-               judged_clips_.size(), skipped_);
+  for (const Clip& clip : validation_clips_) validated_.push_back(ValidationFeatures(clip.samples));
+  std::fprintf(stderr, "learning from %zu clips, judged by %zu, %zu skipped\n", trained_.size(),
+               validation_clips_.size(), skipped_);
 }
 
 // Of each class there are some to learn from, and some to judge by.
@@ -133,39 +133,39 @@ void Run::CheckClasses() const {
                                labels_[static_cast<size_t>(output)].class_name + "' " + purpose);
     }
   };
-  check(learnt_, "to learn from");
+  check(trained_, "to learn from");
   if (options_.hold_out == 0) return;
-  check(judged_clips_, "to judge by in fold " + std::to_string(options_.hold_out));
+  check(validation_clips_, "to judge by in fold " + std::to_string(options_.hold_out));
 }
 
 void Run::Train(Trainer* trainer, TrainingState* state) {
   TrainProgress progress(state->epoch);
-  while (!trainer->Done(*state) && !programs::Interrupted()) {
+  while (!trainer->Done(*state) && !base::Interrupted()) {
     const size_t teachers = state->teachers.size();
     const bool tuning = trainer->Tuning(*state);
     const double loss = trainer->RunEpoch(state);
     // At the end of a teacher's phase its average stays for a moment.
-    if (!judged_.empty() && state->phase_epoch % kEpochsAJudgement == 0) {
-      Judge(trainer, tuning, state);
+    if (!validated_.empty() && state->phase_epoch % kEpochsAValidation == 0) {
+      Validate(trainer, tuning, state);
     }
     progress.Show(tuning ? "tuning" : "teacher " + std::to_string(teachers + 1), state->epoch,
-                  trainer->EpochsLeft(*state), loss, figures_ ? &*figures_ : nullptr);
-    KeepState(*state, programs::Interrupted());
+                  trainer->EpochsLeft(*state), loss, metrics_ ? &*metrics_ : nullptr);
+    KeepState(*state, base::Interrupted());
   }
 }
 
-void Run::Judge(Trainer* trainer, bool tuning, TrainingState* state) {
+void Run::Validate(Trainer* trainer, bool tuning, TrainingState* state) {
   Values folded = state->average;
   if (!tuning) {
     FoldNormalisations(&folded);
     ClampWeights(&folded);
   }
-  figures_ =
-      FiguresOf(tuning ? ScoresOf(QuantisedParameters(folded), judged_) : ScoresOf(folded, judged_),
-                judged_clips_);
+  metrics_ = MetricsOf(
+      tuning ? ScoresOf(QuantisedParameters(folded), validated_) : ScoresOf(folded, validated_),
+      validation_clips_);
   if (options_.patience == 0 || tuning || state->phase_epoch == 0) return;
-  if (figures_->average_precision > state->best_figure) {
-    state->best_figure = figures_->average_precision;
+  if (metrics_->average_precision > state->best_metric) {
+    state->best_metric = metrics_->average_precision;
     state->best_epoch = state->phase_epoch;
     state->best = state->average;
   } else if (state->phase_epoch - state->best_epoch >= options_.patience) {
@@ -185,17 +185,17 @@ void Run::KeepState(const TrainingState& state, bool now) {
 bool Run::Finish(const TrainingState& state) const {
   const QuantisedParameters quantised(state.average);
   const model::PackedModel packed = model::Pack(ArraysOf(quantised));
-  const std::vector<Clip>& clips = judged_clips_.empty() ? learnt_ : judged_clips_;
-  std::vector<Batch> features = judged_;
+  const std::vector<Clip>& clips = validation_clips_.empty() ? trained_ : validation_clips_;
+  std::vector<Batch> features = validated_;
   if (features.empty()) {
-    for (const Clip& clip : clips) features.push_back(JudgedFeatures(clip.samples));
+    for (const Clip& clip : clips) features.push_back(ValidationFeatures(clip.samples));
   }
   std::printf("%s: on %zu clips that were %s:\n", options_.output.c_str(), clips.size(),
-              judged_clips_.empty() ? "learnt from" : "held out");
-  PrintFigures(state, quantised, clips, features);
-  const Proof proof = Prove(quantised, packed, features);
-  std::printf("%s\n", Sentence(proof).c_str());
-  if (!proof.difference.empty()) return false;
+              validation_clips_.empty() ? "learnt from" : "held out");
+  PrintMetrics(state, quantised, clips, features);
+  const EquivalenceCheck check = Prove(quantised, packed, features);
+  std::printf("%s\n", Message(check).c_str());
+  if (!check.difference.empty()) return false;
   model::WriteWholeFile(options_.output, std::string(packed.begin(), packed.end()));
   if (!options_.state_file.empty()) std::filesystem::remove(options_.state_file);
   return true;
@@ -203,6 +203,6 @@ bool Run::Finish(const TrainingState& state) const {
 
 }  // namespace
 
-programs::ExitCode TrainCommand(const TrainOptions& options) { return Run(options).Execute(); }
+base::ExitCode TrainCommand(const TrainOptions& options) { return Run(options).Execute(); }
 
 }  // namespace qz::train

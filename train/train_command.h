@@ -3,7 +3,7 @@
 #include <cstdint>
 #include <string>
 
-#include "exit_code.h"
+#include "base/exit_code.h"
 
 namespace qz::train {
 
@@ -20,6 +20,6 @@ struct TrainOptions {
 };
 
 // Learns from a list of recordings and writes a packed model. Says what went wrong itself.
-programs::ExitCode TrainCommand(const TrainOptions& options);
+base::ExitCode TrainCommand(const TrainOptions& options);
 
 }  // namespace qz::train

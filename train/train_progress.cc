@@ -1,4 +1,4 @@
-#include "train_progress.h"
+#include "train/train_progress.h"
 
 #include <unistd.h>
 
@@ -20,12 +20,12 @@ TrainProgress::~TrainProgress() {
 }
 
 void TrainProgress::Show(const std::string& phase, int done, int left, double loss,
-                         const Figures* figures) {
+                         const Metrics* metrics) {
   if (!terminal_ && done % kEpochsALine != 0 && left != 0) return;
-  char judged[64] = "";
-  if (figures != nullptr) {
-    std::snprintf(judged, sizeof(judged), "  mean AP %.3f, ROC AUC %.3f",
-                  figures->average_precision, figures->roc_auc);
+  char validated[64] = "";
+  if (metrics != nullptr) {
+    std::snprintf(validated, sizeof(validated), "  mean AP %.3f, ROC AUC %.3f",
+                  metrics->average_precision, metrics->roc_auc);
   }
   std::string bar;
   if (terminal_) {
@@ -34,7 +34,7 @@ void TrainProgress::Show(const std::string& phase, int done, int left, double lo
           std::string(static_cast<size_t>(kBarCells - filled), '.') + "] ";
   }
   std::fprintf(stderr, "%s%s, epoch %d/%d  loss %.3f%s  %s left%s", bar.c_str(), phase.c_str(),
-               done, done + left, loss, judged, TimeLeft(done, left).c_str(),
+               done, done + left, loss, validated, TimeLeft(done, left).c_str(),
                terminal_ ? "\033[K" : "\n");
   std::fflush(stderr);
   drawn_ = terminal_;

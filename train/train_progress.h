@@ -3,7 +3,7 @@
 #include <chrono>
 #include <string>
 
-#include "judge.h"
+#include "train/validation.h"
 
 namespace qz::train {
 
@@ -16,7 +16,7 @@ class TrainProgress {
   ~TrainProgress();
 
   // `figures` may be null: nothing is held out.
-  void Show(const std::string& phase, int done, int left, double loss, const Figures* figures);
+  void Show(const std::string& phase, int done, int left, double loss, const Metrics* metrics);
 
  private:
   std::string TimeLeft(int done, int left) const;

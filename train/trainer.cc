@@ -1,4 +1,4 @@
-#include "trainer.h"
+#include "train/trainer.h"
 
 #include <algorithm>
 #include <cmath>
@@ -17,7 +17,7 @@ constexpr double kWarmUpSteps = 50;
 constexpr double kPi = 3.14159265358979323846;
 
 uint64_t Mixed(uint64_t a, uint64_t b) {
-  return model::NumberGenerator(a ^ (b * 0x9E3779B97F4A7C15u)).Next();
+  return base::NumberGenerator(a ^ (b * 0x9E3779B97F4A7C15u)).Next();
 }
 
 // A class with half as many clips as the others weighs twice as much.
@@ -70,7 +70,7 @@ void Trainer::BeginPhase(TrainingState* state) const {
       Tuning(*state) ? state->teachers[0] : InitialParameters(Mixed(seed_, state->teachers.size()));
   state->average = state->values;
   state->adam = Adam();
-  state->best_figure = -1;
+  state->best_metric = -1;
 }
 
 void Trainer::EndTeacher(const Values& average, TrainingState* state) const {
@@ -83,7 +83,7 @@ void Trainer::EndTeacher(const Values& average, TrainingState* state) const {
 std::vector<size_t> Trainer::OrderOf(int epoch) const {
   std::vector<size_t> order(clips_.size());
   for (size_t i = 0; i < order.size(); ++i) order[i] = i;
-  model::NumberGenerator random(Mixed(seed_ + 1, static_cast<uint64_t>(epoch)));
+  base::NumberGenerator random(Mixed(seed_ + 1, static_cast<uint64_t>(epoch)));
   for (size_t i = order.size(); i > 1; --i) std::swap(order[i - 1], order[random.Next() % i]);
   return order;
 }
@@ -100,7 +100,7 @@ double Trainer::RunEpoch(TrainingState* state) {
   ++state->epoch;
   ++state->phase_epoch;
   if (!Tuning(*state) && state->phase_epoch == recipe_.epochs) {
-    EndTeacher(state->best_figure >= 0 ? state->best : state->average, state);
+    EndTeacher(state->best_metric >= 0 ? state->best : state->average, state);
   }
   return loss / static_cast<double>(steps);
 }
@@ -111,16 +111,16 @@ size_t Trainer::StepsAnEpoch() const {
 }
 
 void Trainer::Teach(const TrainingState& state, Shard* shard) const {
-  shard->taught = Batch();
+  shard->distilled = Batch();
   for (const Values& teacher : state.teachers) {
     const Batch& logits = shard->float_network.Forward(teacher, shard->features, nullptr);
-    if (shard->taught.sequences == 0) {
-      shard->taught = logits;
+    if (shard->distilled.sequences == 0) {
+      shard->distilled = logits;
     } else {
-      shard->taught.values += logits.values;
+      shard->distilled.values += logits.values;
     }
   }
-  shard->taught.values /= static_cast<float>(state.teachers.size());
+  shard->distilled.values /= static_cast<float>(state.teachers.size());
 }
 
 void Trainer::RunShard(const TrainingState& state, const QuantisedParameters* quantised,
@@ -129,12 +129,12 @@ void Trainer::RunShard(const TrainingState& state, const QuantisedParameters* qu
   Shard& shard = shards_[index];
   const auto sequences = static_cast<size_t>(shard.features.sequences);
   for (size_t s = 0; s < sequences; ++s) {
-    const size_t place = first + index * sequences + s;
-    augmentation_.Make(order[place % order.size()], Mixed(Mixed(seed_, step), place),
+    const size_t location = first + index * sequences + s;
+    augmentation_.Make(order[location % order.size()], Mixed(Mixed(seed_, step), location),
                        static_cast<Eigen::Index>(s), &shard.features, &shard.targets);
   }
   const auto divisor = static_cast<float>(recipe_.batch);
-  shard.gradient.assign(kParameters.learnt, 0);
+  shard.gradient.assign(kParameters.trained, 0);
   if (quantised == nullptr) {
     const TrainingNoise noise{static_cast<float>(recipe_.dropout),
                               Mixed(Mixed(seed_ + 2, step), index)};
@@ -145,7 +145,7 @@ void Trainer::RunShard(const TrainingState& state, const QuantisedParameters* qu
     Batch logits = shard.quantised_network.Forward(*quantised, shard.features);
     logits.values *= static_cast<float>(kLogitScale);
     Teach(state, &shard);
-    shard.loss = TeachingLoss(logits, shard.taught, divisor, &shard.dlogits);
+    shard.loss = TeachingLoss(logits, shard.distilled, divisor, &shard.dlogits);
     shard.quantised_network.Backward(*quantised, shard.dlogits, &shard.gradient);
   }
 }
@@ -191,8 +191,8 @@ float Trainer::RateAt(const TrainingState& state) const {
   const double all = static_cast<double>(tuning ? recipe_.tuning_epochs : recipe_.epochs) *
                      static_cast<double>(StepsAnEpoch());
   const double warmth = std::min(1.0, (done + 1) / kWarmUpSteps);
-  const double highest = tuning ? recipe_.tuning_rate : recipe_.rate;
-  return static_cast<float>(highest * warmth * 0.5 * (1 + std::cos(kPi * done / all)));
+  const double max = tuning ? recipe_.tuning_rate : recipe_.rate;
+  return static_cast<float>(max * warmth * 0.5 * (1 + std::cos(kPi * done / all)));
 }
 
 }  // namespace qz::train

@@ -6,11 +6,11 @@
 #include <functional>
 #include <vector>
 
-#include "adam.h"
-#include "augmentation.h"
-#include "judge.h"
-#include "loss.h"
-#include "recipe.h"
+#include "train/adam.h"
+#include "train/augmentation.h"
+#include "train/loss.h"
+#include "train/recipe.h"
+#include "train/validation.h"
 
 namespace qz::train {
 
@@ -24,7 +24,7 @@ struct TrainingState {
   Adam adam;
   // With patience: the average that was best in this phase.
   Values best = Values(kParameters.all);
-  double best_figure = -1;
+  double best_metric = -1;
   int best_epoch = 0;  // of the phase
 };
 
@@ -56,7 +56,7 @@ class Trainer {
     Matrix targets;
     FloatNetwork float_network;
     QuantisedNetwork quantised_network;
-    Batch taught;
+    Batch distilled;
     Batch dlogits;
     Values gradient;
     double loss = 0;

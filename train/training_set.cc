@@ -1,11 +1,11 @@
-#include "training_set.h"
+#include "train/training_set.h"
 
 #include <algorithm>
 
-#include "audio_input.h"
-#include "clip.h"
-#include "clip_features.h"
-#include "clip_scores.h"
+#include "audio/audio_input.h"
+#include "dataset/clip.h"
+#include "dataset/clip_features.h"
+#include "evaluation/clip_scores.h"
 
 namespace qz::train {
 
@@ -23,7 +23,7 @@ ClipList LoadClips(const std::vector<dataset::Recording>& recordings, const mode
   return list;
 }
 
-Batch JudgedFeatures(const std::vector<int16_t>& samples) {
+Batch ValidationFeatures(const std::vector<int16_t>& samples) {
   const std::vector<uint16_t> features = evaluation::FeaturesToPlay(samples);
   const auto frames = static_cast<int>(features.size() / dataset::kFeatureChannels);
   Batch batch;

@@ -5,9 +5,9 @@
 #include <string>
 #include <vector>
 
-#include "labels.h"
-#include "manifest.h"
-#include "matrix.h"
+#include "dataset/manifest.h"
+#include "model/labels.h"
+#include "train/matrix.h"
 
 namespace qz::train {
 
@@ -31,7 +31,7 @@ constexpr int FramesFor(int windows) { return 382 + 64 * (windows - 1); }
 
 // A clip from a fresh start and the silence behind it, as features 0 to 255, for all network runs
 // that judge it: FramesFor(runs) x 48.
-Batch JudgedFeatures(const std::vector<int16_t>& samples);
+Batch ValidationFeatures(const std::vector<int16_t>& samples);
 
 // Writes as many frames of features as a sequence of the batch holds, as floats from 0 to 255.
 void CopyFeatures(const std::vector<uint16_t>& features, Eigen::Index sequence, Batch* batch);

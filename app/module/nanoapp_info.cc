@@ -1,8 +1,8 @@
 // What a loader sees of the module: the record and the string that name it, its only exports.
 
+#include "app/nanoapp.h"
 #include "chre.h"
 #include "chre_nanoapp_info.h"
-#include "nanoapp.h"
 
 #define QZ_EXPORT __attribute__((visibility("default")))
 

@@ -1,7 +1,7 @@
 // The runtime's two audio functions: a runtime may come without them.
 
 #include "chre.h"
-#include "runtime.h"
+#include "hub/runtime/runtime.h"
 
 using qz::hub::InstalledRuntime;
 

@@ -5,7 +5,7 @@
 
 #include "chre.h"
 #include "chrex.h"
-#include "runtime.h"
+#include "hub/runtime/runtime.h"
 
 namespace qz::hub {
 namespace {

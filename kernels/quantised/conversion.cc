@@ -1,4 +1,4 @@
-#include "quantised_kernels.h"
+#include "kernels/quantised/quantised_kernels.h"
 
 extern "C" void orra_qs8_f32_vcvt_ukernel__neon_x32(size_t count, const int8_t* input,
                                                     float* output,

@@ -1,8 +1,8 @@
 #include <cstring>
 
-#include "indirection.h"
-#include "quantised_kernels.h"
-#include "requantisation.h"
+#include "kernels/quantised/indirection.h"
+#include "kernels/quantised/quantised_kernels.h"
+#include "kernels/quantised/requantisation.h"
 
 namespace {
 

@@ -1,8 +1,8 @@
 #include <algorithm>
 #include <cstring>
 
-#include "quantised_kernels.h"
-#include "requantisation.h"
+#include "kernels/quantised/quantised_kernels.h"
+#include "kernels/quantised/requantisation.h"
 
 extern "C" void orra_qs8_gemm_minmax_rndnu_ukernel_1x8__asm_aarch32_neon_mlal_lane_cortex_a7(
     size_t /*m*/, size_t n, size_t k, const int8_t* a, size_t /*a_stride*/, const void* w,

@@ -1,5 +1,5 @@
-#include "gemm_tile.h"
-#include "quantised_kernels.h"
+#include "kernels/quantised/gemm_tile.h"
+#include "kernels/quantised/quantised_kernels.h"
 
 extern "C" void orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
     size_t m, size_t n, size_t k, const int8_t* a, size_t a_stride, const void* w, int8_t* c,

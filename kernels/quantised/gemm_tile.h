@@ -6,8 +6,8 @@
 #include <cstdint>
 #include <cstring>
 
-#include "indirection.h"
-#include "requantisation.h"
+#include "kernels/quantised/indirection.h"
+#include "kernels/quantised/requantisation.h"
 
 namespace qz {
 

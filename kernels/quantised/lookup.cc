@@ -1,4 +1,4 @@
-#include "quantised_kernels.h"
+#include "kernels/quantised/quantised_kernels.h"
 
 extern "C" void orra_x8_lut_ukernel__scalar_x2(size_t count, const uint8_t* input, uint8_t* output,
                                                const uint8_t* table) {

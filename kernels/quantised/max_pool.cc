@@ -1,7 +1,7 @@
 #include <algorithm>
 
-#include "indirection.h"
-#include "quantised_kernels.h"
+#include "kernels/quantised/indirection.h"
+#include "kernels/quantised/quantised_kernels.h"
 
 extern "C" void orra_s8_maxpool_minmax_ukernel_2p2x__neon_c16(size_t positions, size_t pool_size,
                                                               size_t channels,
@@ -20,8 +20,8 @@ extern "C" void orra_s8_maxpool_minmax_ukernel_2p2x__neon_c16(size_t positions, 
       // From the second pass on, the output so far is one of the rows.
       const int8_t* so_far = entry == 0 ? first : position_out;
       for (size_t c = 0; c < channels; ++c) {
-        const int8_t largest = std::max(std::max(first[c], second[c]), so_far[c]);
-        position_out[c] = std::min(std::max(largest, low), high);
+        const int8_t max = std::max(std::max(first[c], second[c]), so_far[c]);
+        position_out[c] = std::min(std::max(max, low), high);
       }
     }
     const size_t entries = pool_size + pool_size % 2;

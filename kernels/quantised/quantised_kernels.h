@@ -28,9 +28,9 @@
 // Rows that one call of the matrix kernels with float scales may have. On a hub's processor that is
 // one tile; a PC's texts take any number, so that they unpack the weights once for all rows.
 #ifdef QZ_KERNELS_X86_64
-constexpr size_t kMostRows = SIZE_MAX;
+constexpr size_t kMaxRows = SIZE_MAX;
 #else
-constexpr size_t kMostRows = 4;
+constexpr size_t kMaxRows = 4;
 #endif
 
 extern "C" {

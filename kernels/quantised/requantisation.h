@@ -8,7 +8,7 @@
 #include <cstdint>
 #include <cstring>
 
-#include "quantised_kernels.h"
+#include "kernels/quantised/quantised_kernels.h"
 
 namespace qz {
 

@@ -1,9 +1,9 @@
 // The three radix-4 butterfly stages of the complex FFT: they differ in where the entries and the
 // twiddles of a butterfly lie.
 
-#include "signal_arithmetic.h"
-#include "signal_kernels.h"
-#include "signal_tables.h"
+#include "kernels/signal/signal_arithmetic.h"
+#include "kernels/signal/signal_kernels.h"
+#include "kernels/signal/signal_tables.h"
 
 namespace {
 

@@ -1,7 +1,7 @@
 // From the complex FFT of sample pairs to the spectrum of the real samples.
 
-#include "signal_arithmetic.h"
-#include "signal_kernels.h"
+#include "kernels/signal/signal_arithmetic.h"
+#include "kernels/signal/signal_kernels.h"
 
 using qz::signal::Complex;
 using qz::signal::Rotated;

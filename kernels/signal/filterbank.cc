@@ -1,6 +1,6 @@
 // Energies of overlapping triangular channels.
 
-#include "signal_kernels.h"
+#include "kernels/signal/signal_kernels.h"
 
 extern "C" void orra_u32_filterbank_accumulate_ukernel__asm_aarch32_neon_x2(size_t rows,
                                                                             const uint32_t* input,

@@ -1,6 +1,6 @@
 // Block normalisation of a frame.
 
-#include "signal_kernels.h"
+#include "kernels/signal/signal_kernels.h"
 
 extern "C" void orra_i16_vlshift_ukernel__neon_x32(size_t count, const int16_t* input,
                                                    int16_t* output, uint32_t shift) {

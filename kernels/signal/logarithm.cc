@@ -1,7 +1,7 @@
 // Table-driven natural logarithm in Q16.
 
-#include "signal_kernels.h"
-#include "signal_tables.h"
+#include "kernels/signal/signal_kernels.h"
+#include "kernels/signal/signal_tables.h"
 
 namespace {
 
@@ -28,7 +28,7 @@ inline uint32_t Log2(uint32_t y) {
 extern "C" void orra_u32_vlog_ukernel__scalar_x1(size_t count, const uint32_t* input,
                                                  uint32_t input_shift, uint32_t output_scale,
                                                  uint16_t* output) {
-  constexpr uint32_t kLargest = 32767;
+  constexpr uint32_t kMax = 32767;
   for (size_t i = 0; i < count; ++i) {
     const uint32_t y = input_shift < 32 ? input[i] << input_shift : 0;
     if (y == 0) {
@@ -37,6 +37,6 @@ extern "C" void orra_u32_vlog_ukernel__scalar_x1(size_t count, const uint32_t* i
     }
     const uint32_t natural = static_cast<uint32_t>((Log2(y) * kLn2 + 32768) >> 16);
     const uint32_t scaled = output_scale * natural + 32768;
-    output[i] = static_cast<uint16_t>(scaled < kLargest << 16 ? scaled >> 16 : kLargest);
+    output[i] = static_cast<uint16_t>(scaled < kMax << 16 ? scaled >> 16 : kMax);
   }
 }

@@ -2,7 +2,7 @@
 
 #include <algorithm>
 
-#include "signal_kernels.h"
+#include "kernels/signal/signal_kernels.h"
 
 extern "C" void orra_u32_filterbank_subtract_ukernel__scalar_x2(
     size_t count, const uint32_t* input, uint32_t smoothing_even, uint32_t smoothing_odd,

@@ -1,6 +1,6 @@
 // Squared magnitudes of complex bins.
 
-#include "signal_kernels.h"
+#include "kernels/signal/signal_kernels.h"
 
 extern "C" void orra_cs16_vsquareabs_ukernel__neon_mlal_ld128_x8(size_t bytes, const int16_t* input,
                                                                  uint32_t* output) {

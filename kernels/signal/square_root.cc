@@ -2,7 +2,7 @@
 
 #include <cmath>
 
-#include "signal_kernels.h"
+#include "kernels/signal/signal_kernels.h"
 
 namespace {
 

@@ -2,7 +2,7 @@
 
 #include <algorithm>
 
-#include "signal_kernels.h"
+#include "kernels/signal/signal_kernels.h"
 
 extern "C" void orra_s16_window_shift12_ukernel__neon_x32(size_t rows, size_t row_bytes,
                                                           const int16_t* input,

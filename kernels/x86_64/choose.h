@@ -3,7 +3,7 @@
 // another file, and nothing has to be remembered.
 #pragma once
 
-#include "processor.h"
+#include "kernels/x86_64/processor.h"
 
 namespace qz {
 

@@ -1,4 +1,4 @@
-#include "processor.h"
+#include "kernels/x86_64/processor.h"
 
 #include <cpuid.h>
 

@@ -1,5 +1,5 @@
-#include "choices.h"
-#include "choose.h"
-#include "signal_kernels.h"
+#include "kernels/signal/signal_kernels.h"
+#include "kernels/x86_64/choices.h"
+#include "kernels/x86_64/choose.h"
 
 QZ_SIGNAL_CHOICES(QZ_CHOOSE)

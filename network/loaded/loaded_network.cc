@@ -1,4 +1,4 @@
-#include "loaded_network.h"
+#include "network/loaded/loaded_network.h"
 
 namespace qz {
 

@@ -1,7 +1,7 @@
 // In the place of the generated header: tables that are filled in at run time.
 #pragma once
 
-#include "loaded_network.h"
+#include "network/loaded/loaded_network.h"
 
 namespace {
 

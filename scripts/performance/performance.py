@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
-"""Rewrites what docs/performance.md says of one `make bench-peers`, and its picture.
+"""Rewrites what docs/performance.md says of one `make bench-baselines`, and its picture.
 
-Usage: performance.py FOLDER, which holds what bench-peers.sh left there:
+Usage: performance.py FOLDER, which holds what bench-baselines.sh left there:
   table.md   the table of peers          raw.txt    its raw lines
   parts.txt  our operators one by one    gains.txt  our kernels' texts side by side
 """

@@ -1,6 +1,6 @@
 // Entry points, dispatch, the microphone and the client nanoapps.
 
-#include "linked_nanoapp.h"
+#include "tests/app/linked_nanoapp.h"
 
 namespace qz::test {
 namespace {

@@ -2,10 +2,10 @@
 
 #include <set>
 
-#include "app_manager.h"
+#include "app/app_manager.h"
 #include "chre/singleton.h"
-#include "linked_nanoapp.h"
-#include "random.h"
+#include "tests/app/linked_nanoapp.h"
+#include "tests/support/random.h"
 
 namespace qz::test {
 namespace {

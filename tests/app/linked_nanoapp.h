@@ -2,10 +2,10 @@
 // detection tables with which things are detected, and with the hub's own audio functions.
 #pragma once
 
-#include "nanoapp.h"
-#include "nanoapp_record.h"
-#include "stub_network.h"
-#include "test_hub.h"
+#include "app/nanoapp.h"
+#include "tests/support/nanoapp_record.h"
+#include "tests/support/stub_network.h"
+#include "tests/support/test_hub.h"
 
 namespace qz::test {
 
@@ -22,7 +22,7 @@ class LinkedNanoapp : public testing::Test, protected TestHub {
 
   void Start() {
     hub::LoadFailure failure;
-    ASSERT_TRUE(hub.StartLinked(kLinkedInfo, &failure)) << failure.sentence;
+    ASSERT_TRUE(hub.StartLinked(kLinkedInfo, &failure)) << failure.message;
     TakeLog();
   }
   bool audio() { return hub.audio_enabled(); }

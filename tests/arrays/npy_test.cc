@@ -6,8 +6,8 @@
 #include <fstream>
 #include <iterator>
 
-#include "npz_file.h"
-#include "temporary_folder.h"
+#include "arrays/npz_file.h"
+#include "tests/support/temporary_folder.h"
 
 namespace qz::arrays {
 namespace {
@@ -163,9 +163,9 @@ TEST_F(Npz, RefusesWhatIsTooLargeOrDamaged) {
 // Whatever a byte turns into, it ends in an error or an archive.
 TEST_F(Npz, OutlivesAnyByte) {
   int refused = 0;
-  for (size_t place = 0; place < archive_.size(); ++place) {
+  for (size_t location = 0; location < archive_.size(); ++location) {
     std::string bytes = archive_;
-    bytes[place] ^= "\x01\x80\xFF"[place % 3];
+    bytes[location] ^= "\x01\x80\xFF"[location % 3];
     refused += !ErrorOf(bytes).empty();
   }
   EXPECT_GT(refused, 200);

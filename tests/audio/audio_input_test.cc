@@ -1,6 +1,6 @@
 // What comes out of sound files of all kinds, and what is said of those that can't be used.
 
-#include "audio_input.h"
+#include "audio/audio_input.h"
 
 #include <gmock/gmock.h>
 #include <unistd.h>
@@ -10,8 +10,8 @@
 #include <limits>
 #include <vector>
 
-#include "random.h"
-#include "sound_folder.h"
+#include "tests/support/random.h"
+#include "tests/support/sound_folder.h"
 
 namespace qz::audio {
 namespace {
@@ -55,9 +55,9 @@ std::vector<int16_t> Tone(double hz, int rate_hz, double seconds, double amplitu
 
 // The largest difference of two sounds but at their ends, where a resampler knows no neighbours.
 int Difference(const std::vector<int16_t>& a, const std::vector<int16_t>& b) {
-  int largest = 0;
-  for (size_t i = 500; i < a.size() - 500; ++i) largest = std::max(largest, std::abs(a[i] - b[i]));
-  return largest;
+  int max = 0;
+  for (size_t i = 500; i < a.size() - 500; ++i) max = std::max(max, std::abs(a[i] - b[i]));
+  return max;
 }
 
 class AudioInputTest : public testing::Test, protected test::SoundFolder {};

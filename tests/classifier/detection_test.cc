@@ -5,9 +5,9 @@
 #include <string>
 #include <vector>
 
-#include "audio_classifier.h"
-#include "stub_network.h"
-#include "test_hub.h"
+#include "classifier/audio_classifier.h"
+#include "tests/support/stub_network.h"
+#include "tests/support/test_hub.h"
 
 namespace tarn::contexthub::sound {
 namespace {

@@ -6,11 +6,11 @@
 #include <array>
 #include <vector>
 
-#include "audio_classifier.h"
-#include "audio_frontend.h"
-#include "random.h"
-#include "stub_network.h"
-#include "test_hub.h"
+#include "classifier/audio_classifier.h"
+#include "frontend/audio_frontend.h"
+#include "tests/support/random.h"
+#include "tests/support/stub_network.h"
+#include "tests/support/test_hub.h"
 
 namespace {
 

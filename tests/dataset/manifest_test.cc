@@ -1,12 +1,12 @@
 // Lists of recordings: what a list says, and what is said of lists that can't be used.
 
-#include "manifest.h"
+#include "dataset/manifest.h"
 
 #include <gmock/gmock.h>
 
 #include <string>
 
-#include "temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 namespace qz::dataset {
 namespace {

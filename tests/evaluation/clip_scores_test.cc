@@ -1,6 +1,6 @@
 // Scores of clips against the model evaluated plainly over windows of the clip's features.
 
-#include "clip_scores.h"
+#include "evaluation/clip_scores.h"
 
 #include <gtest/gtest.h>
 
@@ -8,9 +8,9 @@
 #include <cmath>
 #include <set>
 
-#include "clip_features.h"
-#include "random.h"
-#include "standin_model.h"
+#include "dataset/clip_features.h"
+#include "model/synthetic_model.h"
+#include "tests/support/random.h"
 
 namespace qz::evaluation {
 namespace {
@@ -45,32 +45,32 @@ Scores ReferenceRun(const PackedModel& packed, const uint16_t* features, uint64_
 }
 
 TEST(ClipScores, EqualThePlainEvaluationOfEachWindow) {
-  const PackedModel standin = model::MakeStandinModel(1);
-  const PackedModel other = model::MakeStandinModel(2);
-  for (const PackedModel* packed : {&standin, &other}) {
+  const PackedModel synthetic = model::MakeSyntheticModel(1);
+  const PackedModel other = model::MakeSyntheticModel(2);
+  for (const PackedModel* packed : {&synthetic, &other}) {
     std::vector<int16_t> sound = Sound(80000);
     const ClipScores scores = ScoreClip(*packed, sound);
     sound.resize(96000);  // 3 buffers, of which 598 frames come
     const std::vector<uint16_t> features = dataset::FeaturesOf(sound.data(), sound.size());
     uint64_t digest = 0xCBF29CE484222325u;
-    Scores highest{};
+    Scores max{};
     ASSERT_EQ(scores.runs.size(), 4u);
     for (size_t run = 0; run < 4; ++run) {
       const Scores expected =
           ReferenceRun(*packed, features.data() + run * 64 * dataset::kFeatureChannels, &digest);
       EXPECT_EQ(scores.runs[run], expected) << "run " << run;
-      for (size_t i = 0; i < highest.size(); ++i) highest[i] = std::max(highest[i], expected[i]);
+      for (size_t i = 0; i < max.size(); ++i) max[i] = std::max(max[i], expected[i]);
     }
-    EXPECT_EQ(scores.highest, highest);
+    EXPECT_EQ(scores.max, max);
     EXPECT_EQ(scores.digest, digest);
     EXPECT_GT(std::set<Scores>(scores.runs.begin(), scores.runs.end()).size(), 1u)
         << "too dull a sound to tell anything";
   }
-  EXPECT_NE(ScoreClip(standin, Sound(80000)).digest, ScoreClip(other, Sound(80000)).digest);
+  EXPECT_NE(ScoreClip(synthetic, Sound(80000)).digest, ScoreClip(other, Sound(80000)).digest);
 }
 
 TEST(ClipScores, DoNotDependOnWhatWasHeardBefore) {
-  const PackedModel packed = model::MakeStandinModel(1);
+  const PackedModel packed = model::MakeSyntheticModel(1);
   const uint64_t fresh = ScoreClip(packed, Sound(50000)).digest;
   ScoreClip(packed, std::vector<int16_t>(200000, 30000));
   EXPECT_EQ(ScoreClip(packed, Sound(50000)).digest, fresh);

@@ -6,10 +6,10 @@
 #include <filesystem>
 #include <sstream>
 
-#include "clip_scores.h"
-#include "model_files.h"
-#include "qz_program.h"
-#include "standin_model.h"
+#include "evaluation/clip_scores.h"
+#include "model/model_files.h"
+#include "model/synthetic_model.h"
+#include "tests/tools/qz_program.h"
 
 namespace qz::test {
 namespace {
@@ -58,7 +58,7 @@ class EvalCommand : public QzProgram {
                              const model::PackedModel& packed) const {
     const std::string file = std::to_string(fold) + name + ".wav";
     std::string line = file + '\t' + name + '\t' + std::to_string(fold);
-    for (const float score : evaluation::ScoreClip(packed, Sound(file)).highest) {
+    for (const float score : evaluation::ScoreClip(packed, Sound(file)).max) {
       char text[32];
       std::snprintf(text, sizeof text, "\t%.8f", static_cast<double>(score));
       line += text;
@@ -91,14 +91,14 @@ TEST_F(EvalCommand, MeasuresTheModuleModelOnAllFoldsButTheNoughth) {
 
 TEST_F(EvalCommand, ScoresEachFoldByItsOwnModel) {
   for (const uint64_t seed : {1, 2}) {
-    const model::PackedModel packed = model::MakeStandinModel(seed);
+    const model::PackedModel packed = model::MakeSyntheticModel(seed);
     WriteBytes("model" + std::to_string(seed), {packed.begin(), packed.end()});
   }
   ASSERT_EQ(Eval("list.tsv --fold-model 2=model2 --fold-model 1=model1 --scores-out s"), 0) << err_;
   EXPECT_THAT(out_, HasSubstr("\nfold 1: model model1\nfold 2: model model2\n"));
   EXPECT_THAT(out_, HasSubstr("\nMeans over the folds:\n"));
-  EXPECT_THAT(Contents("s"), HasSubstr(ExpectedScores("rooster", 1, model::MakeStandinModel(1))));
-  EXPECT_THAT(Contents("s"), HasSubstr(ExpectedScores("rooster", 2, model::MakeStandinModel(2))));
+  EXPECT_THAT(Contents("s"), HasSubstr(ExpectedScores("rooster", 1, model::MakeSyntheticModel(1))));
+  EXPECT_THAT(Contents("s"), HasSubstr(ExpectedScores("rooster", 2, model::MakeSyntheticModel(2))));
 }
 
 TEST_F(EvalCommand, NamesSkipsAndCountsWhatCannotBeRead) {
@@ -123,9 +123,9 @@ TEST_F(EvalCommand, NamesSkipsAndCountsWhatCannotBeRead) {
 TEST_F(EvalCommand, SaysInOneLineWhyItMeasuresNothing) {
   WriteBytes("no_tick.tsv", LinesWithout("clock_tick\t2"));
   WriteBytes("wrong.tsv", lines_ + "a.wav\train\n");
-  model::PackedModel unsound = model::MakeStandinModel(1);
-  model::Store<int8_t>(unsound, model::kTables[4].WeightOffset(0, 0, 0), -128);
-  WriteBytes("unsound", {unsound.begin(), unsound.end()});
+  model::PackedModel invalid = model::MakeSyntheticModel(1);
+  model::Store<int8_t>(invalid, model::kTables[4].WeightOffset(0, 0, 0), -128);
+  WriteBytes("unsound", {invalid.begin(), invalid.end()});
   const std::tuple<std::string, int, std::string> cases[] = {
       {"no_tick.tsv --fold 2", 3, "no_tick.tsv: fold 2: no clip of clock_tick, should be"},
       {"list.tsv --fold 3", 3, "list.tsv: fold 3: no clip of dog_bark, baby_cry, rooster, clock"},

@@ -1,6 +1,6 @@
 // Figures of merit: values worked out by hand, and the definitions followed word by word.
 
-#include "ranking.h"
+#include "evaluation/ranking.h"
 
 #include <gtest/gtest.h>
 
@@ -8,7 +8,7 @@
 #include <cmath>
 #include <stdexcept>
 
-#include "random.h"
+#include "tests/support/random.h"
 
 namespace qz::evaluation {
 namespace {

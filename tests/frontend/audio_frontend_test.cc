@@ -1,7 +1,7 @@
 // The front end's features against the same analysis in double precision and against recorded ones,
 // and its noise memory.
 
-#include "audio_frontend.h"
+#include "frontend/audio_frontend.h"
 
 #include <gmock/gmock.h>
 
@@ -10,7 +10,7 @@
 #include <complex>
 #include <vector>
 
-#include "random.h"
+#include "tests/support/random.h"
 
 namespace {
 
@@ -45,8 +45,9 @@ TEST(AudioFrontend, StaysCloseToItsMathematics) {
     const Samples frame = qz::test::Random(level).Fill<int16_t>(kFrameSamples, -level, level);
     double energies[48] = {};
     for (int bin = 4; bin <= 240; ++bin) {
-      const double power = Power(frame, bin), place = (Mel(31.25 * bin) - Mel(100)) / spacing - 1;
-      for (int c = 0; c < 48; ++c) energies[c] += power * std::max(0.0, 1 - std::abs(place - c));
+      const double power = Power(frame, bin),
+                   location = (Mel(31.25 * bin) - Mel(100)) / spacing - 1;
+      for (int c = 0; c < 48; ++c) energies[c] += power * std::max(0.0, 1 - std::abs(location - c));
     }
     audio_frontend_reset();
     const Features features = RunFrame(frame);

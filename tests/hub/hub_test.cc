@@ -1,9 +1,9 @@
-#include "hub.h"
+#include "hub/hub.h"
 
 #include <gmock/gmock.h>
 
-#include "messages.h"
-#include "nanoapp_record.h"
+#include "hub/messages.h"
+#include "tests/support/nanoapp_record.h"
 
 namespace qz::hub {
 namespace {
@@ -46,14 +46,14 @@ TEST(NanoappInfo, EveryWrongFieldIsNamed) {
       {[](auto& info) { info.appPermissions = 3; }, "permissions are 0x00000003"},
       {[](auto& info) { info.start = [] { return false; }; }, "start entry point failed"},
   };
-  for (const auto& [spoil, sentence] : cases) {
+  for (const auto& [spoil, message] : cases) {
     Hub hub;
     chreNslNanoappInfo info = kGoodRecord;
     spoil(info);
     LoadFailure failure;
     EXPECT_FALSE(hub.StartLinked(info, &failure));
     EXPECT_EQ(failure.kind, LoadFailure::Kind::kRefused);
-    EXPECT_THAT(failure.sentence, HasSubstr(sentence));
+    EXPECT_THAT(failure.message, HasSubstr(message));
   }
 }
 

@@ -1,10 +1,10 @@
 // The small file that tells what the outputs of a model answer to.
 
-#include "labels.h"
+#include "model/labels.h"
 
 #include <gmock/gmock.h>
 
-#include "temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 namespace qz::model {
 namespace {

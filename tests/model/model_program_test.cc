@@ -5,11 +5,11 @@
 #include <algorithm>
 #include <filesystem>
 
-#include "clip_features.h"
-#include "model_info.h"
-#include "qz_program.h"
-#include "standin_model.h"
-#include "synthetic_features.h"
+#include "dataset/clip_features.h"
+#include "model/synthetic_features.h"
+#include "model/synthetic_model.h"
+#include "tests/tools/qz_program.h"
+#include "tools/model/model_info.h"
 
 namespace qz::tools {
 namespace {
@@ -18,7 +18,7 @@ using model::PackedModel;
 using testing::HasSubstr;
 
 const PackedModel& Good() {
-  static const PackedModel model = model::MakeStandinModel(1);
+  static const PackedModel model = model::MakeSyntheticModel(1);
   return model;
 }
 
@@ -112,17 +112,17 @@ TEST(ModelInfo, SummarisesTensorsAsTheyAre) {
     }
     for (size_t i = 0; i < 5; ++i) scores[i] = std::max(scores[i], run.scores[i]);
   }
-  EXPECT_EQ(tensors.highest_scores, scores);
+  EXPECT_EQ(tensors.max_scores, scores);
   for (size_t op = 0; op < std::size(values); ++op) {
     const TensorSummary& summary = tensors.outputs[op];
     const auto count = [&](int value) {
       return std::count(values[op].begin(), values[op].end(), value);
     };
     EXPECT_EQ(summary.values, values[op].size()) << op;
-    EXPECT_EQ(summary.lowest, *std::min_element(values[op].begin(), values[op].end())) << op;
-    EXPECT_EQ(summary.highest, *std::max_element(values[op].begin(), values[op].end())) << op;
-    EXPECT_EQ(summary.at_lowest_int8, static_cast<uint64_t>(count(-128))) << op;
-    EXPECT_EQ(summary.at_highest_int8, static_cast<uint64_t>(count(127))) << op;
+    EXPECT_EQ(summary.min, *std::min_element(values[op].begin(), values[op].end())) << op;
+    EXPECT_EQ(summary.max, *std::max_element(values[op].begin(), values[op].end())) << op;
+    EXPECT_EQ(summary.at_min_int8, static_cast<uint64_t>(count(-128))) << op;
+    EXPECT_EQ(summary.at_max_int8, static_cast<uint64_t>(count(127))) << op;
   }
 }
 

@@ -11,13 +11,13 @@
 #include <sstream>
 #include <stdexcept>
 
-#include "check_weights.h"
-#include "model_commands.h"
-#include "model_files.h"
-#include "reference_network.h"
-#include "standin_model.h"
-#include "synthetic_features.h"
-#include "temporary_folder.h"
+#include "model/check_weights.h"
+#include "model/model_commands.h"
+#include "model/model_files.h"
+#include "model/reference_network.h"
+#include "model/synthetic_features.h"
+#include "model/synthetic_model.h"
+#include "tests/support/temporary_folder.h"
 
 namespace qz::model {
 namespace {
@@ -27,16 +27,16 @@ using testing::HasSubstr;
 using testing::StartsWith;
 
 // Each made once: that takes half a second.
-const PackedModel& Standin(uint64_t seed) {
+const PackedModel& Synthetic(uint64_t seed) {
   static std::map<uint64_t, PackedModel> models;
   PackedModel& model = models[seed];
-  if (model.empty()) model = MakeStandinModel(seed);
+  if (model.empty()) model = MakeSyntheticModel(seed);
   return model;
 }
 
 template <typename T>
 std::vector<std::string> FindingsWith(size_t offset, T value) {
-  PackedModel model = Standin(1);
+  PackedModel model = Synthetic(1);
   Store(model, offset, value);
   return CheckWeights(model);
 }
@@ -64,7 +64,7 @@ TEST(CheckWeights, NamesTheTableAndPlaceOfEveryKindOfDefect) {
   EXPECT_THAT(FindingsWith<int8_t>(weight, -127), ElementsAre());
   EXPECT_THAT(FindingsWith(scale, 0.0f), ElementsAre());
 
-  PackedModel model = Standin(1);
+  PackedModel model = Synthetic(1);
   for (int tap : {0, 1, 2}) Store<int8_t>(model, w3.WeightOffset(tap, 0, 16), 60 - 55 * tap);
   Store<int32_t>(model, w3.BiasOffset(16), 128 * (60 + 5 - 50) + 1);
   EXPECT_THAT(CheckWeights(model),
@@ -101,10 +101,10 @@ class ModelTool : public testing::Test {
 };
 
 TEST_F(ModelTool, MakesChecksAndEmbeds) {
-  EXPECT_EQ(Run("standin --seed 18446744073709551615 -o " + model_), kFine);
-  EXPECT_EQ(ReadModelFile(model_), Standin(UINT64_MAX));
-  EXPECT_EQ(Run("check " + model_), kFine);
-  EXPECT_EQ(Run("embed " + model_ + " -o " + folder_ + "a.h"), kFine);
+  EXPECT_EQ(Run("synthetic --seed 18446744073709551615 -o " + model_), kSuccess);
+  EXPECT_EQ(ReadModelFile(model_), Synthetic(UINT64_MAX));
+  EXPECT_EQ(Run("check " + model_), kSuccess);
+  EXPECT_EQ(Run("embed " + model_ + " -o " + folder_ + "a.h"), kSuccess);
   EXPECT_EQ(FilesInFolder(), 2);
   // A folder in the way lets the temporary file be written but not renamed.
   std::filesystem::create_directories(folder_ + "way/inner");
@@ -127,8 +127,8 @@ TEST_F(ModelTool, NamesUnsoundAndUnreadableModelsAndWritesNothing) {
 TEST_F(ModelTool, ExplainsItsUsage) {
   for (const char* line :
        {"", "melt", "check", "check a b", "check --fast", "labels", "embed a", "embed a -o",
-        "standin -o a", "standin --seed 1x -o a", "standin --seed 18446744073709551616 -o a",
-        "standin --seed 1 --seed 2 -o a"}) {
+        "synthetic -o a", "synthetic --seed 1x -o a", "synthetic --seed 18446744073709551616 -o a",
+        "synthetic --seed 1 --seed 2 -o a"}) {
     EXPECT_EQ(Run(line), kWrongUsage) << line;
     EXPECT_THAT(errors_, HasSubstr("usage: qz-model-tool")) << line;
   }
@@ -154,17 +154,17 @@ TEST(ReferenceNetwork, SaturatesWrapsAndRefuses) {
 }
 
 // On every machine, compiler and optimisation level.
-TEST(StandinModel, FollowsItsSeedAndNothingElse) {
+TEST(SyntheticModel, FollowsItsSeedAndNothingElse) {
   uint64_t digest = 0xCBF29CE484222325u;  // 64-bit FNV-1a
-  for (const uint8_t byte : Standin(1)) digest = (digest ^ byte) * 0x100000001B3u;
+  for (const uint8_t byte : Synthetic(1)) digest = (digest ^ byte) * 0x100000001B3u;
   EXPECT_EQ(digest, 5163167844880385850u);
-  EXPECT_NE(Standin(UINT64_MAX), Standin(1));
+  EXPECT_NE(Synthetic(UINT64_MAX), Synthetic(1));
 }
 
-TEST(StandinModel, IsSoundAndAlive) {
+TEST(SyntheticModel, IsSoundAndAlive) {
   for (uint64_t seed : {uint64_t{1}, UINT64_MAX}) {
     SCOPED_TRACE(seed);
-    const PackedModel& model = Standin(seed);
+    const PackedModel& model = Synthetic(seed);
     EXPECT_THAT(CheckWeights(model), ElementsAre());
     std::vector<NetworkRun> runs;  // on windows that the calibration did not see
     for (uint64_t s = 0; s < 40; ++s) runs.push_back(RunNetwork(model, SyntheticWindow(s)));

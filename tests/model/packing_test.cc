@@ -5,15 +5,15 @@
 #include <algorithm>
 #include <cmath>
 
-#include "array_files.h"
-#include "check_weights.h"
-#include "loaded_network.h"
-#include "npz_file.h"
-#include "operators.h"
-#include "random.h"
-#include "reference_network.h"
-#include "standin_model.h"
-#include "temporary_folder.h"
+#include "arrays/npz_file.h"
+#include "model/array_files.h"
+#include "model/check_weights.h"
+#include "model/reference_network.h"
+#include "model/synthetic_model.h"
+#include "network/loaded/loaded_network.h"
+#include "network/operators.h"
+#include "tests/support/random.h"
+#include "tests/support/temporary_folder.h"
 
 namespace qz::model {
 namespace {
@@ -21,8 +21,8 @@ namespace {
 using testing::ElementsAre;
 using testing::StartsWith;
 
-const PackedModel& Standin() {
-  static const PackedModel model = MakeStandinModel(1);
+const PackedModel& Synthetic() {
+  static const PackedModel model = MakeSyntheticModel(1);
   return model;
 }
 
@@ -100,17 +100,17 @@ TEST(Packing, PutsEveryValueWhereTheNetworkLooksForIt) {
                                            : RequantiseFixed(sum, requantisation));
     }
     EXPECT_TRUE(out == expected) << table.name;
-    const auto [lowest, highest] = std::minmax_element(out.begin(), out.end());
-    EXPECT_GT(*highest - *lowest, 50) << table.name;
+    const auto [min, max] = std::minmax_element(out.begin(), out.end());
+    EXPECT_GT(*max - *min, 50) << table.name;
   }
 }
 
 TEST(Packing, IsUndoneByUnpacking) {
-  for (const PackedModel& model : {Standin(), Pack(RandomArrays(3))}) {
+  for (const PackedModel& model : {Synthetic(), Pack(RandomArrays(3))}) {
     EXPECT_TRUE(Pack(Unpack(model)) == model);
   }
   // A bias that fits only with its zero point of -128 folded in.
-  PackedModel model = Standin();
+  PackedModel model = Synthetic();
   const TableLayout& w6 = *FindTable(6);
   Store<int32_t>(model, w6.BiasOffset(9), INT32_MIN);
   for (int input = 0; input < 60; ++input) Store<int8_t>(model, w6.WeightOffset(1, input, 9), 127);
@@ -170,7 +170,7 @@ class ArrayFiles : public testing::Test {
   static constexpr arrays::NpzLimits kLimits = {34, 1 << 18};
   using Named = std::map<std::string, arrays::NpyArray>;
 
-  ArrayFiles() { WriteModelArrays(path_, Unpack(Standin())); }
+  ArrayFiles() { WriteModelArrays(path_, Unpack(Synthetic())); }
 
   // Of the good archive with a change.
   template <typename Change>
@@ -192,7 +192,7 @@ class ArrayFiles : public testing::Test {
 };
 
 TEST_F(ArrayFiles, HoldAModelToTheByte) {
-  EXPECT_TRUE(Pack(ReadModelArrays(path_)) == Standin());
+  EXPECT_TRUE(Pack(ReadModelArrays(path_)) == Synthetic());
   const Named arrays = arrays::ReadNpz(path_, kLimits);
   EXPECT_EQ(arrays.size(), 34u);
   EXPECT_THAT(arrays.at("w0.weight").shape, ElementsAre(3, 48));

@@ -9,11 +9,11 @@
 #include <vector>
 
 #include "logistic_table.h"
-#include "model_files.h"
-#include "operators.h"
-#include "random.h"
-#include "reference_network.h"
-#include "synthetic_features.h"
+#include "model/model_files.h"
+#include "model/reference_network.h"
+#include "model/synthetic_features.h"
+#include "network/operators.h"
+#include "tests/support/random.h"
 
 namespace qz::test {
 namespace {

@@ -1,5 +1,5 @@
 #include "chre/dynamic_vector.h"
-#include "test_hub.h"
+#include "tests/support/test_hub.h"
 
 namespace {
 

@@ -1,6 +1,6 @@
-#include "messages.h"
-#include "sound_detection_proto_helper.h"
-#include "test_hub.h"
+#include "hub/messages.h"
+#include "proto/sound_detection_proto_helper.h"
+#include "tests/support/test_hub.h"
 
 namespace tarn::contexthub::sound {
 namespace {
@@ -30,8 +30,8 @@ class Codec : public testing::Test {
   template <typename Request>
   static int ClientId(bool (*decode)(const uint8_t*, uint32_t, Request*), const Bytes& bytes) {
     Request request = {};
-    const bool fine = decode(bytes.data(), static_cast<uint32_t>(bytes.size()), &request);
-    return fine ? request.client_id : -1;
+    const bool success = decode(bytes.data(), static_cast<uint32_t>(bytes.size()), &request);
+    return success ? request.client_id : -1;
   }
 
   qz::test::TestHub runtime_;

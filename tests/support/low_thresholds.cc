@@ -1,7 +1,7 @@
 // Detection tables with which things are detected; linked into a suite, they take the place of the
 // default.
 
-#include "detection_tables.h"
+#include "classifier/detection_tables.h"
 
 namespace tarn::contexthub::sound {
 

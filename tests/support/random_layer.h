@@ -6,8 +6,8 @@
 #include <utility>
 #include <vector>
 
-#include "quantised_kernels.h"
-#include "random.h"
+#include "kernels/quantised/quantised_kernels.h"
+#include "tests/support/random.h"
 
 namespace qz::test {
 

@@ -7,7 +7,7 @@
 #include <string>
 #include <vector>
 
-#include "temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 namespace qz::test {
 

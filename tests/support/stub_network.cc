@@ -1,8 +1,8 @@
-#include "stub_network.h"
+#include "tests/support/stub_network.h"
 
 #include <algorithm>
 
-#include "mobilenet_backend.h"
+#include "network/mobilenet_backend.h"
 
 namespace {
 

@@ -9,8 +9,8 @@
 #include <utility>
 #include <vector>
 
-#include "hub.h"
-#include "messages.h"
+#include "hub/hub.h"
+#include "hub/messages.h"
 
 namespace qz::test {
 

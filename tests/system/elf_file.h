@@ -51,7 +51,7 @@ class ElfFile {
   }
 
   // What the loader is told under a tag such as DT_NEEDED, of those that name a file or folder.
-  std::set<std::string> Told(int tag) const {
+  std::set<std::string> Reported(int tag) const {
     const Section& section = sections.at(".dynamic");
     std::set<std::string> names;
     for (size_t i = 0; i < section.sh_size / sizeof(ElfW(Dyn)); ++i) {
@@ -89,7 +89,7 @@ class ElfFile {
 
   // Where the pointer at a place points once its relocation has been applied, before the module's
   // base is added; 0 when it has none.
-  Address Pointer(Address place) const {
+  Address Pointer(Address location) const {
 #if __SIZEOF_POINTER__ == 4
     using Relocation = ElfW(Rel);
     const char* const table = ".rel.dyn";
@@ -109,7 +109,7 @@ class ElfFile {
     const Section& section = sections.at(table);
     for (size_t i = 0; i < section.sh_size / sizeof(Relocation); ++i) {
       const auto r = At<Relocation>(section.sh_offset + i * sizeof(Relocation));
-      if (r.r_offset != place) continue;
+      if (r.r_offset != location) continue;
       const auto symbol =
           At<Symbol>(sections.at(".dynsym").sh_offset + symbol_of(r) * sizeof(Symbol));
       return symbol.st_value + addend(r);

@@ -4,7 +4,7 @@
 #include <gmock/gmock.h>
 
 #include "chre_nanoapp_info.h"
-#include "elf_file.h"
+#include "tests/system/elf_file.h"
 
 namespace qz::test {
 namespace {
@@ -27,7 +27,7 @@ class ModuleFile : public testing::Test {
     const auto found = symbols.find(name);
     return found == symbols.end() ? ElfFile::Symbol{} : found->second;
   }
-  ElfFile::Address Place(const std::string& name) const { return Defined(name).st_value; }
+  ElfFile::Address Location(const std::string& name) const { return Defined(name).st_value; }
 
   const ElfFile file_{QZ_MODULE};
 };
@@ -42,11 +42,11 @@ TEST_F(ModuleFile, HoldsTheUnstableIdInASectionOfItsOwn) {
   const ElfFile::Section& section = file_.sections.at(".unstable_id");
   EXPECT_EQ(file_.Loaded(section.sh_addr, section.sh_size), id + '\0');
   EXPECT_EQ(section.sh_flags, ElfW(Word){SHF_ALLOC});
-  EXPECT_EQ(Place("_chreNanoappUnstableId"), section.sh_addr);
+  EXPECT_EQ(Location("_chreNanoappUnstableId"), section.sh_addr);
 }
 
 TEST_F(ModuleFile, SaysWhatItIs) {
-  const ElfFile::Address at = Place("_chreNslDsoNanoappInfo");
+  const ElfFile::Address at = Location("_chreNslDsoNanoappInfo");
   constexpr size_t kVendor = offsetof(chreNslNanoappInfo, vendor);
   constexpr size_t kAppId = offsetof(chreNslNanoappInfo, appId);
   constexpr size_t kStart = offsetof(chreNslNanoappInfo, start);
@@ -66,10 +66,10 @@ TEST_F(ModuleFile, SaysWhatItIs) {
   constexpr size_t kPointer = sizeof(void*);
   EXPECT_EQ(file_.LoadedString(file_.Pointer(at + kVendor)), "Tamrex");
   EXPECT_EQ(file_.LoadedString(file_.Pointer(at + kVendor + kPointer)), "QZ");
-  EXPECT_EQ(file_.Pointer(at + kStart), Place("nanoappStart"));
-  EXPECT_EQ(file_.Pointer(at + kStart + kPointer), Place("nanoappHandleEvent"));
-  EXPECT_EQ(file_.Pointer(at + kStart + 2 * kPointer), Place("nanoappEnd"));
-  EXPECT_EQ(file_.Pointer(at + kStart + 3 * kPointer), Place("_chreNanoappUnstableId"));
+  EXPECT_EQ(file_.Pointer(at + kStart), Location("nanoappStart"));
+  EXPECT_EQ(file_.Pointer(at + kStart + kPointer), Location("nanoappHandleEvent"));
+  EXPECT_EQ(file_.Pointer(at + kStart + 2 * kPointer), Location("nanoappEnd"));
+  EXPECT_EQ(file_.Pointer(at + kStart + 3 * kPointer), Location("_chreNanoappUnstableId"));
   EXPECT_EQ(file_.Loaded(at + kStart + 4 * kPointer, 4), std::string("\1\0\0\0", 4));
 }
 
@@ -82,9 +82,9 @@ TEST_F(ModuleFile, ImportsTheRuntimeAndLittleElse) {
       ElementsAre("chreGetEstimatedHostTimeOffset", "chreGetTime", "chreHeapAlloc", "chreHeapFree",
                   "chreLog", "chreSendEvent", "chreSendMessageToHostEndpoint",
                   "chrexClockRateChangeRequest", "dlsym", "memcpy", "memmove", "memset"));
-  EXPECT_THAT(file_.Told(DT_NEEDED), ElementsAre("libc.so.6", "libchre_runtime.so"));
+  EXPECT_THAT(file_.Reported(DT_NEEDED), ElementsAre("libc.so.6", "libchre_runtime.so"));
   // No folder of the machine that built it.
-  EXPECT_THAT(file_.Told(DT_RUNPATH), ElementsAre("$ORIGIN"));
+  EXPECT_THAT(file_.Reported(DT_RUNPATH), ElementsAre("$ORIGIN"));
 }
 
 TEST_F(ModuleFile, RunsNothingAtLoadAndUnwindsNothing) {

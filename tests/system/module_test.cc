@@ -2,9 +2,9 @@
 
 #include <set>
 
-#include "messages.h"
-#include "random.h"
-#include "test_hub.h"
+#include "hub/messages.h"
+#include "tests/support/random.h"
+#include "tests/support/test_hub.h"
 
 namespace qz::test {
 namespace {
@@ -33,19 +33,19 @@ std::vector<int16_t> Recording(size_t buffers) {
   return samples;
 }
 
-struct Heard {
+struct Detected {
   std::vector<std::string> messages;  // to host endpoints
   std::vector<Bytes> reports;         // to the client nanoapps, in turn
 };
 
 // Three host clients and two client nanoapps listen to the recording from its first sample to its
 // last.
-Heard Listen(const std::vector<int16_t>& samples) {
+Detected Listen(const std::vector<int16_t>& samples) {
   TestHub runtime(/*host_time_offset_ns=*/-1000);
   hub::Hub& hub = runtime.hub;
   hub.sources().emplace_back();
   hub::LoadFailure failure;
-  EXPECT_TRUE(hub.Start(QZ_MODULE, &failure)) << failure.sentence;
+  EXPECT_TRUE(hub.Start(QZ_MODULE, &failure)) << failure.message;
   const uint32_t nanoapps[] = {runtime.RegisterClientNanoapp(), runtime.RegisterClientNanoapp()};
   for (uint16_t host = 1; host <= 3; ++host) {
     runtime.Connect(host);
@@ -59,25 +59,25 @@ Heard Listen(const std::vector<int16_t>& samples) {
   for (const uint32_t id : nanoapps) runtime.Unregister(id);
   EXPECT_FALSE(hub.audio_enabled());
   hub.End();
-  Heard heard = {runtime.TakeMessages(), {}};
+  Detected detected = {runtime.TakeMessages(), {}};
   for (const Received& event : runtime.events) {
-    EXPECT_EQ(event.receiver, nanoapps[heard.reports.size() % 2]);
-    heard.reports.push_back(event.bytes);
+    EXPECT_EQ(event.receiver, nanoapps[detected.reports.size() % 2]);
+    detected.reports.push_back(event.bytes);
   }
-  return heard;
+  return detected;
 }
 
 TEST(LoadedModule, ServesHostsAndNanoappsFromOneRecording) {
   constexpr size_t kBuffers = 10;
-  const Heard heard = Listen(Recording(kBuffers));
-  EXPECT_THAT(heard.messages,
+  const Detected detected = Listen(Recording(kBuffers));
+  EXPECT_THAT(detected.messages,
               ElementsAre("2@1", "4@1", "2@2", "4@2", "2@3", "4@3", "6@1", "6@2", "6@3"));
-  ASSERT_EQ(heard.reports.size(), 2 * kBuffers);
+  ASSERT_EQ(detected.reports.size(), 2 * kBuffers);
   std::set<float> seen;
   uint64_t digest = 0xCBF29CE484222325u;  // FNV-1a
   for (size_t pass = 0; pass < kBuffers; ++pass) {
-    const Bytes& bytes = heard.reports[2 * pass];
-    EXPECT_EQ(heard.reports[2 * pass + 1], bytes);
+    const Bytes& bytes = detected.reports[2 * pass];
+    EXPECT_EQ(detected.reports[2 * pass + 1], bytes);
     for (const uint8_t byte : bytes) digest = (digest ^ byte) * 0x100000001B3u;
     const auto report = hub::DecodeFramedSoundReport(bytes.data(), bytes.size());
     ASSERT_TRUE(report.has_value());
@@ -92,7 +92,7 @@ TEST(LoadedModule, ServesHostsAndNanoappsFromOneRecording) {
   // Recorded: another figure on another machine or build is a broken promise.
   EXPECT_EQ(digest, 0x6F9AA3DA2058A843u);
   // Every load begins anew.
-  EXPECT_EQ(Listen(Recording(kBuffers)).reports, heard.reports);
+  EXPECT_EQ(Listen(Recording(kBuffers)).reports, detected.reports);
 }
 
 TEST(LoadedModule, LivesOnARuntimeWithoutAudio) {
@@ -100,7 +100,7 @@ TEST(LoadedModule, LivesOnARuntimeWithoutAudio) {
   hub::Hub& hub = runtime.hub;
   hub.sources().emplace_back();
   hub::LoadFailure failure;
-  ASSERT_TRUE(hub.Start(QZ_MODULE_WITHOUT_AUDIO, &failure)) << failure.sentence;
+  ASSERT_TRUE(hub.Start(QZ_MODULE_WITHOUT_AUDIO, &failure)) << failure.message;
   runtime.Connect(1);
   for (int visit = 0; visit < 2; ++visit) {
     runtime.Enable(1, 1);

@@ -6,8 +6,8 @@
 #include <cstdlib>
 #include <string_view>
 
-#include "quantised_kernels.h"
-#include "signal_kernels.h"
+#include "kernels/quantised/quantised_kernels.h"
+#include "kernels/signal/signal_kernels.h"
 
 namespace {
 
@@ -16,10 +16,10 @@ bool IsFaulty(std::string_view kernel) {
   return chosen != nullptr && chosen == kernel;
 }
 
-void SayOnce(const char* place, int call, size_t index, int good, int faulty) {
+void SayOnce(const char* location, int call, size_t index, int good, int faulty) {
   static bool said = false;
   if (said) return;
-  std::fprintf(stderr, place, call, index);
+  std::fprintf(stderr, location, call, index);
   std::fprintf(stderr, ": %d in good, %d in faulty\n", good, faulty);
   said = true;
 }

@@ -2,7 +2,7 @@
 // its start, frees a block twice, and answers a client's registration with a broken report.
 
 #include "chre.h"
-#include "nanoapp_record.h"
+#include "tests/support/nanoapp_record.h"
 
 namespace {
 

@@ -1,6 +1,6 @@
 // A network that loses three of its five scores: those that no client is ever told.
 
-#include "mobilenet_backend.h"
+#include "network/mobilenet_backend.h"
 
 extern "C" {
 

@@ -5,9 +5,9 @@
 #include <cstdio>
 #include <filesystem>
 
-#include "npy_file.h"
-#include "qz_program.h"
-#include "trace_records.h"
+#include "arrays/npy_file.h"
+#include "tests/tools/qz_program.h"
+#include "trace/trace_records.h"
 
 namespace qz::tools {
 namespace {
@@ -37,10 +37,10 @@ class Features : public test::QzProgram {
   // The bytes of all frames that the linked nanoapp makes of a headerless file.
   std::string NanoappFeatures(const std::string& raw) {
     EXPECT_EQ(Run(QZ_TRACE_PROGRAM " " + raw + " " QZ_MODULE " 0 1"), 0) << err_;
-    size_t place = 0;
+    size_t location = 0;
     trace::Reader reader([&](uint8_t* bytes, size_t size) {
-      const size_t given = out_.copy(reinterpret_cast<char*>(bytes), size, place);
-      place += given;
+      const size_t given = out_.copy(reinterpret_cast<char*>(bytes), size, location);
+      location += given;
       return given;
     });
     std::string features;

@@ -3,7 +3,7 @@
 
 #include <gmock/gmock.h>
 
-#include "qz_program.h"
+#include "tests/tools/qz_program.h"
 
 namespace qz::test {
 namespace {
@@ -83,10 +83,10 @@ TEST_F(Prove, FaultyKernelsAreFound) {
   MakeBuild("faulty", "qz_trace_faulty");
   const std::pair<std::string, std::string> kernels[] = {{"max_pool", "network run "},
                                                          {"logarithm", "features of frame "}};
-  for (const auto& [kernel, place] : kernels) {
+  for (const auto& [kernel, location] : kernels) {
     EXPECT_EQ(RunProve("good", "faulty", "FAULTY_KERNEL=" + kernel), 1);
     const std::string start = "first difference: ";
-    EXPECT_THAT(out_, StartsWith(start + place));
+    EXPECT_THAT(out_, StartsWith(start + location));
     const size_t nanoapp = out_.find(" (the linked nanoapp at ");
     ASSERT_NE(nanoapp, std::string::npos) << out_;
     EXPECT_THAT(err_, HasSubstr(out_.substr(start.size(), nanoapp - start.size()) +

@@ -7,8 +7,8 @@
 #include <fstream>
 #include <iterator>
 
-#include "random.h"
-#include "sound_folder.h"
+#include "tests/support/random.h"
+#include "tests/support/sound_folder.h"
 
 namespace qz::test {
 

@@ -1,6 +1,6 @@
 // The program qz as a whole, run from a shell: its output, its messages, its exit codes.
 
-#include "qz_program.h"
+#include "tests/tools/qz_program.h"
 
 #include <gmock/gmock.h>
 
@@ -83,7 +83,7 @@ std::vector<Result> ResultsOf(const std::string& lines, const std::string& type)
 
 // A module of low thresholds, whatever model this build holds: over a stand-in.
 const std::string kWithModel =
-    "export MODEL=$(dirname $0)/model && " QZ_MODEL_TOOL " standin --seed 1 -o $MODEL && ";
+    "export MODEL=$(dirname $0)/model && " QZ_MODEL_TOOL " synthetic --seed 1 -o $MODEL && ";
 const std::string kLowModule = " --module " QZ_LOW_MODULE " --labels " QZ_LABELS " ";
 
 TEST_F(QzProgram, TheToolsViewIsWhatTheModuleReportsAndDetects) {
@@ -119,7 +119,7 @@ TEST_F(QzProgram, TheToolsViewIsWhatTheModuleReportsAndDetects) {
 
 TEST_F(QzProgram, AModelThatIsNotTheModulesIsAFault) {
   EXPECT_EQ(
-      Run(kWithModel + QZ_MODEL_TOOL " standin --seed 2 -o $MODEL-2 && $QZ run --raw --scores" +
+      Run(kWithModel + QZ_MODEL_TOOL " synthetic --seed 2 -o $MODEL-2 && $QZ run --raw --scores" +
           kLowModule + "--model $MODEL-2 " + LoudAndSoft(10 * kSecond)),
       1);
   EXPECT_THAT(err_, HasSubstr("model-2: is not the model in the module: at 4.000 s output "));

@@ -5,7 +5,7 @@
 
 #include <cstdlib>
 
-#include "comparison.h"
+#include "trace/comparison.h"
 
 namespace qz::trace {
 namespace {
@@ -47,12 +47,12 @@ std::string Written(const std::vector<Record>& records) {
 
 // The records up to the end record, and what is wrong with the stream.
 std::vector<Record> Read(const std::string& stream, std::string* wrong) {
-  size_t place = 0;
+  size_t location = 0;
   Reader reader([&](uint8_t* bytes, size_t size) {
     // In small pieces, as from a pipe.
     const size_t given =
-        stream.copy(reinterpret_cast<char*>(bytes), std::min<size_t>(size, 7), place);
-    place += given;
+        stream.copy(reinterpret_cast<char*>(bytes), std::min<size_t>(size, 7), location);
+    location += given;
     return given;
   });
   std::vector<Record> records;
@@ -109,9 +109,9 @@ TEST(Trace, IsWholeOrNone) {
 TEST(Trace, FirstDifferenceIsNamed) {
   constexpr size_t kLog = 1, kMessage = 2, kMemory = 4, kReport = 5, kSecondFeatures = 31,
                    kSecondRun = 32;
-  const auto with = [](size_t place, auto change) {
+  const auto with = [](size_t location, auto change) {
     std::vector<Record> trace = GoodTrace();
-    change(trace[place]);
+    change(trace[location]);
     return trace;
   };
   const std::string in_second = " (the linked nanoapp at 0.000 s): ";

@@ -1,25 +1,25 @@
 // Every backward function against differences of its forward function.
 
-#include "layers.h"
+#include "train/layers.h"
 
 #include <gtest/gtest.h>
 
 #include <functional>
 #include <vector>
 
-#include "loss.h"
-#include "number_generator.h"
+#include "base/number_generator.h"
+#include "train/loss.h"
 
 namespace qz::train {
 namespace {
 
-void Fill(model::NumberGenerator* random, Matrix* values) {
+void Fill(base::NumberGenerator* random, Matrix* values) {
   for (Eigen::Index i = 0; i < values->size(); ++i) {
     values->data()[i] = static_cast<float>(random->Uniform(-1, 1));
   }
 }
 
-Batch RandomBatch(model::NumberGenerator* random, int sequences, int steps, int channels) {
+Batch RandomBatch(base::NumberGenerator* random, int sequences, int steps, int channels) {
   Batch batch;
   batch.Resize(sequences, steps, channels);
   Fill(random, &batch.values);
@@ -56,7 +56,7 @@ double Dot(const Batch& y, const Batch& dy) {
 }
 
 TEST(Layers, DepthwiseGradientsAreItsSlopes) {
-  model::NumberGenerator random(1);
+  base::NumberGenerator random(1);
   Batch x = RandomBatch(&random, 2, 7, 5);
   Matrix w(3, 5);
   Fill(&random, &w);
@@ -76,7 +76,7 @@ TEST(Layers, DepthwiseGradientsAreItsSlopes) {
 
 TEST(Layers, ConvolutionGradientsAreItsSlopes) {
   for (const int taps : {1, 3}) {
-    model::NumberGenerator random(2);
+    base::NumberGenerator random(2);
     Batch x = RandomBatch(&random, 3, 6, 4);
     Matrix w(taps * 4, 5);
     Fill(&random, &w);
@@ -114,7 +114,7 @@ TEST(Layers, PoolHandsTheGradientToTheLarger) {
 }
 
 TEST(Layers, NormalisationGradientsAreItsSlopes) {
-  model::NumberGenerator random(3);
+  base::NumberGenerator random(3);
   Batch x = RandomBatch(&random, 2, 9, 3);
   Matrix gamma(1, 3), beta(1, 3);
   Fill(&random, &gamma);
@@ -138,7 +138,7 @@ TEST(Layers, NormalisationGradientsAreItsSlopes) {
 }
 
 TEST(Loss, GradientIsItsSlope) {
-  model::NumberGenerator random(4);
+  base::NumberGenerator random(4);
   Batch logits = RandomBatch(&random, 2, 3, 5);
   logits.values *= 3;
   Matrix targets = Matrix::Zero(2, 5);
@@ -154,15 +154,15 @@ TEST(Loss, GradientIsItsSlope) {
 }
 
 TEST(Loss, TeachersAreFollowedWindowByWindow) {
-  model::NumberGenerator random(5);
+  base::NumberGenerator random(5);
   Batch logits = RandomBatch(&random, 2, 3, 5);
-  const Batch taught = RandomBatch(&random, 2, 3, 5);
+  const Batch distilled = RandomBatch(&random, 2, 3, 5);
   Batch gradient, unused;
-  TeachingLoss(logits, taught, 2, &gradient);
+  TeachingLoss(logits, distilled, 2, &gradient);
   ExpectNear(Slopes(logits.values.size(), logits.values.data(),
-                    [&] { return TeachingLoss(logits, taught, 2, &unused); }),
+                    [&] { return TeachingLoss(logits, distilled, 2, &unused); }),
              gradient.values, 1e-3, "logit");
-  TeachingLoss(taught, taught, 2, &gradient);
+  TeachingLoss(distilled, distilled, 2, &gradient);
   EXPECT_EQ(gradient.values.cwiseAbs().maxCoeff(), 0);
 }
 

@@ -4,15 +4,15 @@
 
 #include <cmath>
 
-#include "check_weights.h"
-#include "float_network.h"
-#include "number_generator.h"
-#include "packing.h"
-#include "proof.h"
-#include "quantised_network.h"
-#include "reference_network.h"
-#include "standin_model.h"
-#include "synthetic_features.h"
+#include "base/number_generator.h"
+#include "model/check_weights.h"
+#include "model/packing.h"
+#include "model/reference_network.h"
+#include "model/synthetic_features.h"
+#include "model/synthetic_model.h"
+#include "train/equivalence.h"
+#include "train/float_network.h"
+#include "train/quantised_network.h"
 
 namespace qz::train {
 namespace {
@@ -46,7 +46,7 @@ Values SettledParameters(const Batch& features) {
 }
 
 Batch RandomGradient(const Batch& logits) {
-  model::NumberGenerator random(9);
+  base::NumberGenerator random(9);
   Batch gradient = logits;
   for (Eigen::Index i = 0; i < gradient.values.size(); ++i) {
     gradient.values.data()[i] = static_cast<float>(random.Uniform(-1, 1));
@@ -70,7 +70,7 @@ TEST(FloatNetwork, GradientOfEveryLayerIsItsSlope) {
   Values parameters = SettledParameters(features);
   FloatNetwork network;
   const Batch dlogits = RandomGradient(network.Forward(parameters, features, &noise));
-  Values gradient(kParameters.learnt);
+  Values gradient(kParameters.trained);
   network.Backward(parameters, dlogits, &gradient);
   const auto loss_at = [&](const MatrixView& direction, MatrixView values, float step) {
     values += step * direction;
@@ -121,7 +121,7 @@ TEST(QuantisedNetwork, FollowsTheFloatNetworkForwardsAndBackwards) {
   EXPECT_GT(Similarity(logits.values, steps.values), 0.9);
 
   const Batch dlogits = RandomGradient(logits);
-  Values by_float(kParameters.learnt), by_device(kParameters.learnt);
+  Values by_float(kParameters.trained), by_device(kParameters.trained);
   over_float.Backward(parameters, dlogits, &by_float);
   device.Backward(quantised, dlogits, &by_device);
   const auto expect_alike = [](const Matrix& expected, const Matrix& got, size_t layer) {
@@ -138,34 +138,34 @@ TEST(QuantisedNetwork, FollowsTheFloatNetworkForwardsAndBackwards) {
 
 std::vector<Batch> SomeFeatures() { return {SyntheticFeatures(1, 400), SyntheticFeatures(1, 500)}; }
 
-TEST(Proof, HoldsForTrainedAndForeignModels) {
+TEST(EquivalenceCheck, HoldsForTrainedAndForeignModels) {
   Values parameters = SettledParameters(SyntheticFeatures(2, 100));
   FoldNormalisations(&parameters);
   const QuantisedParameters trained(parameters);
   const model::PackedModel packed = model::Pack(ArraysOf(trained));
   EXPECT_TRUE(model::CheckWeights(packed).empty());
-  const model::PackedModel foreign = model::MakeStandinModel(1);
-  for (const Proof& proof :
+  const model::PackedModel foreign = model::MakeSyntheticModel(1);
+  for (const EquivalenceCheck& check :
        {Prove(trained, packed, SomeFeatures()),
         Prove(ParametersOf(model::Unpack(foreign)), foreign, SomeFeatures())}) {
-    EXPECT_EQ(proof.difference, "");
-    EXPECT_EQ(proof.trainer_digest, proof.module_digest);
-    EXPECT_EQ(proof.runs, 4u);
-    EXPECT_GT(proof.bytes, 4u * 90000);
+    EXPECT_EQ(check.difference, "");
+    EXPECT_EQ(check.trainer_digest, check.module_digest);
+    EXPECT_EQ(check.runs, 4u);
+    EXPECT_GT(check.bytes, 4u * 90000);
   }
 }
 
-TEST(Proof, NamesTheFirstDifference) {
-  const model::PackedModel model = model::MakeStandinModel(1);
+TEST(EquivalenceCheck, NamesTheFirstDifference) {
+  const model::PackedModel model = model::MakeSyntheticModel(1);
   const QuantisedParameters parameters = ParametersOf(model::Unpack(model));
   model::PackedModel other = model;
   const size_t bias = model::FindTable(8)->BiasOffset(13);
   model::Store<int32_t>(other, bias, model::Load<int32_t>(other, bias) + 40000);
-  const Proof proof = Prove(parameters, other, SomeFeatures());
-  EXPECT_NE(proof.trainer_digest, proof.module_digest);
-  EXPECT_EQ(proof.difference.rfind("run 0, operator 8, row ", 0), 0u) << proof.difference;
-  EXPECT_NE(proof.difference.find(", channel 13: the trainer's is "), std::string::npos)
-      << proof.difference;
+  const EquivalenceCheck check = Prove(parameters, other, SomeFeatures());
+  EXPECT_NE(check.trainer_digest, check.module_digest);
+  EXPECT_EQ(check.difference.rfind("run 0, operator 8, row ", 0), 0u) << check.difference;
+  EXPECT_NE(check.difference.find(", channel 13: the trainer's is "), std::string::npos)
+      << check.difference;
 }
 
 }  // namespace

@@ -1,6 +1,6 @@
 // qz-train's two commands on files: what they write, what they skip, what they refuse.
 
-#include "train_command.h"
+#include "train/train_command.h"
 
 #include <gmock/gmock.h>
 #include <sndfile.h>
@@ -9,10 +9,10 @@
 #include <filesystem>
 #include <fstream>
 
-#include "check_weights.h"
-#include "model_files.h"
-#include "prove_model_command.h"
-#include "temporary_folder.h"
+#include "model/check_weights.h"
+#include "model/model_files.h"
+#include "tests/support/temporary_folder.h"
+#include "train/prove_model_command.h"
 
 namespace qz::train {
 namespace {
@@ -67,7 +67,7 @@ class Commands : public testing::Test {
 
   const test::TemporaryFolder folder_;
   TrainOptions options_;
-  programs::ExitCode exit_code_ = programs::kFine;
+  base::ExitCode exit_code_ = base::kSuccess;
 };
 
 TEST_F(Commands, FitWritesASoundModelAndNamesWhatItSkipped) {
@@ -76,11 +76,11 @@ TEST_F(Commands, FitWritesASoundModelAndNamesWhatItSkipped) {
                     HasSubstr("learning from 6 clips, judged by 6, 1 skipped"),
                     HasSubstr("on 6 clips that were held out"), HasSubstr("loss of quantisation"),
                     HasSubstr(" of 21 operators: "), HasSubstr(", the same\n")));
-  EXPECT_EQ(exit_code_, programs::kUnreadableInput);
+  EXPECT_EQ(exit_code_, base::kUnreadableInput);
   const model::PackedModel model = model::ReadModelFile(options_.output);
   EXPECT_TRUE(model::CheckWeights(model).empty());
   testing::internal::CaptureStdout();
-  EXPECT_EQ(ProveModelCommand(options_.output, options_.manifest), programs::kUnreadableInput);
+  EXPECT_EQ(ProveModelCommand(options_.output, options_.manifest), base::kUnreadableInput);
   EXPECT_THAT(testing::internal::GetCapturedStdout(),
               AllOf(HasSubstr("on 12 clips: "), HasSubstr(", the same\n")));
 }
@@ -93,9 +93,9 @@ TEST_F(Commands, RefuseBeforeTheWorkBegins) {
   options_.hold_out = 0;
   std::ofstream(options_.state_file) << "something";
   EXPECT_THAT(fit, ThrowsMessage<std::runtime_error>(HasSubstr("state: is of another run")));
-  for (const std::string& place : {folder_.Path("absent/model"), folder_.Path("")}) {
-    options_.output = place;
-    EXPECT_THAT(fit, ThrowsMessage<std::runtime_error>(HasSubstr("be written: "))) << place;
+  for (const std::string& location : {folder_.Path("absent/model"), folder_.Path("")}) {
+    options_.output = location;
+    EXPECT_THAT(fit, ThrowsMessage<std::runtime_error>(HasSubstr("be written: "))) << location;
   }
   options_.output = options_.state_file;
   EXPECT_THAT(fit, ThrowsMessage<std::runtime_error>(HasSubstr("the model and the state at once")));

@@ -7,13 +7,13 @@
 #include <filesystem>
 #include <fstream>
 
-#include "adam.h"
-#include "labels.h"
-#include "model_files.h"
-#include "recipe.h"
-#include "state_file.h"
-#include "temporary_folder.h"
-#include "trainer.h"
+#include "model/labels.h"
+#include "model/model_files.h"
+#include "tests/support/temporary_folder.h"
+#include "train/adam.h"
+#include "train/recipe.h"
+#include "train/state_file.h"
+#include "train/trainer.h"
 
 namespace qz::train {
 namespace {
@@ -24,7 +24,7 @@ using testing::HasSubstr;
 std::vector<Clip> Tones(int of_each) {
   std::vector<Clip> clips;
   for (int i = 0; i < 6 * of_each; ++i) {
-    model::NumberGenerator random(static_cast<uint64_t>(i));
+    base::NumberGenerator random(static_cast<uint64_t>(i));
     Clip clip;
     clip.output = i % 6 == 5 ? -1 : i % 6;
     const double step = 0.1 * (1 + clip.output) * random.Uniform(0.95, 1.05);
@@ -99,10 +99,10 @@ TEST(Trainer, LearnsTonesAndStillKnowsThemInInt8) {
   EXPECT_TRUE(trainer.Done(state));
   std::vector<Batch> features;
   features.reserve(clips.size());
-  for (const Clip& clip : clips) features.push_back(JudgedFeatures(clip.samples));
-  const Figures by_float = FiguresOf(ScoresOf(state.teachers[0], features), clips);
-  const Figures by_device =
-      FiguresOf(ScoresOf(QuantisedParameters(state.average), features), clips);
+  for (const Clip& clip : clips) features.push_back(ValidationFeatures(clip.samples));
+  const Metrics by_float = MetricsOf(ScoresOf(state.teachers[0], features), clips);
+  const Metrics by_device =
+      MetricsOf(ScoresOf(QuantisedParameters(state.average), features), clips);
   EXPECT_EQ(by_device.outputs, 5);
   EXPECT_GT(by_float.average_precision, 0.9);
   EXPECT_GT(by_device.average_precision, 0.85);
@@ -151,7 +151,7 @@ TEST(Augmentation, JoinsLabelsAndStaysInRange) {
 TEST(Augmentation, BeginsWithTheClipWhereTheRecipeSaysSo) {
   Recipe recipe = ShortRecipe();
   recipe.start_share = 1;
-  recipe.lowest_gain = recipe.highest_gain = 0;
+  recipe.min_gain = recipe.max_gain = 0;
   recipe.mix_share = recipe.speed_share = recipe.noise_share = recipe.shift_share = 0;
   recipe.tilt = recipe.time_masks = recipe.channel_masks = 0;
   const std::vector<Clip> clips = Tones(1);
@@ -159,7 +159,7 @@ TEST(Augmentation, BeginsWithTheClipWhereTheRecipeSaysSo) {
   features.Resize(1, FramesFor(1), 48);
   Matrix targets(1, 5);
   Augmentation(recipe, clips).Make(2, 3, 0, &features, &targets);
-  const Batch measured = JudgedFeatures(clips[2].samples);
+  const Batch measured = ValidationFeatures(clips[2].samples);
   EXPECT_TRUE(features.values == measured.values.topRows(FramesFor(1)));
 }
 

@@ -5,8 +5,8 @@
 
 #include <cstring>
 
-#include "quantised_kernels.h"
-#include "requantisation.h"
+#include "kernels/quantised/quantised_kernels.h"
+#include "kernels/quantised/requantisation.h"
 
 namespace {
 

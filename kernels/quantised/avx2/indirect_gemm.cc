@@ -1,7 +1,7 @@
 // Against the plain text as g++ 12 compiles it for AVX2, time on a quiet Zen 4: a ratio of 16 with
 // 92 rows, 3 taps, 60 input channels and 60 columns; of 7 with a single row.
 
-#include "avx2/paired_rows.h"
+#include "kernels/quantised/avx2/paired_rows.h"
 
 extern "C" void orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
     size_t m, size_t n, size_t k, size_t tap_bytes, const int8_t* const* a_ptrs, const void* w,

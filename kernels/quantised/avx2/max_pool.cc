@@ -5,8 +5,8 @@
 
 #include <cstring>
 
-#include "indirection.h"
-#include "quantised_kernels.h"
+#include "kernels/quantised/indirection.h"
+#include "kernels/quantised/quantised_kernels.h"
 
 namespace {
 
@@ -21,22 +21,22 @@ struct Pool {
 };
 
 // 32 channels of a position, from channel c on.
-inline __m256i Largest32(const Pool& pool, size_t c) {
-  __m256i largest = _mm256_max_epi8(pool.low, _mm256_loadu_si256(pool.Row(0, c)));
+inline __m256i Max32(const Pool& pool, size_t c) {
+  __m256i max = _mm256_max_epi8(pool.low, _mm256_loadu_si256(pool.Row(0, c)));
   for (size_t entry = 1; entry < pool.size; ++entry) {
-    largest = _mm256_max_epi8(largest, _mm256_loadu_si256(pool.Row(entry, c)));
+    max = _mm256_max_epi8(max, _mm256_loadu_si256(pool.Row(entry, c)));
   }
-  return _mm256_min_epi8(largest, pool.high);
+  return _mm256_min_epi8(max, pool.high);
 }
 
 // 16 of them.
-inline __m128i Largest16(const Pool& pool, size_t c) {
-  __m128i largest = _mm256_castsi256_si128(pool.low);
+inline __m128i Max16(const Pool& pool, size_t c) {
+  __m128i max = _mm256_castsi256_si128(pool.low);
   for (size_t entry = 0; entry < pool.size; ++entry) {
     const auto* row = reinterpret_cast<const __m128i*>(pool.Row(entry, c));
-    largest = _mm_max_epi8(largest, _mm_loadu_si128(row));
+    max = _mm_max_epi8(max, _mm_loadu_si128(row));
   }
-  return _mm_min_epi8(largest, _mm256_castsi256_si128(pool.high));
+  return _mm_min_epi8(max, _mm256_castsi256_si128(pool.high));
 }
 
 }  // namespace
@@ -56,12 +56,12 @@ extern "C" void orra_s8_maxpool_minmax_ukernel_2p2x__neon_c16(size_t positions, 
     if (channels >= 32) {
       for (size_t c = 0; c < channels; c += 32) {
         const size_t at = channels - c < 32 ? channels - 32 : c;
-        _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + at), Largest32(pool, at));
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + at), Max32(pool, at));
       }
     } else {
       for (size_t c = 0; c < channels; c += 16) {
         int8_t bytes[16];
-        _mm_storeu_si128(reinterpret_cast<__m128i*>(bytes), Largest16(pool, c));
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(bytes), Max16(pool, c));
         std::memcpy(out + c, bytes, channels - c < 16 ? channels - c : 16);
       }
     }

@@ -9,7 +9,7 @@
 // numbers.
 #pragma once
 
-#include "avx2/word_products.h"
+#include "kernels/quantised/avx2/word_products.h"
 
 namespace qz {
 namespace {
@@ -17,7 +17,7 @@ namespace {
 struct PairedRows {
   static constexpr size_t kColumns = kPanelColumns;
   static constexpr size_t kTaps = 3;
-  static constexpr size_t kMostChannels = INT32_MAX / (2 * kTaps * 128 * 127);
+  static constexpr size_t kMaxChannels = INT32_MAX / (2 * kTaps * 128 * 127);
 
   // The biases, and two parts with two sets of weights.
   static inline size_t PanelBytes(size_t /*taps*/, size_t k) {
@@ -119,7 +119,7 @@ struct PairedRows {
 // Whether rows 0 and 1, 2 and 3 and so on of the output are all such neighbours.
 template <typename RowAt>
 inline bool ArePairs(size_t m, size_t taps, size_t k, RowAt row_at) {
-  if (m % 2 != 0 || taps != PairedRows::kTaps || k > PairedRows::kMostChannels) return false;
+  if (m % 2 != 0 || taps != PairedRows::kTaps || k > PairedRows::kMaxChannels) return false;
   for (size_t r = 0; r < m; r += 2) {
     if (row_at(0, r + 1) != row_at(1, r) || row_at(1, r + 1) != row_at(2, r)) return false;
   }

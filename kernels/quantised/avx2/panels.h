@@ -13,8 +13,8 @@
 //   AddUp(rows, m, panel, taps, k, sums) sums: [m][kColumns]; of all rows of m's last tile
 #pragma once
 
-#include "avx2/requantise.h"
-#include "gemm_tile.h"
+#include "kernels/quantised/avx2/requantise.h"
+#include "kernels/quantised/gemm_tile.h"
 
 namespace qz {
 namespace {
@@ -101,7 +101,7 @@ class PanelProduct {
 
  private:
   static constexpr size_t kPanelBlocks = Method::kColumns / kTileColumns;
-  static constexpr size_t kBlockPlace = kTileColumns * sizeof(int32_t);
+  static constexpr size_t kBlockOffset = kTileColumns * sizeof(int32_t);
 
   // The last block fills up its panel.
   __attribute__((noinline)) void UnpackPanels(Blocks blocks) {
@@ -110,7 +110,7 @@ class PanelProduct {
       for (size_t i = 0; i < kPanelBlocks; ++i) {
         const size_t block = Smaller(b + i, blocks.end - 1);
         Method::UnpackBlock(product_.Block(block), product_.taps, product_.k,
-                            panel + i * kBlockPlace);
+                            panel + i * kBlockOffset);
       }
     }
   }

@@ -7,7 +7,7 @@
 // 16 and 16 that would give the same sums 10.
 #pragma once
 
-#include "avx2/panels.h"
+#include "kernels/quantised/avx2/panels.h"
 
 namespace qz {
 namespace {
@@ -65,9 +65,9 @@ inline void StoreStep(const StepPairs& pairs, uint8_t* to, __m256i& start) {
 inline __m256i LoadChannels(const int8_t* row, size_t count) {
   __m128i bytes = LoadLast(row, count);
   if (count < 16) {
-    const __m128i places = _mm_setr_epi8(0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15);
+    const __m128i locations = _mm_setr_epi8(0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15);
     const __m128i number = _mm_set1_epi8(static_cast<char>(count));
-    bytes = _mm_and_si128(bytes, _mm_cmpgt_epi8(number, places));
+    bytes = _mm_and_si128(bytes, _mm_cmpgt_epi8(number, locations));
   }
   const __m128i order = _mm_setr_epi8(0, 2, 1, 3, 4, 6, 5, 7, 8, 10, 9, 11, 12, 14, 13, 15);
   return _mm256_cvtepi8_epi16(_mm_shuffle_epi8(bytes, order));

@@ -3,7 +3,7 @@
 // adding 128, and 128 times the sum of a column's weights comes off the column's bias.
 #pragma once
 
-#include "avx2/panels.h"
+#include "kernels/quantised/avx2/panels.h"
 
 namespace qz {
 namespace {

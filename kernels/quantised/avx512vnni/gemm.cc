@@ -2,7 +2,7 @@
 // 380 rows, 48 input channels and 60 columns, of 23 with 188 rows and 60 input channels; 1.8
 // and 2.0 against the text for AVX2.
 
-#include "avx512vnni/byte_products.h"
+#include "kernels/quantised/avx512vnni/byte_products.h"
 
 extern "C" void orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
     size_t m, size_t n, size_t k, const int8_t* a, size_t a_stride, const void* w, int8_t* c,

@@ -3,9 +3,9 @@
 
 #include <arm_neon.h>
 
-#include "indirection.h"
-#include "quantised_kernels.h"
-#include "requantise.h"
+#include "kernels/quantised/indirection.h"
+#include "kernels/quantised/neon/requantise.h"
+#include "kernels/quantised/quantised_kernels.h"
 
 namespace {
 

@@ -5,8 +5,8 @@
 
 #include <algorithm>
 
-#include "quantised_kernels.h"
-#include "requantise.h"
+#include "kernels/quantised/neon/requantise.h"
+#include "kernels/quantised/quantised_kernels.h"
 
 namespace {
 

@@ -1,8 +1,8 @@
 // Instructions against the plain text's, both g++ 12 -O3 (scripts/kernel-gains.py): 4,361
 // for 23,085, a ratio of 5.3, with 4 rows, 60 columns and 48 channels.
 
-#include "quantised_kernels.h"
-#include "vector_tile.h"
+#include "kernels/quantised/neon/vector_tile.h"
+#include "kernels/quantised/quantised_kernels.h"
 
 // Rows from m on repeat row m - 1: the tile is computed whole, and only its first m rows are
 // stored.

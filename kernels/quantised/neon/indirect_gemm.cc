@@ -1,9 +1,9 @@
 // Instructions against the plain text's, both g++ 12 -O3 (scripts/kernel-gains.py): 14,417
 // for 85,790, a ratio of 6.0, with 4 rows, 60 columns and 3 taps of 60 channels.
 
-#include "indirection.h"
-#include "quantised_kernels.h"
-#include "vector_tile.h"
+#include "kernels/quantised/indirection.h"
+#include "kernels/quantised/neon/vector_tile.h"
+#include "kernels/quantised/quantised_kernels.h"
 
 // The tile is computed whole, from the list's 4 rows a tap, and only its first m rows are stored.
 extern "C" void orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(

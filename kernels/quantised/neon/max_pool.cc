@@ -6,9 +6,9 @@
 #include <algorithm>
 #include <cstring>
 
-#include "indirection.h"
-#include "quantised_kernels.h"
-#include "requantise.h"
+#include "kernels/quantised/indirection.h"
+#include "kernels/quantised/neon/requantise.h"
+#include "kernels/quantised/quantised_kernels.h"
 
 namespace {
 
@@ -23,25 +23,25 @@ struct Clamp {
 template <bool kFirstPass>
 inline void Pool(const int8_t* first, const int8_t* second, size_t channels, Clamp clamp,
                  int8_t* out) {
-  const auto largest = [&](const int8_t* so_far) {
+  const auto max = [&](const int8_t* so_far) {
     int8x16_t values = vmaxq_s8(vld1q_s8(first), vld1q_s8(second));
     if (!kFirstPass) values = vmaxq_s8(values, vld1q_s8(so_far));
     return vminq_s8(vmaxq_s8(values, clamp.low), clamp.high);
   };
   for (; channels >= kStep; channels -= kStep) {
-    vst1q_s8(out, largest(out));
+    vst1q_s8(out, max(out));
     first += kStep;
     second += kStep;
     out += kStep;
   }
   if (channels == 0) return;
   if constexpr (kFirstPass) {
-    qz::StoreFirst(largest(out), channels, out);
+    qz::StoreFirst(max(out), channels, out);
   } else {
     // Rows may be read beyond their end, the output not.
     int8_t so_far[kStep] = {};
     std::memcpy(so_far, out, channels);
-    qz::StoreFirst(largest(so_far), channels, out);
+    qz::StoreFirst(max(so_far), channels, out);
   }
 }
 

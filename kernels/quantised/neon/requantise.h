@@ -5,7 +5,7 @@
 
 #include <arm_neon.h>
 
-#include "requantisation.h"
+#include "kernels/quantised/requantisation.h"
 
 namespace qz {
 

@@ -7,8 +7,8 @@
 
 #include <arm_neon.h>
 
-#include "gemm_tile.h"
-#include "requantise.h"
+#include "kernels/quantised/gemm_tile.h"
+#include "kernels/quantised/neon/requantise.h"
 
 namespace qz {
 

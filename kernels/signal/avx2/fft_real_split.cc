@@ -4,8 +4,8 @@
 // 15 times as fast as g++ 12's -O3 -mavx2 code of the plain text, in the front end's call
 // (Zen 4).
 
-#include "complex_vector.h"
-#include "signal_kernels.h"
+#include "kernels/signal/avx2/complex_vector.h"
+#include "kernels/signal/signal_kernels.h"
 
 namespace {
 

@@ -3,8 +3,8 @@
 // 2.6 times as fast as g++ 12's -O3 -mavx2 code of the plain text, in the front end's call
 // (Zen 4).
 
-#include "lanes.h"
-#include "signal_kernels.h"
+#include "kernels/signal/avx2/lanes.h"
+#include "kernels/signal/signal_kernels.h"
 
 namespace {
 

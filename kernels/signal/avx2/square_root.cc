@@ -5,7 +5,7 @@
 
 #include <immintrin.h>
 
-#include "signal_kernels.h"
+#include "kernels/signal/signal_kernels.h"
 
 namespace {
 

@@ -7,9 +7,9 @@
 
 #include <cstring>
 
-#include "complex_lanes.h"
-#include "signal_kernels.h"
-#include "signal_tables.h"
+#include "kernels/signal/neon/complex_lanes.h"
+#include "kernels/signal/signal_kernels.h"
+#include "kernels/signal/signal_tables.h"
 
 namespace {
 

@@ -6,9 +6,9 @@
 
 #include <arm_neon.h>
 
-#include "complex_lanes.h"
-#include "signal_arithmetic.h"
-#include "signal_kernels.h"
+#include "kernels/signal/neon/complex_lanes.h"
+#include "kernels/signal/signal_arithmetic.h"
+#include "kernels/signal/signal_kernels.h"
 
 using qz::signal::Complex;
 using qz::signal::ComplexLanes;

@@ -8,7 +8,7 @@
 
 #include <algorithm>
 
-#include "signal_kernels.h"
+#include "kernels/signal/signal_kernels.h"
 
 namespace {
 

@@ -12,7 +12,7 @@
 #include <utility>
 #include <vector>
 
-#include "random.h"
+#include "tests/support/random.h"
 
 namespace qz::test {
 
@@ -99,14 +99,14 @@ uint8_t* EndOfFreePages(size_t bytes);
 // which names kernel and seed. (qemu 7.2's x86 processors trip there over masked loads of AVX2 that
 // read nothing of that page.)
 template <typename T>
-const T* Place(Random& random, const std::vector<T>& values, size_t readable = 0) {
+const T* Location(Random& random, const std::vector<T>& values, size_t readable = 0) {
   const size_t bytes = values.size() * sizeof(T);
   uint8_t* const end = EndOfFreePages(bytes + readable);
   uint8_t* const behind = random.Next() % 2 ? end - readable : end - kFreeBytes + bytes;
-  T* const place = reinterpret_cast<T*>(behind - bytes);
-  std::copy(values.begin(), values.end(), place);
+  T* const location = reinterpret_cast<T*>(behind - bytes);
+  std::copy(values.begin(), values.end(), location);
   std::generate_n(behind, readable, [&] { return static_cast<uint8_t>(random.Next()); });
-  return place;
+  return location;
 }
 
 // Calls both texts with an output each that holds `contents` between random values, so that

@@ -18,11 +18,11 @@
 #include <set>
 #include <sstream>
 
-#include "comparison.h"
-#include "instruction_mark.h"
+#include "tests/kernels/comparison/comparison.h"
+#include "tests/support/instruction_mark.h"
 #ifdef QZ_KERNELS_X86_64
-#include "choices.h"
-#include "processor.h"
+#include "kernels/x86_64/choices.h"
+#include "kernels/x86_64/processor.h"
 #endif
 
 namespace qz::test {

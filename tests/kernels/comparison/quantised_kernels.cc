@@ -1,9 +1,9 @@
-#include "quantised_kernels.h"
+#include "kernels/quantised/quantised_kernels.h"
 
 #include <array>
 
-#include "comparison.h"
-#include "random_layer.h"
+#include "tests/kernels/comparison/comparison.h"
+#include "tests/support/random_layer.h"
 
 namespace qz::test {
 namespace {
@@ -22,10 +22,10 @@ constexpr size_t kReadAhead = 7;
 constexpr size_t kPoolReadAhead = 15;
 
 // Nothing behind packed data may be read; of any alignment.
-const uint8_t* PlaceLayer(Random& random, size_t inputs, size_t columns, size_t block,
-                          bool with_scales = true) {
+const uint8_t* OffsetLayer(Random& random, size_t inputs, size_t columns, size_t block,
+                           bool with_scales = true) {
   const Layer layer(random, inputs, columns, block);
-  return Place(random, layer.Packed(with_scales), random.Next() % 2);
+  return Location(random, layer.Packed(with_scales), random.Next() % 2);
 }
 
 // Now and then more rows, columns or products in a sum than a text that unpacks them has room for
@@ -33,7 +33,7 @@ const uint8_t* PlaceLayer(Random& random, size_t inputs, size_t columns, size_t 
 struct MatrixShape {
   explicit MatrixShape(CaseRandom& random, size_t taps = 1)
       : large(random.Next() % 16),
-        m(random.Pick("m", 1, std::min<size_t>(kMostRows, large == 0 ? 150 : 13))),
+        m(random.Pick("m", 1, std::min<size_t>(kMaxRows, large == 0 ? 150 : 13))),
         n(random.Pick("n", 1, large == 1 ? 70 : 25)),
         k(random.Pick("k", 1,
                       (large == 1   ? 700
@@ -50,8 +50,8 @@ struct MatrixShape {
 std::string CompareGemm(CaseRandom& random) {
   const MatrixShape s(random);
   const auto values = ShapedFill<int8_t>(random, (s.m - 1) * s.a_stride + s.k);
-  const int8_t* a = Place(random, values, kReadAhead);
-  const uint8_t* w = PlaceLayer(random, s.k, s.n, 8);
+  const int8_t* a = Location(random, values, kReadAhead);
+  const uint8_t* w = OffsetLayer(random, s.k, s.n, 8);
   const orra_fp32_requant_params params = RandomParams(random);
   const auto c_contents = RandomValues<int8_t>(random, s.m * s.c_stride);
   return Difference(random, kGemm, c_contents, [&](auto gemm, int8_t* c) {
@@ -65,7 +65,8 @@ struct RowList {
   template <typename RowOf>
   RowList(Random& random, size_t entries, size_t rows, size_t row_bytes, RowOf row_of)
       : offset(random.Next() % 2 ? 40000 : 0) {
-    const int8_t* first = Place(random, ShapedFill<int8_t>(random, rows * row_bytes), kReadAhead);
+    const int8_t* first =
+        Location(random, ShapedFill<int8_t>(random, rows * row_bytes), kReadAhead);
     zero = first + random.Next() % rows * row_bytes;
     for (size_t i = 0; i < entries; ++i) {
       list.push_back(ListEntry(first + row_of(i) * row_bytes, zero, offset));
@@ -90,7 +91,7 @@ std::string CompareIndirectGemm(CaseRandom& random) {
     return std::min(i / (4 * taps) * 4 + i % 4, last) + i / 4 % taps;
   };
   const RowList in(random, listed * taps, rows, s.k, row_of);
-  const uint8_t* w = PlaceLayer(random, taps * s.k, s.n, 8);
+  const uint8_t* w = OffsetLayer(random, taps * s.k, s.n, 8);
   const orra_fp32_requant_params params = RandomParams(random);
   const auto c_contents = RandomValues<int8_t>(random, s.m * s.c_stride);
   return Difference(random, kIndirectGemm, c_contents, [&](auto gemm, int8_t* c) {
@@ -101,8 +102,8 @@ std::string CompareIndirectGemm(CaseRandom& random) {
 
 std::string CompareFixedPointGemm(CaseRandom& random) {
   const MatrixShape s(random);
-  const int8_t* a = Place(random, ShapedFill<int8_t>(random, s.k), kReadAhead);
-  const uint8_t* w = PlaceLayer(random, s.k, s.n, 8, /*with_scales=*/false);
+  const int8_t* a = Location(random, ShapedFill<int8_t>(random, s.k), kReadAhead);
+  const uint8_t* w = OffsetLayer(random, s.k, s.n, 8, /*with_scales=*/false);
   const orra_rndnu_requant_params params = RandomFixedParams(random);
   const auto c_contents = RandomValues<int8_t>(random, s.c_stride);
   return Difference(random, kFixedPointGemm, c_contents, [&](auto gemm, int8_t* c) {
@@ -115,7 +116,7 @@ std::string CompareDepthwise(CaseRandom& random) {
   const size_t step = random.Pick("step", 1, 4), gap = random.Pick("gap", 0, 5);
   const RowList in(random, (width - 1) * step + 3, 9, channels,
                    [&](size_t) { return random.Next() % 9; });
-  const uint8_t* w = PlaceLayer(random, 3, channels, 16);
+  const uint8_t* w = OffsetLayer(random, 3, channels, 16);
   const orra_fp32_requant_params params = RandomParams(random);
   const auto contents = RandomValues<int8_t>(random, width * (channels + gap));
   return Difference(random, kDepthwise, contents, [&](auto depthwise, int8_t* out) {
@@ -130,7 +131,7 @@ std::string CompareMaxPool(CaseRandom& random) {
   const size_t positions = random.Pick("positions", 1, 5);
   const size_t pool_size = random.Pick("pool size", 1, 6);
   const size_t list_gap = random.Pick("list gap", 0, 2), gap = random.Pick("gap", 0, 5);
-  const int8_t* rows = Place(random, ShapedFill<int8_t>(random, 20 * channels), kPoolReadAhead);
+  const int8_t* rows = Location(random, ShapedFill<int8_t>(random, 20 * channels), kPoolReadAhead);
   const auto [zero_point, low, high] = RandomParams(random);
   const orra_s8_clamp_params params{low, high};
   std::vector<uintptr_t> list;
@@ -148,8 +149,8 @@ std::string CompareMaxPool(CaseRandom& random) {
 
 // The shapes of the network. What the bytes hold changes no instruction count.
 constexpr size_t kChannels = 60;
-constexpr size_t kGemmRows = std::min<size_t>(kMostRows, 380);
-constexpr size_t kIndirectGemmRows = std::min<size_t>(kMostRows, 92);
+constexpr size_t kGemmRows = std::min<size_t>(kMaxRows, 380);
+constexpr size_t kIndirectGemmRows = std::min<size_t>(kMaxRows, 92);
 constexpr orra_fp32_requant_params kParams{-128, -128, 127};
 constexpr orra_rndnu_requant_params kFixedParams{0, 1427340160, -5, -128, -128, 127};
 constexpr orra_s8_clamp_params kClamp{-128, 127};

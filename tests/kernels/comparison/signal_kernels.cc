@@ -1,8 +1,8 @@
-#include "signal_kernels.h"
+#include "kernels/signal/signal_kernels.h"
 
 #include <array>
 
-#include "comparison.h"
+#include "tests/kernels/comparison/comparison.h"
 
 namespace qz::test {
 namespace {
@@ -30,8 +30,8 @@ std::vector<int16_t> Samples(Random& random, size_t count) {
 
 std::string CompareWindow(CaseRandom& random) {
   const size_t rows = random.Pick("rows", 1, 3), count = random.Pick("count", 1, 70);
-  const int16_t* in = Place(random, Samples(random, rows * count));
-  const int16_t* weights = Place(random, Samples(random, count));
+  const int16_t* in = Location(random, Samples(random, rows * count));
+  const int16_t* weights = Location(random, Samples(random, count));
   const auto shift = static_cast<uint32_t>(random.Pick("shift", 0, 39));
   const auto out_contents = RandomValues<int16_t>(random, rows * count);
   return Difference(random, kWindow, out_contents, [&](auto window, int16_t* out) {
@@ -54,7 +54,7 @@ std::string CompareSecondStage(CaseRandom& random) {
 std::string CompareLaterStage(CaseRandom& random) {
   const size_t groups = random.Pick("groups", 1, 5), quarter = 4 * random.Pick("quarter / 4", 1, 8);
   const size_t stride = random.Pick("stride", 1, 5);
-  const int16_t* twiddles = Place(random, Samples(random, 2 * (3 * (quarter - 1) * stride + 1)));
+  const int16_t* twiddles = Location(random, Samples(random, 2 * (3 * (quarter - 1) * stride + 1)));
   return Difference(
       random, kLaterStage, Samples(random, 8 * groups * quarter),
       [&](auto stage, int16_t* data) { stage(groups, 4 * quarter, data, twiddles, 4 * stride); });
@@ -62,14 +62,14 @@ std::string CompareLaterStage(CaseRandom& random) {
 
 std::string CompareSplit(CaseRandom& random) {
   const size_t count = 8 * random.Pick("count / 8", 1, 12);
-  const int16_t* twiddles = Place(random, Samples(random, count));
+  const int16_t* twiddles = Location(random, Samples(random, count));
   return Difference(random, kSplit, Samples(random, 2 * (count + 1)),
                     [&](auto split, int16_t* data) { split(count, data, twiddles); });
 }
 
 std::string ComparePower(CaseRandom& random) {
   const size_t count = random.Pick("count", 1, 40);
-  const int16_t* in = Place(random, Samples(random, 2 * count));
+  const int16_t* in = Location(random, Samples(random, 2 * count));
   return Difference(random, kPower, RandomValues<uint32_t>(random, count),
                     [&](auto power, uint32_t* out) { power(4 * count, in, out); });
 }
@@ -80,9 +80,9 @@ std::string CompareFilterbank(CaseRandom& random) {
       random.Fill<uint8_t>(rows + 1, 1, random.Next() % 8 ? random.Between(1, 9) : 255);
   size_t bins = 0;
   for (const uint8_t width : width_values) bins += width;
-  const uint8_t* widths = Place(random, width_values);
-  const uint32_t* in = Place(random, ShapedFill<uint32_t>(random, bins));
-  const uint16_t* weights = Place(random, ShapedFill<uint16_t>(random, 2 * bins));
+  const uint8_t* widths = Location(random, width_values);
+  const uint32_t* in = Location(random, ShapedFill<uint32_t>(random, bins));
+  const uint16_t* weights = Location(random, ShapedFill<uint16_t>(random, 2 * bins));
   return Difference(
       random, kFilterbank, RandomValues<uint64_t>(random, rows),
       [&](auto filterbank, uint64_t* out) { filterbank(rows, in, widths, weights, out); });
@@ -107,7 +107,7 @@ std::vector<uint64_t> Radicands(Random& random, size_t count) {
 
 std::string CompareSquareRoot(CaseRandom& random) {
   const size_t count = random.Pick("count", 1, 21);
-  const uint64_t* in = Place(
+  const uint64_t* in = Location(
       random, random.Next() % 4 ? Radicands(random, count) : RandomValues<uint64_t>(random, count));
   const auto shift = static_cast<uint32_t>(random.Next() % 2 ? 0 : random.Pick("shift", 0, 70));
   return Difference(random, kSquareRoot, RandomValues<uint32_t>(random, count),
@@ -116,7 +116,7 @@ std::string CompareSquareRoot(CaseRandom& random) {
 
 std::string CompareNoiseSubtraction(CaseRandom& random) {
   const size_t count = 2 * random.Pick("count / 2", 1, 20);
-  const uint32_t* in = Place(random, ShapedFill<uint32_t>(random, count));
+  const uint32_t* in = Location(random, ShapedFill<uint32_t>(random, count));
   const auto factors = ShapedFill<uint32_t>(random, 5);
   const auto scale = static_cast<uint32_t>(random.Pick("scale_bits", 0, 31));
   const auto fraction = static_cast<uint32_t>(random.Pick("fraction_bits", 0, 63));
@@ -136,7 +136,7 @@ std::string CompareLogarithm(CaseRandom& random) {
     for (uint32_t& x : values)
       x = static_cast<uint32_t>(random.Next() >> (32 + random.Next() % 32));
   }
-  const uint32_t* in = Place(random, values);
+  const uint32_t* in = Location(random, values);
   const auto shift = static_cast<uint32_t>(random.Pick("input_shift", 0, 35));
   const auto scale = static_cast<uint32_t>(random.Next() >> (32 + random.Next() % 32));
   return Difference(random, kLogarithm, RandomValues<uint16_t>(random, count),

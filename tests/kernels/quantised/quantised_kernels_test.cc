@@ -1,7 +1,7 @@
 // The kernels on random layers, rows and lists against textbook sums, roundings, maxima and
 // lookups, over all tails, with gaps and guards.
 
-#include "quantised_kernels.h"
+#include "kernels/quantised/quantised_kernels.h"
 
 #include <gtest/gtest.h>
 
@@ -9,7 +9,7 @@
 #include <cmath>
 #include <vector>
 
-#include "random_layer.h"
+#include "tests/support/random_layer.h"
 
 namespace qz::test {
 namespace {
@@ -74,11 +74,11 @@ void CheckMatrixKernels(Random& random, size_t m, size_t n, size_t k) {
   std::vector<int8_t> direct = expected, indirect = expected, fixed = expected;
   std::vector<int8_t> expected_fixed = expected;
   for (size_t j = 0; j < n; ++j) {
-    const size_t place = j / 8 * block + j % 8;
-    expected_fixed[place] = Requantise(Sum(layer, j, a.data()), fixed_params);
+    const size_t location = j / 8 * block + j % 8;
+    expected_fixed[location] = Requantise(Sum(layer, j, a.data()), fixed_params);
     for (size_t r = 0; r < m; ++r) {
       const int32_t sum = Sum(layer, j, &a[r * a_stride]);
-      expected[r * stride + place] = Requantise(sum, layer.scales[j], params);
+      expected[r * stride + location] = Requantise(sum, layer.scales[j], params);
     }
   }
   orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
@@ -148,8 +148,8 @@ TEST(MaxPool, EqualsPlainMaximum) {
       for (size_t e = 0; e < pool_size; ++e) {
         entries.push_back(channels * random.Pick(0, 19));
         for (size_t c = 0; c < channels; ++c) {
-          int8_t& largest = expected[p * stride + c];
-          largest = std::clamp(in[entries.back() + c], largest, params.output_max);
+          int8_t& max = expected[p * stride + c];
+          max = std::clamp(in[entries.back() + c], max, params.output_max);
         }
       }
       entries.insert(entries.end(), pool_size % 2 + gap, UINTPTR_MAX / 2);

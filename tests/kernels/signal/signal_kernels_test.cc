@@ -1,6 +1,6 @@
 // The kernels in the order of the front end. A 99 behind an output is a guard.
 
-#include "signal_kernels.h"
+#include "kernels/signal/signal_kernels.h"
 
 #include <gmock/gmock.h>
 
@@ -8,7 +8,7 @@
 #include <numeric>
 #include <vector>
 
-#include "random.h"
+#include "tests/support/random.h"
 
 namespace {
 

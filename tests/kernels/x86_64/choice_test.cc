@@ -3,10 +3,10 @@
 
 #include <gtest/gtest.h>
 
-#include "choices.h"
-#include "processor.h"
-#include "quantised_kernels.h"
-#include "signal_kernels.h"
+#include "kernels/quantised/quantised_kernels.h"
+#include "kernels/signal/signal_kernels.h"
+#include "kernels/x86_64/choices.h"
+#include "kernels/x86_64/processor.h"
 
 #define QZ_DECLARE(kernel, row)                                \
   extern "C" decltype(kernel) kernel##__plain, kernel##__avx2; \

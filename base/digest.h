@@ -1,0 +1,18 @@
+// 64-bit FNV-1a, by which outputs are told apart and compared over builds.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+
+namespace qz::base {
+
+constexpr uint64_t kEmptyDigest = 0xCBF29CE484222325u;
+
+// The digest of what `digest` stands for and the bytes behind it.
+inline uint64_t Digest(const void* bytes, size_t count, uint64_t digest = kEmptyDigest) {
+  const auto* const values = static_cast<const uint8_t*>(bytes);
+  for (size_t i = 0; i < count; ++i) digest = (digest ^ values[i]) * 0x100000001B3u;
+  return digest;
+}
+
+}  // namespace qz::base

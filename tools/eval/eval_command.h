@@ -1,0 +1,27 @@
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "base/exit_code.h"
+
+namespace qz::tools {
+
+struct EvalOptions {
+  struct Part {
+    int fold = 0;  // whose clips the model scores; 0: those of all folds from 1 on
+    std::string model;
+  };
+  std::string manifest;
+  std::string labels;
+  std::vector<Part> parts;  // in order of their folds; one, or one a fold
+  std::string scores_out;   // empty: none
+  bool json = false;
+};
+
+// Scores the clips of a manifest, each from a fresh start, and prints how well they were told
+// apart: the figures of each part and the means over the parts. Clips that can't be read are named,
+// left out and counted, and make the exit code kUnreadableInput. Says what went wrong itself.
+base::ExitCode EvalCommand(const EvalOptions& options);
+
+}  // namespace qz::tools

@@ -1,0 +1,155 @@
+#include "tools/model/model_command.h"
+
+#include <cstdio>
+#include <stdexcept>
+#include <vector>
+
+#include "arrays/npy_file.h"
+#include "audio/audio_input.h"
+#include "dataset/clip.h"
+#include "evaluation/clip_scores.h"
+#include "model/array_files.h"
+#include "model/check_weights.h"
+#include "model/model_files.h"
+#include "model/packing.h"
+#include "tools/console.h"
+#include "tools/model/model_info.h"
+
+namespace qz::tools {
+namespace {
+
+using model::PackedModel;
+
+// A line end goes behind what Console puts out.
+std::string WithoutLastLineEnd(std::string text) {
+  if (!text.empty() && text.back() == '\n') text.pop_back();
+  return text;
+}
+
+void PrintFindings(const std::string& file, const std::vector<std::string>& findings,
+                   Console* console) {
+  console->Message(WithoutLastLineEnd(model::FormatFindings(file, findings)));
+}
+
+base::ExitCode Fail(const std::exception& error, base::ExitCode exit_code, Console* console) {
+  console->Message(std::string("qz: ") + error.what());
+  return exit_code;
+}
+
+base::ExitCode OutputResult(base::ExitCode result, Console* console) {
+  const std::string fault = console->OutputFault();
+  if (fault.empty()) return result;
+  console->Message("qz: " + fault);
+  return base::kFaultFound;
+}
+
+base::ExitCode ReadModel(const std::string& file, PackedModel* packed, Console* console) {
+  try {
+    *packed = model::ReadModelFile(file);
+    return base::kSuccess;
+  } catch (const std::runtime_error& error) {
+    return Fail(error, base::kUnreadableInput, console);
+  }
+}
+
+base::ExitCode ReadValidModel(const std::string& file, PackedModel* packed, Console* console) {
+  const base::ExitCode result = ReadModel(file, packed, console);
+  if (result != base::kSuccess) return result;
+  const std::vector<std::string> findings = model::CheckWeights(*packed);
+  if (findings.empty()) return base::kSuccess;
+  PrintFindings(file, findings, console);
+  return base::kFaultFound;
+}
+
+std::string Counted(size_t count, const char* what) {
+  return std::to_string(count) + " " + what + (count == 1 ? "" : "s");
+}
+
+// Prints a line for a table and one for each of its findings, of which it returns the number.
+size_t CheckOneTable(const std::string& file, const PackedModel& packed,
+                     const model::TableLayout& table, Console* console) {
+  const std::vector<std::string> findings = model::CheckTable(packed, table);
+  char line[96];
+  std::snprintf(line, sizeof line, "%-4s %6zu bytes  %s", std::string(table.name).c_str(),
+                table.Bytes(),
+                findings.empty() ? "sound" : Counted(findings.size(), "finding").c_str());
+  console->Data(line);
+  if (!findings.empty()) {
+    console->Data(WithoutLastLineEnd(model::FormatFindings(file, findings)));
+  }
+  return findings.size();
+}
+
+}  // namespace
+
+base::ExitCode ModelCheckCommand(const std::string& file) {
+  Console console;
+  PackedModel packed;
+  const base::ExitCode result = ReadModel(file, &packed, &console);
+  if (result != base::kSuccess) return result;
+  if (packed.size() != model::kModelBytes) {
+    console.Data(WithoutLastLineEnd(model::FormatFindings(file, model::CheckWeights(packed))));
+    return OutputResult(base::kFaultFound, &console);
+  }
+  size_t findings = 0;
+  for (const model::TableLayout& table : model::kTables) {
+    findings += CheckOneTable(file, packed, table, &console);
+  }
+  console.Data(file + (findings == 0 ? ": sound" : ": not sound: " + Counted(findings, "finding")));
+  return OutputResult(findings == 0 ? base::kSuccess : base::kFaultFound, &console);
+}
+
+base::ExitCode ModelInfoCommand(const std::string& file, const std::string& clip) {
+  Console console;
+  PackedModel packed;
+  const base::ExitCode result = ReadValidModel(file, &packed, &console);
+  if (result != base::kSuccess) return result;
+  try {
+    std::string text = file + ": " + TablesText(packed, model::Unpack(packed));
+    if (!clip.empty()) {
+      text += "\n" + clip + ": " +
+              TensorsText(TensorsOf(packed, evaluation::FeaturesToPlay(dataset::ReadClip(clip))));
+    }
+    console.Data(WithoutLastLineEnd(text));
+    return OutputResult(base::kSuccess, &console);
+  } catch (const model::PackingError& error) {
+    PrintFindings(file, error.findings(), &console);
+    return base::kFaultFound;
+  } catch (const audio::AudioError& error) {
+    return Fail(error, base::kUnreadableInput, &console);
+  }
+}
+
+base::ExitCode ModelImportCommand(const std::string& arrays, const std::string& output) {
+  Console console;
+  try {
+    const PackedModel packed = model::Pack(model::ReadModelArrays(arrays));
+    model::WriteWholeFile(output, std::string(packed.begin(), packed.end()));
+    return base::kSuccess;
+  } catch (const model::PackingError& error) {
+    PrintFindings(arrays, error.findings(), &console);
+    return base::kFaultFound;
+  } catch (const arrays::NpyError& error) {
+    return Fail(error, base::kUnreadableInput, &console);
+  } catch (const std::runtime_error& error) {  // of writing
+    return Fail(error, base::kFaultFound, &console);
+  }
+}
+
+base::ExitCode ModelExportCommand(const std::string& file, const std::string& output) {
+  Console console;
+  PackedModel packed;
+  const base::ExitCode result = ReadValidModel(file, &packed, &console);
+  if (result != base::kSuccess) return result;
+  try {
+    model::WriteModelArrays(output, model::Unpack(packed));
+    return base::kSuccess;
+  } catch (const model::PackingError& error) {
+    PrintFindings(file, error.findings(), &console);
+    return base::kFaultFound;
+  } catch (const arrays::NpyError& error) {
+    return Fail(error, base::kFaultFound, &console);
+  }
+}
+
+}  // namespace qz::tools

@@ -1,0 +1,139 @@
+#include "tools/model/model_info.h"
+
+#include <algorithm>
+#include <cstdio>
+
+#include "dataset/clip_features.h"
+#include "network/loaded/loaded_network.h"
+#include "network/operators.h"
+
+namespace qz::tools {
+namespace {
+
+using model::TableKind;
+using model::TableLayout;
+
+constexpr size_t kFramesBetweenRuns = 64;
+
+constexpr const char* kOperatorNames[model::kOperators - 1] = {
+    "depthwise", "pointwise", "max pool",  "depthwise", "pointwise", "max pool", "3-tap",
+    "max pool",  "3-tap",     "max pool",  "3-tap",     "max pool",  "3-tap",    "3-tap",
+    "max pool",  "3-tap",     "as vector", "connected", "connected", "logistic"};
+static_assert(kOperatorCount == model::kOperators);
+
+void Add(const Tensor& tensor, TensorSummary* summary) {
+  const int8_t* values = BytesOf(tensor);
+  summary->values += tensor.Bytes();
+  for (size_t i = 0; i < tensor.Bytes(); ++i) {
+    const int value = values[i];
+    summary->min = std::min(summary->min, value);
+    summary->max = std::max(summary->max, value);
+    summary->at_min_int8 += value == -128;
+    summary->at_max_int8 += value == 127;
+  }
+  summary->digest = base::Digest(values, tensor.Bytes(), summary->digest);
+}
+
+double Percent(uint64_t part, uint64_t whole) {
+  return whole == 0 ? 0 : 100.0 * static_cast<double>(part) / static_cast<double>(whole);
+}
+
+template <typename... Values>
+std::string Line(const char* format, Values... values) {
+  char text[192];
+  std::snprintf(text, sizeof text, format, values...);
+  return text;
+}
+
+std::string WeightShape(const TableLayout& table) {
+  std::string shape = std::to_string(table.outputs);
+  if (table.kind != TableKind::kDepthwise) shape = std::to_string(table.inputs) + " x " + shape;
+  return (table.taps > 1 ? std::to_string(table.taps) + " x " : "") + shape;
+}
+
+template <typename T>
+std::string Range(const std::vector<T>& values) {
+  const auto [min, max] = std::minmax_element(values.begin(), values.end());
+  return std::to_string(*min) + " to " + std::to_string(*max);
+}
+
+std::string ScaleRange(const std::vector<float>& scales) {
+  if (scales.empty()) return "none";
+  const auto [min, max] = std::minmax_element(scales.begin(), scales.end());
+  if (*min == *max) return Line("%.4g", static_cast<double>(*min));
+  return Line("%.4g to %.4g", static_cast<double>(*min), static_cast<double>(*max));
+}
+
+std::string TableLine(const TableLayout& table, const model::LayerArrays& arrays) {
+  const auto at_the_end =
+      std::count_if(arrays.weight.begin(), arrays.weight.end(),
+                    [](int8_t weight) { return weight == 127 || weight == -127; });
+  return Line("%-5s  %2d %-9s  %-11s  %6zu  %-12s  %5.1f %%  %-18s  %s\n",
+              std::string(table.name).c_str(), table.op, kOperatorNames[table.op],
+              WeightShape(table).c_str(), table.Bytes(), Range(arrays.weight).c_str(),
+              Percent(static_cast<uint64_t>(at_the_end), arrays.weight.size()),
+              Range(arrays.bias).c_str(), ScaleRange(arrays.scale).c_str());
+}
+
+std::string TensorLine(const std::string& name, const Tensor& shape, int zero_point,
+                       const TensorSummary& summary) {
+  return Line("%-12s  %3zu x %-2zu  %6d  %7d  %10d  %6.2f %%  %6.2f %%  %016llx\n", name.c_str(),
+              shape.rows, shape.channels, summary.min, summary.max, zero_point,
+              Percent(summary.at_min_int8, summary.values),
+              Percent(summary.at_max_int8, summary.values),
+              static_cast<unsigned long long>(summary.digest));
+}
+
+}  // namespace
+
+TensorSummaries TensorsOf(const model::PackedModel& packed, const std::vector<uint16_t>& features) {
+  std::copy(packed.begin(), packed.end(), loaded_tables);
+  TensorSummaries tensors;
+  tensors.frames = features.size() / kInput.channels;
+  for (size_t first = 0; first + kInput.rows <= tensors.frames; first += kFramesBetweenRuns) {
+    const uint16_t* window = features.data() + first * kInput.channels;
+    std::transform(window, window + kInput.Bytes(), mobilenet_backend_input_ptr,
+                   dataset::NetworkInput);
+    Add(kInput, &tensors.input);
+    for (size_t op = 0; op < kOperatorCount; ++op) {
+      kOperators[op].run();
+      if (op < tensors.outputs.size()) Add(kOperators[op].output, &tensors.outputs[op]);
+    }
+    for (size_t i = 0; i < tensors.max_scores.size(); ++i) {
+      float& max = tensors.max_scores[i];
+      max = std::max(max, mobilenet_backend_output_ptr[i]);
+    }
+    ++tensors.runs;
+  }
+  return tensors;
+}
+
+std::string TablesText(const model::PackedModel& packed, const model::ModelArrays& arrays) {
+  const uint64_t digest = base::Digest(packed.data(), packed.size());
+  std::string text = Line("packed model of %zu bytes, digest %016llx\n", packed.size(),
+                          static_cast<unsigned long long>(digest));
+  text += Line("%-5s  %-12s  %-11s  %6s  %-12s  %7s  %-18s  %s\n", "table", "operator", "weights",
+               "bytes", "from, to", "at ±127", "biases", "scales");
+  for (size_t i = 0; i < model::kTableCount; ++i) text += TableLine(model::kTables[i], arrays[i]);
+  return text;
+}
+
+std::string TensorsText(const TensorSummaries& tensors) {
+  std::string text = Line("%zu frames with the silence behind it, %zu network runs\n",
+                          tensors.frames, tensors.runs);
+  text += Line("%-12s  %-8s  %6s  %7s  %10s  %8s  %8s  %s\n", "tensor", "values", "lowest",
+               "highest", "zero point", "at -128", "at 127", "digest");
+  text += TensorLine("   input", kInput, -128, tensors.input);
+  for (size_t op = 0; op < tensors.outputs.size(); ++op) {
+    const int number = static_cast<int>(op);
+    text += TensorLine(Line("%2d %s", number, kOperatorNames[op]), kOperators[op].output,
+                       model::RequantisationOf(number).zero_point, tensors.outputs[op]);
+  }
+  text += "highest scores:";
+  for (const float score : tensors.max_scores) {
+    text += Line(" %.4f", static_cast<double>(score));
+  }
+  return text + "\n";
+}
+
+}  // namespace qz::tools

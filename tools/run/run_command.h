@@ -1,0 +1,29 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+#include "base/exit_code.h"
+#include "chre.h"
+
+namespace qz::tools {
+
+struct RunOptions {
+  std::string file;  // "-": standard input
+  bool raw = false;
+  uint32_t host_clients = 1;
+  uint32_t client_nanoapps = 1;
+  chreLogLevel log_level = CHRE_LOG_WARN;
+  bool json = false;
+  bool real_time = false;
+  std::string module_path;
+  bool scores = false;          // show all five, as the tool hears them
+  std::string thresholds_path;  // a table by which the tool detects; empty: none
+  std::string model_path;       // of these two: the module's own model
+  std::string labels_path;      // names of the outputs; empty: none, and neither of the two
+};
+
+// Plays a file to the nanoapp and prints what its clients receive. Says what went wrong itself.
+base::ExitCode RunCommand(const RunOptions& options);
+
+}  // namespace qz::tools
