@@ -1,0 +1,20 @@
+// What follows from the description of the detector, and what must hold of any.
+#pragma once
+
+#include "detector_description.h"
+
+namespace qz::config {
+
+constexpr uint64_t kNanosecondsPerSecond = 1000000000;
+constexpr uint64_t kBufferDurationNs = kBufferSamples * kNanosecondsPerSecond / kSampleRateHz;
+constexpr size_t kCarriedSamples = kFrameSamples - kHopSamples;        // from frame to frame
+constexpr size_t kCarriedFrames = kWindowFrames - kFramesBetweenRuns;  // from run to run
+constexpr size_t kReportSize = 2;                                      // the smoothed outputs
+constexpr int kFeatureZeroPoint = 128;  // a feature less this, saturated to int8, is an input
+
+static_assert(kBufferSamples % kHopSamples == 0, "a buffer is whole hops");
+static_assert(kHopSamples <= kFrameSamples && kFramesBetweenRuns <= kWindowFrames);
+static_assert(kShortSmoothedOutput < kClasses && kLongSmoothedOutput < kClasses &&
+              kShortSmoothedOutput != kLongSmoothedOutput);
+
+}  // namespace qz::config
