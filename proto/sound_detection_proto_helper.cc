@@ -92,6 +92,12 @@ ChreBuffer Encode(const HeapEncoding& encoding, const void* message, bool with_l
   return buffer;
 }
 
+// A zero tag ends a message, as nanopb 0.3 had it for every message. 0.4, with which this is built,
+// also refuses a known field of another wire type than declared; 0.3 read the value as declared.
+bool Decode(pb_istream_t* stream, const pb_msgdesc_t* fields, void* request) {
+  return pb_decode_ex(stream, fields, request, PB_DECODE_NULLTERMINATED);
+}
+
 }  // namespace
 
 sound_detection_SoundDetectionEventResponse GetDetectionEventResponse(
@@ -155,7 +161,7 @@ bool EncodeQueryResponseMessage(uint8_t* buffer, uint32_t& size) {
 bool DecodeSoundDetectionEnableRequestMessage(
     const uint8_t* data, uint32_t size, sound_detection_SoundDetectionEnableRequest* request) {
   pb_istream_t stream = pb_istream_from_buffer(data, size);
-  if (pb_decode(&stream, sound_detection_SoundDetectionEnableRequest_fields, request)) return true;
+  if (Decode(&stream, sound_detection_SoundDetectionEnableRequest_fields, request)) return true;
   chreLog(CHRE_LOG_ERROR, "%s Unable to decode message SoundDetectionEnableRequest, error %s",
           kApplicationLogPrefix, PB_GET_ERROR(&stream));
   return false;
@@ -164,7 +170,7 @@ bool DecodeSoundDetectionEnableRequestMessage(
 bool DecodeSoundDetectionDisableRequestMessage(
     const uint8_t* data, uint32_t size, sound_detection_SoundDetectionDisableRequest* request) {
   pb_istream_t stream = pb_istream_from_buffer(data, size);
-  if (pb_decode(&stream, sound_detection_SoundDetectionDisableRequest_fields, request)) return true;
+  if (Decode(&stream, sound_detection_SoundDetectionDisableRequest_fields, request)) return true;
   chreLog(CHRE_LOG_ERROR, "%s Unable to decode message, error %s", kApplicationLogPrefix,
           PB_GET_ERROR(&stream));
   return false;

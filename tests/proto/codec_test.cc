@@ -23,7 +23,8 @@ class Codec : public testing::Test {
     RawAudioInfo info{static_cast<uint16_t>(audio.size()), audio.data()};
     return Contents(EncodeRawAudioSegment(GetRawAudioSegment(1, 2, &info), &size_));
   }
-  Bytes Contents(const ChreBuffer& buffer) const {
+  Bytes Contents(const ChreBuffer& buffer) {
+    EXPECT_EQ(runtime_.hub.heap().SizeOf(buffer.get()), buffer ? size_ : 0);
     return buffer ? Bytes(buffer.get(), buffer.get() + size_) : Bytes();
   }
   // The client ID of a request, or -1.
@@ -51,6 +52,17 @@ TEST_F(Codec, AReportHasTheKnownBytes) {
 TEST_F(Codec, ARawAudioSegmentHasTheKnownBytes) {
   EXPECT_EQ(EncodeRaw({0xAA, 0xBB, 0xCC}), (Bytes{0x08, 1, 0x10, 2, 0x1A, 3, 0xAA, 0xBB, 0xCC}));
   EXPECT_EQ(EncodeRaw(Bytes(65535, 0x5A)).size(), 4u + 4u + 65535u);
+}
+
+TEST_F(Codec, ValuesOfZeroAreWritten) {
+  ConfidenceEvents events;
+  events.push_back({0, 0.0f});
+  EXPECT_EQ(Contents(EncodeDetectionResponseMessage(GetDetectionEventResponse(&events, 0, 0),
+                                                    /*with_length_prefix=*/false, &size_)),
+            (Bytes{0x08, 0, 0x12, 0x07, 0x08, 0, 0x15, 0, 0, 0, 0, 0x18, 0, 0x20, 0}));
+  RawAudioInfo info{0, nullptr};
+  EXPECT_EQ(Contents(EncodeRawAudioSegment(GetRawAudioSegment(0, 0, &info), &size_)),
+            (Bytes{0x08, 0, 0x10, 0, 0x1A, 0}));
 }
 
 TEST_F(Codec, AMissingOrSmallBufferIsLogged) {
@@ -91,6 +103,24 @@ TEST_F(Codec, RequestsOfTheOtherImplementationAreRead) {
       ElementsAre("E Unable to decode message SoundDetectionEnableRequest, error integer too large",
                   "E Unable to decode message SoundDetectionEnableRequest, error end-of-stream",
                   "E Unable to decode message, error integer too large"));
+}
+
+TEST_F(Codec, AZeroTagEndsARequestAndAnotherWireTypeFailsIt) {
+  const auto enable = DecodeSoundDetectionEnableRequestMessage;
+  const auto disable = DecodeSoundDetectionDisableRequestMessage;
+  // What follows is not read, whatever it is.
+  EXPECT_EQ(ClientId(enable, {0x10, 0x07, 0x00, 0xFF, 0xFF}), 7);
+  EXPECT_EQ(ClientId(disable, {0x08, 0x09, 0x00, 0x08, 0x0A}), 9);
+  EXPECT_EQ(ClientId(enable, {0x00}) + ClientId(disable, {0x00, 0x08, 0x01}), 0);
+  EXPECT_THAT(runtime_.log, IsEmpty());
+
+  // client_id as 4 bytes, and behind a length.
+  EXPECT_EQ(ClientId(enable, {0x15, 0x07, 0x00, 0x00, 0x00}), -1);
+  EXPECT_EQ(ClientId(disable, {0x0A, 0x01, 0x07}), -1);
+  EXPECT_THAT(
+      runtime_.TakeLog(),
+      ElementsAre("E Unable to decode message SoundDetectionEnableRequest, error wrong wire type",
+                  "E Unable to decode message, error wrong wire type"));
 }
 
 }  // namespace
