@@ -1,15 +1,19 @@
 #include "hub/clients.h"
 
 #include "hub/messages.h"
+#include "hub/precondition.h"
 
 namespace qz::hub {
 namespace {
 
 constexpr uint16_t kFirstEndpoint = 0x0010;
+constexpr uint16_t kInvalidEndpoint = 0xFFFF;
 
 }  // namespace
 
 void Clients::Connect(uint32_t hosts, uint32_t nanoapps) {
+  QZ_HUB_REQUIRE(hosts_.empty() && nanoapps_.empty());
+  QZ_HUB_REQUIRE(hosts <= uint32_t{kInvalidEndpoint - kFirstEndpoint});
   for (uint32_t i = 0; i < nanoapps; ++i) {
     nanoapps_.push_back(0);
     uint32_t& id = nanoapps_.back();

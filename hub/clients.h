@@ -7,7 +7,7 @@
 
 namespace qz::hub {
 
-// Gets what clients receive; bytes are valid during the call.
+// Receives what clients receive; bytes are valid during the call.
 class ClientListener {
  public:
   virtual ~ClientListener() = default;
@@ -17,16 +17,17 @@ class ClientListener {
 };
 
 // The clients of a run: host endpoints from 0x0010 upwards with client IDs from 0, and client
-// nanoapps. Must outlive the nanoapp's run on the hub.
+// nanoapps. Must outlive the nanoapp's run on the hub. Neither pointer may be null.
 class Clients {
  public:
   Clients(Hub* hub, ClientListener* listener) : hub_(*hub), listener_(*listener) {}
   Clients(const Clients&) = delete;
   Clients& operator=(const Clients&) = delete;
 
-  // Each nanoapp registers; each host asks for the categories, then enables detection.
+  // Each nanoapp registers; each host asks for the categories, then enables detection. Once, with
+  // at most 0xFFEF hosts.
   void Connect(uint32_t hosts, uint32_t nanoapps);
-  // Whoever is served takes its leave.
+  // Accepted hosts disable detection, nanoapps unregister.
   void Leave();
 
   uint64_t accepted_hosts() const { return accepted_hosts_; }

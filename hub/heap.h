@@ -9,7 +9,8 @@
 
 namespace qz::hub {
 
-// The hub's heap for nanoapps: knows every block, remembers every misuse, and refuses on request.
+// The hub's heap for nanoapps: tracks every block, records every misuse, and refuses an allocation
+// on request.
 class Heap {
  public:
   Heap() = default;
@@ -17,25 +18,25 @@ class Heap {
   Heap& operator=(const Heap&) = delete;
   ~Heap();
 
-  // A block of `bytes` bytes, or null when the system has none or a refusal is due.
+  // A block of `bytes` bytes, or null when the system has none or this allocation is refused.
   void* Allocate(uint32_t bytes);
-  // Gives a block back. Null is fine; anything but a live block is a fault and is otherwise
-  // ignored.
+  // Frees a block. Null is allowed; anything else that is not a live block is recorded as a fault
+  // and otherwise ignored.
   void Free(void* block);
 
-  // Refuses the n-th allocation from now, counted from 1; 0 takes the order back.
+  // Refuses the n-th allocation from now, counted from 1; 0 refuses none.
   void RefuseNth(uint64_t n) {
     refuse_in_ = n;
     refused_ = false;
   }
-  // True once the refusal last ordered has happened.
+  // True once the refusal last requested has happened.
   bool refused() const { return refused_; }
 
   size_t live_blocks() const { return live_.size(); }
   uint64_t allocations() const { return allocations_; }
   // Bytes of a live block, 0 for any other address.
   size_t SizeOf(const void* block) const;
-  // One sentence for each double free or free of a stranger.
+  // A message for each double free or free of an unknown address.
   const std::vector<std::string>& faults() const { return faults_; }
 
  private:

@@ -1,8 +1,11 @@
 #include "hub/hub.h"
 
 #include <chrono>
+#include <stdexcept>
 #include <thread>
 #include <utility>
+
+#include "hub/precondition.h"
 
 namespace qz::hub {
 namespace {
@@ -19,12 +22,14 @@ uint64_t WallClockNs() {
 }  // namespace
 
 Hub::Hub(int64_t host_time_offset_ns) : host_time_offset_ns_(host_time_offset_ns) {
-  InstallRuntime(this);
+  if (!InstallRuntime(this)) {
+    throw std::logic_error("a second hub in one process: the runtime's functions serve one hub");
+  }
 }
 
 Hub::~Hub() {
   End();
-  InstallRuntime(nullptr);
+  RemoveRuntime();
 }
 
 void Hub::RunInRealTime() {
@@ -33,6 +38,7 @@ void Hub::RunInRealTime() {
 }
 
 bool Hub::Start(const std::string& module_path, LoadFailure* failure) {
+  QZ_HUB_REQUIRE(failure != nullptr);
   End();
   module_ = NanoappModule::Load(module_path, failure);
   if (module_ != nullptr && StartNanoapp(module_->info(), module_path, failure)) return true;
@@ -41,17 +47,22 @@ bool Hub::Start(const std::string& module_path, LoadFailure* failure) {
 }
 
 bool Hub::StartLinked(const chreNslNanoappInfo& info, LoadFailure* failure) {
+  QZ_HUB_REQUIRE(failure != nullptr);
   End();
-  const std::string wrong = CheckNanoappInfo(info);
-  if (wrong.empty()) return StartNanoapp(info, info.name, failure);
-  *failure = {LoadFailure::Kind::kRefused, "linked nanoapp: refused: " + wrong};
+  const std::string error = CheckNanoappInfo(info);
+  if (error.empty()) return StartNanoapp(info, info.name, failure);
+  *failure = {LoadFailure::Kind::kRefused, "linked nanoapp: refused: " + error};
   return false;
 }
 
 bool Hub::StartNanoapp(const chreNslNanoappInfo& info, const std::string& name,
                        LoadFailure* failure) {
+  QZ_HUB_REQUIRE(!delivering_);
   ended_ = false;
-  nanoapp_ = info.start() ? &info : nullptr;
+  in_nanoapp_ = true;
+  const bool started = info.start();
+  in_nanoapp_ = false;
+  nanoapp_ = started ? &info : nullptr;
   RunQueue();
   if (nanoapp_ == nullptr) {
     *failure = {LoadFailure::Kind::kRefused, name + ": refused: its start entry point failed"};
@@ -61,9 +72,13 @@ bool Hub::StartNanoapp(const chreNslNanoappInfo& info, const std::string& name,
 
 void Hub::End() {
   if (nanoapp_ == nullptr) return;
+  QZ_HUB_REQUIRE(!delivering_);
   RunQueue();
+  in_nanoapp_ = true;
   nanoapp_->end();
-  // What the end left behind finds no nanoapp any more, but its free callbacks lie in the module.
+  in_nanoapp_ = false;
+  // Events queued by the end entry point find no nanoapp, but their free callbacks are in the
+  // module.
   nanoapp_ = nullptr;
   RunQueue();
   module_.reset();
@@ -71,6 +86,7 @@ void Hub::End() {
 }
 
 void Hub::ConnectHostEndpoint(uint16_t endpoint, MessageHandler handler) {
+  QZ_HUB_REQUIRE(handler != nullptr);
   endpoints_[endpoint] = std::move(handler);
 }
 
@@ -82,11 +98,13 @@ void Hub::SendFromHost(uint16_t endpoint, uint32_t type, const std::vector<uint8
 }
 
 uint32_t Hub::AddClientNanoapp(EventHandler handler) {
+  QZ_HUB_REQUIRE(handler != nullptr);
   clients_[next_instance_id_] = std::move(handler);
   return next_instance_id_++;
 }
 
 void Hub::StopClientNanoapp(uint32_t instance_id) {
+  QZ_HUB_REQUIRE(clients_.count(instance_id) == 1);
   clients_.erase(instance_id);
   const chreNanoappInfo info{0, 1, instance_id};
   DeliverToNanoapp(0, CHRE_EVENT_NANOAPP_STOPPED, &info);
@@ -104,6 +122,7 @@ bool Hub::audio_enabled() const {
 }
 
 void Hub::PlayAudio(const int16_t* samples, uint32_t count) {
+  QZ_HUB_REQUIRE(samples != nullptr || count == 0);
   const uint64_t start_ns = now_ns_;
   AdvanceTime(count * kNsPerSecond / kSampleRateHz);
   for (uint32_t handle = 0; handle < sources_.size(); ++handle) {
@@ -175,6 +194,7 @@ bool Hub::SendEvent(uint16_t type, void* data, chreEventCompleteFunction* free_c
 
 bool Hub::SendMessageToHost(void* message, size_t size, uint32_t type, uint16_t endpoint,
                             chreMessageFreeFunction* free_callback) {
+  QZ_HUB_REQUIRE(message != nullptr || size == 0);
   auto deliver = [=] {
     const auto host = endpoints_.find(endpoint);
     if (host == endpoints_.end()) {
@@ -201,6 +221,7 @@ bool Hub::Post(bool refused, QueuedEvent queued) {
 }
 
 bool Hub::GetAudioSource(uint32_t handle, chreAudioSource* source) {
+  QZ_HUB_REQUIRE(source != nullptr);
   if (handle >= sources_.size()) return false;
   const AudioSource& offered = sources_[handle];
   *source = {offered.name.c_str(), offered.sample_rate_hz, offered.min_buffer_ns,
@@ -230,11 +251,15 @@ bool Hub::RequestClockRate(uint32_t request) {
 }
 
 void Hub::RunQueue() {
+  // One event at a time: a log handler, say, runs inside the nanoapp and must not send.
+  QZ_HUB_REQUIRE(!in_nanoapp_);
   while (!queue_.empty()) {
     const QueuedEvent queued = std::move(queue_.front());
     queue_.pop_front();
+    const bool outer = std::exchange(delivering_, true);
     queued.deliver();
     queued.release();
+    delivering_ = outer;
   }
 }
 
@@ -244,7 +269,9 @@ void Hub::CallNanoapp(uint32_t sender, uint16_t type, const void* data) {
     return;
   }
   ++counts_.events;
+  in_nanoapp_ = true;
   nanoapp_->handleEvent(sender, type, data);
+  in_nanoapp_ = false;
 }
 
 void Hub::PostAudioStatus(uint32_t handle, bool enabled, bool suspended) {

@@ -15,7 +15,7 @@
 
 namespace qz::hub {
 
-// A microphone that the hub offers; its handle is its place in the list of sources.
+// A microphone that the hub offers; its handle is its index in the list of sources.
 struct AudioSource {
   std::string name = "microphone";
   uint32_t sample_rate_hz = 16000;
@@ -28,25 +28,26 @@ struct AudioSource {
   uint64_t interval_ns = 0;
 };
 
-// Things that go wrong on request.
+// Faults to inject.
 struct FaultPlan {
   bool refuse_host_messages = false;
   bool refuse_events = false;
 };
 
-// What went through the hub so far.
+// Counts since construction.
 struct HubCounts {
   uint64_t audio_buffers = 0;       // delivered to the nanoapp
   uint64_t events = 0;              // delivered to the nanoapp, audio included
   uint64_t client_events = 0;       // from the nanoapp to client nanoapps
   uint64_t messages_to_host = 0;    // from the nanoapp to host endpoints
   uint64_t messages_from_host = 0;  // to the nanoapp
-  uint64_t undeliverable = 0;       // to an endpoint or instance that is not there
+  uint64_t undeliverable = 0;       // to an unknown endpoint or instance, or with no nanoapp
   uint64_t clock_raises = 0;        // requests for the higher processor clock
 };
 
 // A context hub on a PC: one nanoapp, one thread, an event queue, a virtual clock. Everything that
 // a nanoapp sends is queued and delivered in order; each free callback runs once, after delivery.
+// Preconditions named below are checked in every build and end the program.
 class Hub final : public Runtime {
  public:
   // `bytes` may be null when `size` is 0; valid during the call.
@@ -56,12 +57,12 @@ class Hub final : public Runtime {
   using LogHandler =
       std::function<void(chreLogLevel level, uint64_t time_ns, const std::string& line)>;
 
-  // There can be one hub at a time.
+  // Throws std::logic_error if there is a hub already: a process has one at a time.
   explicit Hub(int64_t host_time_offset_ns = 0);
   // Ends the nanoapp if it runs.
   ~Hub() override;
 
-  // Set-up.
+  // Set-up. A log handler runs inside the nanoapp: it must not send or advance the queue.
   void SetLogHandler(LogHandler handler) { log_ = std::move(handler); }
   std::vector<AudioSource>& sources() { return sources_; }
   FaultPlan& fault_plan() { return fault_plan_; }
@@ -69,41 +70,43 @@ class Hub final : public Runtime {
   // Lets the virtual clock keep pace with the wall clock.
   void RunInRealTime();
 
-  // Ends what runs, loads the module and runs its start entry point; false with `*failure` filled
-  // if either fails.
+  // Ends the running nanoapp, loads the module and runs its start entry point; false with
+  // `*failure` (not null) filled if either fails. Not from a handler.
   bool Start(const std::string& module_path, LoadFailure* failure);
   // The same for a nanoapp that is linked into the program.
   bool StartLinked(const chreNslNanoappInfo& info, LoadFailure* failure);
-  // Runs the end entry point, gives back what is still queued, and unloads. Nothing if not started.
+  // Runs the end entry point, releases what is still queued, and unloads; does nothing if no
+  // nanoapp runs. Not from a handler.
   void End();
   // The record of the running nanoapp, or null.
   const chreNslNanoappInfo* nanoapp() const { return nanoapp_; }
 
-  // Host endpoints.
+  // Host endpoints. Handlers must not be empty; they may send.
   void ConnectHostEndpoint(uint16_t endpoint, MessageHandler handler);
   void DisconnectHostEndpoint(uint16_t endpoint) { endpoints_.erase(endpoint); }
   void SendFromHost(uint16_t endpoint, uint32_t type, const std::vector<uint8_t>& payload);
 
-  // Client nanoapps: adding one gives its instance ID. Stopping one tells the nanoapp.
+  // Client nanoapps: adding one returns its instance ID, which must be known to stop it. The
+  // nanoapp gets an event when one stops.
   uint32_t AddClientNanoapp(EventHandler handler);
   void StopClientNanoapp(uint32_t instance_id);
   void SendFromClientNanoapp(uint32_t instance_id, uint16_t type);
 
-  // True when the nanoapp has a source's audio.
+  // True while a source is enabled.
   bool audio_enabled() const;
-  // Lets the time of `count` samples pass, then delivers them if the nanoapp has a source's audio.
+  // Advances the time by `count` samples, then delivers them for each enabled source.
   void PlayAudio(const int16_t* samples, uint32_t count);
-  // Tells the nanoapp that its source was suspended or resumed.
+  // Sends the nanoapp the event that its source was suspended or resumed.
   void SetAudioSuspended(bool suspended);
   void AdvanceTime(uint64_t ns);
-  // True while the nanoapp asks for the higher processor clock.
+  // True while the nanoapp requests the higher processor clock.
   bool clock_raised() const { return clock_raised_; }
 
-  // Hands any event to the nanoapp at once, then runs the queue dry.
+  // Delivers any event to the nanoapp at once, then empties the queue.
   void DeliverToNanoapp(uint32_t sender, uint16_t type, const void* data);
 
   const HubCounts& counts() const { return counts_; }
-  // Every fault of the run so far, one sentence each: misuse of the heap, and after End leaked
+  // Every fault of the run so far, one message each: misuse of the heap, and after End leaked
   // blocks.
   std::vector<std::string> Faults() const;
 
@@ -128,7 +131,7 @@ class Hub final : public Runtime {
     std::function<void()> release;  // runs once, delivered or not
   };
 
-  // Queues the parcel, or releases it at once if it is refused; false then.
+  // Queues the event, or releases it at once if it is refused; false then.
   bool Post(bool refused, QueuedEvent queued);
   void RunQueue();
   bool StartNanoapp(const chreNslNanoappInfo& info, const std::string& name, LoadFailure* failure);
@@ -149,6 +152,8 @@ class Hub final : public Runtime {
   int64_t host_time_offset_ns_;
   uint32_t next_instance_id_ = 0x101;
   bool ended_ = false;
+  bool in_nanoapp_ = false;  // one of its entry points is running
+  bool delivering_ = false;  // a queued event is being delivered
   bool clock_raised_ = false;
   bool real_time_ = false;
   uint64_t wall_start_ns_ = 0;  // wall clock at virtual time 0

@@ -1,5 +1,6 @@
 #include "hub/messages.h"
 
+#include "hub/precondition.h"
 #include "sound_detection.pb.h"
 
 namespace qz::hub {
@@ -47,6 +48,7 @@ std::optional<SoundReport> DecodeSoundReport(const uint8_t* bytes, size_t size) 
 
 std::optional<SoundReport> DecodeFramedSoundReport(const void* data, size_t size) {
   constexpr size_t kPrefixBytes = 4;
+  QZ_HUB_REQUIRE(data != nullptr || size == 0);
   const auto* bytes = static_cast<const uint8_t*>(data);
   if (size < kPrefixBytes) return std::nullopt;
   const size_t length = bytes[0] | bytes[1] << 8 | bytes[2] << 16 | size_t{bytes[3]} << 24;

@@ -47,10 +47,10 @@ std::vector<uint8_t> EncodeEnableRequest(uint32_t client_id,
                                          const std::vector<uint32_t>& categories = {});
 std::vector<uint8_t> EncodeDisableRequest(uint32_t client_id);
 
-// Each is empty when the bytes are not such a message.
+// Empty when the bytes are not such a message.
 std::optional<std::vector<uint32_t>> DecodeQueryResponse(const uint8_t* bytes, size_t size);
 std::optional<SoundReport> DecodeSoundReport(const uint8_t* bytes, size_t size);
-// A report behind its 4-byte little-endian length; `size` bytes can be read at `data`.
+// A report preceded by its 4-byte little-endian length; `size` bytes can be read at `data`.
 std::optional<SoundReport> DecodeFramedSoundReport(const void* data, size_t size);
 
 }  // namespace qz::hub

@@ -44,7 +44,7 @@ std::string CheckNanoappInfo(const chreNslNanoappInfo& info) {
 }
 
 std::unique_ptr<NanoappModule> NanoappModule::Load(const std::string& path, LoadFailure* failure) {
-  // With a slash, so that the loader takes the path as it stands and searches nowhere else.
+  // With a slash, so that the loader takes the path as it is and does not search for the file.
   const std::string file = path.find('/') == std::string::npos ? "./" + path : path;
   void* handle = dlopen(file.c_str(), RTLD_NOW | RTLD_LOCAL);
   if (handle == nullptr) {
@@ -59,9 +59,9 @@ std::unique_ptr<NanoappModule> NanoappModule::Load(const std::string& path, Load
     dlclose(handle);
     return nullptr;
   }
-  const std::string wrong = CheckNanoappInfo(*info);
-  if (!wrong.empty()) {
-    *failure = {LoadFailure::Kind::kRefused, path + ": refused: " + wrong};
+  const std::string error = CheckNanoappInfo(*info);
+  if (!error.empty()) {
+    *failure = {LoadFailure::Kind::kRefused, path + ": refused: " + error};
     dlclose(handle);
     return nullptr;
   }

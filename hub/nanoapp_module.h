@@ -14,17 +14,17 @@ struct LoadFailure {
     kRefused,      // its record is not one that this hub runs
   };
   Kind kind = Kind::kNotLoadable;
-  std::string message;  // names the file, the value found and what would have been right
+  std::string message;  // names the file, the value found and what was expected
 };
 
-// Empty when the hub runs modules with this record, else a sentence that names the first wrong
+// Empty when the hub runs modules with this record, else a message that names the first invalid
 // field.
 std::string CheckNanoappInfo(const chreNslNanoappInfo& info);
 
 // A module, loaded by the dynamic loader and accepted by its record; unloaded with the object.
 class NanoappModule {
  public:
-  // Null with `*failure` filled when the module can't be loaded or is refused.
+  // Null with `*failure` (not null) filled when the module can't be loaded or is refused.
   static std::unique_ptr<NanoappModule> Load(const std::string& path, LoadFailure* failure);
 
   NanoappModule(const NanoappModule&) = delete;

@@ -1,5 +1,5 @@
-// What stands behind the runtime's C functions on a PC. The functions live in a shared library, as
-// the module's loader expects, and forward to the one installed Runtime.
+// The implementation of the runtime's C functions on a PC. The functions are in a shared library,
+// as the module's loader expects, and forward to the one installed Runtime.
 #pragma once
 
 #include <cstddef>
@@ -28,9 +28,13 @@ class Runtime {
   virtual bool RequestClockRate(uint32_t request) = 0;
 };
 
-// Makes `runtime` the one behind the functions; null when it goes. Without one no nanoapp runs:
-// allocations and sends fail, no callback is called, and the clock stands at 0.
-void InstallRuntime(Runtime* runtime);
+// Makes the functions forward to `runtime`, which must not be null; false, and nothing changes,
+// when one is installed already.
+bool InstallRuntime(Runtime* runtime);
+// Removes the installed one. Without one no nanoapp runs: allocations and sends fail, no callback
+// is called, and the time is 0.
+void RemoveRuntime();
+// The installed one, or null.
 Runtime* InstalledRuntime();
 
 }  // namespace qz::hub

@@ -1,4 +1,4 @@
-// The runtime's functions but for audio: C linkage, looked up by the module at load.
+// The runtime's functions except audio: C linkage, looked up by the module at load.
 
 #include <cstdarg>
 #include <cstdio>
@@ -14,7 +14,12 @@ Runtime* installed = nullptr;
 
 }  // namespace
 
-void InstallRuntime(Runtime* runtime) { installed = runtime; }
+bool InstallRuntime(Runtime* runtime) {
+  if (installed != nullptr) return false;
+  installed = runtime;
+  return true;
+}
+void RemoveRuntime() { installed = nullptr; }
 Runtime* InstalledRuntime() { return installed; }
 
 }  // namespace qz::hub
@@ -23,11 +28,11 @@ using qz::hub::InstalledRuntime;
 
 void chreLog(chreLogLevel level, const char* format, ...) {
   if (InstalledRuntime() == nullptr) return;
-  // Long enough for every line of a nanoapp; a longer one is cut, as on a device.
+  // Long enough for every line of a nanoapp; a longer one is truncated, as on a device.
   char line[512];
   va_list arguments;
   va_start(arguments, format);
-  // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): it was, one line above.
+  // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): initialised one line above.
   std::vsnprintf(line, sizeof(line), format, arguments);
   va_end(arguments);
   InstalledRuntime()->Log(level, line);

@@ -10,7 +10,7 @@ using ::testing::IsEmpty;
 
 using Nanoapp = LinkedNanoapp;
 
-TEST_F(Nanoapp, StartsOnceAndDispatchesWhatItKnows) {
+TEST_F(Nanoapp, StartsOnceAndLogsUnknownEvents) {
   EXPECT_TRUE(nanoappStart());
   hub.DeliverToNanoapp(0, CHRE_EVENT_NANOAPP_STARTED, nullptr);
   EXPECT_THAT(TakeLog(), IsEmpty());
@@ -27,14 +27,18 @@ TEST_F(Nanoapp, StartsOnceAndDispatchesWhatItKnows) {
 
 TEST_F(Nanoapp, TakesTheFirstSuitableSource) {
   auto& sources = hub.sources();
-  sources.resize(5);
+  sources.resize(6);
   sources[0].sample_rate_hz = 15999;
   sources[1].max_buffer_ns = 1'999'999'999;
   sources[2].min_buffer_ns = 2'000'000'001;
-  sources[3].min_buffer_ns = sources[3].max_buffer_ns = 2'000'000'000;
+  sources[3].sample_rate_hz = 48000;
+  sources[4].min_buffer_ns = sources[4].max_buffer_ns = 2'000'000'000;
   RegisterClientNanoapp();
-  EXPECT_EQ(sources[3].buffer_ns, 2'000'000'000u);
-  EXPECT_EQ(sources[3].interval_ns, 2'000'000'000u);
+  EXPECT_EQ(sources[4].buffer_ns, 2'000'000'000u);
+  EXPECT_EQ(sources[4].interval_ns, 2'000'000'000u);
+  const std::vector<std::string> lines = TakeLog();
+  EXPECT_EQ(lines[lines.size() - 2], "I Requested audio from handle 4, status: 1");
+  EXPECT_EQ(lines.back(), "I audio sampling change for handle 4, suspended: 0");
 }
 
 TEST_F(Nanoapp, SourcesComeGoAndRefuse) {
@@ -49,6 +53,15 @@ TEST_F(Nanoapp, SourcesComeGoAndRefuse) {
                                      "E SoundService: already registered", "I Start",
                                      "I Found suitable audio source", "I Enabling audio",
                                      "I Requested audio from handle 0, status: 0"));
+  // While audio is off the last client's leave stops nothing, and the end gives nothing back.
+  Unregister(client);
+  hub.End();
+  EXPECT_THAT(
+      TakeLog(),
+      ElementsAre("I SoundService: unregisterClient 257",
+                  "I is_audio_enabled_ = 0; HostCount = 0; hasInternalClient = 0", "I Stop"));
+  Start();
+  Register(client);
   // The handle that was found stays known when the source is gone: no warning, and a refusal.
   hub.sources().clear();
   Register(client);
@@ -63,7 +76,7 @@ TEST_F(Nanoapp, SourcesComeGoAndRefuse) {
   EXPECT_EQ(TakeLog().back(), "I Requested audio from handle 0, status: 0");
 }
 
-TEST_F(Nanoapp, TheLastClientTakesTheSmoothedScoresAlong) {
+TEST_F(Nanoapp, SmoothedScoresAreClearedWithTheLastClient) {
   for (int visit = 0; visit < 3; ++visit) {
     const uint32_t client = RegisterClientNanoapp();
     const int before = stub_network.runs;
@@ -78,7 +91,9 @@ TEST_F(Nanoapp, TheLastClientTakesTheSmoothedScoresAlong) {
 
 TEST_F(Nanoapp, PublishesToEachClientInOrderOfRegistration) {
   const uint32_t first = RegisterClientNanoapp();
+  TakeLog();
   const uint32_t second = RegisterClientNanoapp();
+  EXPECT_THAT(TakeLog(), ElementsAre("I SoundService: registerClient 258"));
   const uint32_t third = RegisterClientNanoapp();
   Unregister(second);
   hub.fault_plan().refuse_events = true;

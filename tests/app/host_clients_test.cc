@@ -126,7 +126,7 @@ TEST_F(HostClients, TheMapServesEightAndRefusesWhatWouldNotBeUnique) {
   ASSERT_EQ(report->results.size(), 2u);
   EXPECT_EQ(report->results[1].category, 18u);
   EXPECT_EQ(report->results[1].confidence, 0.625f);
-  // A client nanoapp hears of no detection.
+  // A client nanoapp receives no detection.
   for (const Received& event : events) EXPECT_EQ(event.type, hub::kReportEvent);
 }
 
@@ -142,6 +142,17 @@ TEST_F(HostClients, RawAudioReachesEveryHost) {
   EXPECT_THAT(TakeMessages(), ElementsAre("4@16", "4@17", "8@16", "8@17"));
   TakeLog();
 
+  // No memory for the segment, then for the first host's copy alone.
+  hub.heap().RefuseNth(1);
+  manager->OnRawAudioTransmissibleSegment(1, 2, &info);
+  hub.heap().RefuseNth(2);
+  manager->OnRawAudioTransmissibleSegment(1, 2, &info);
+  hub.DeliverToNanoapp(0, CHRE_EVENT_NANOAPP_STARTED, nullptr);
+  EXPECT_THAT(TakeMessages(), ElementsAre("8@17"));
+  const std::string raw_failed = "E Failed to send RAW_AUDIO_SEGMENT message to host client.";
+  EXPECT_THAT(TakeLog(), ElementsAre("E OOM at sound_detection_proto_helper.cc:124",
+                                     "E Failed to encode raw audio segment.", raw_failed));
+
   // Every way to send fails, is logged, and changes nothing else.
   hub.fault_plan().refuse_host_messages = true;
   manager->OnRawAudioTransmissibleSegment(1, 2, &info);
@@ -149,7 +160,6 @@ TEST_F(HostClients, RawAudioReachesEveryHost) {
   Enable(0x12, 3);
   Disable(0x12, 3);
   PlayRun(kDetected);
-  const std::string raw_failed = "E Failed to send RAW_AUDIO_SEGMENT message to host client.";
   const std::string failed = "E Failed to send SOUND_EVENT_DETECTION message to host.";
   EXPECT_THAT(TakeLog(),
               ElementsAre(raw_failed, raw_failed, "I Result of sending query response: 0",

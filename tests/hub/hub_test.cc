@@ -31,7 +31,7 @@ TEST(Heap, RemembersMisuseAndRefusesExactlyTheOrderedAllocation) {
 constexpr chreNslNanoappInfo kGoodRecord =
     test::NanoappRecord([] { return true; }, [](uint32_t, uint16_t, const void*) {}, [] {});
 
-TEST(NanoappInfo, EveryWrongFieldIsNamed) {
+TEST(NanoappInfo, EveryInvalidFieldIsNamed) {
   const std::pair<void (*)(chreNslNanoappInfo & info), const char*> cases[] = {
       {[](auto& info) { info.magic = 1; }, "magic is 0x00000001, should be 0x50e69977"},
       {[](auto& info) { info.targetApiVersion = 0x01100000; }, "API version is 0x01100000"},
@@ -58,7 +58,7 @@ TEST(NanoappInfo, EveryWrongFieldIsNamed) {
 }
 
 // A nanoapp that leaks a block at its end and answers every event, and the end, with two events and
-// two messages, one each to nobody.
+// two messages, one each to an unknown receiver.
 int freed = 0;
 void SendThings(uint32_t sender, uint16_t, const void*) {
   for (const uint32_t target : {sender, uint32_t{0xBAD}}) {
@@ -99,6 +99,45 @@ TEST(Hub, DeliversInOrderFreesEverythingOnceAndFindsTheLeak) {
     hub.End();
     EXPECT_THAT(hub.Faults(), ElementsAre(HasSubstr("1 heap blocks still held")));
   }
+}
+
+TEST(Hub, IsTheOnlyOneOfItsProcess) {
+  std::string line;
+  {
+    Hub first;
+    first.SetLogHandler([&](chreLogLevel, uint64_t, const std::string& text) { line = text; });
+    EXPECT_THROW(Hub second, std::logic_error);
+    chreLog(CHRE_LOG_INFO, "%s", "to the first");
+  }
+  EXPECT_EQ(line, "to the first");
+  Hub third;
+}
+
+// A caller that breaks a precondition ends the program in every build.
+TEST(HubDeathTest, PreconditionsAreChecked) {
+  Hub hub;
+  hub.sources().emplace_back();
+  EXPECT_DEATH(hub.StartLinked(kGoodRecord, nullptr), "precondition violated: failure != nullptr");
+  LoadFailure failure;
+  chreNslNanoappInfo info = kGoodRecord;
+  info.handleEvent = [](uint32_t, uint16_t, const void*) { chreLog(CHRE_LOG_INFO, "!"); };
+  ASSERT_TRUE(hub.StartLinked(info, &failure));
+  EXPECT_DEATH(hub.PlayAudio(nullptr, 1), "samples != nullptr");
+  EXPECT_DEATH(hub.ConnectHostEndpoint(1, nullptr), "handler != nullptr");
+  EXPECT_DEATH(hub.AddClientNanoapp(nullptr), "handler != nullptr");
+  EXPECT_DEATH(hub.StopClientNanoapp(5), "clients_.count");
+  EXPECT_DEATH(chreAudioGetSource(0, nullptr), "source != nullptr");
+  EXPECT_DEATH(chreSendMessageToHostEndpoint(nullptr, 1, 1, 1, nullptr), "message != nullptr");
+  EXPECT_DEATH(DecodeFramedSoundReport(nullptr, 4), "data != nullptr");
+  // From within the nanoapp, and from a handler, which runs while the module's callbacks are due.
+  hub.SetLogHandler(
+      [&](chreLogLevel, uint64_t, const std::string&) { hub.SendFromHost(1, 1, {}); });
+  EXPECT_DEATH(hub.DeliverToNanoapp(0, 1, nullptr), "!in_nanoapp_");
+  hub.SetLogHandler(nullptr);
+  hub.ConnectHostEndpoint(1, [&](uint32_t, const uint8_t*, size_t) { hub.End(); });
+  chreSendMessageToHostEndpoint(nullptr, 0, 1, 1, nullptr);
+  EXPECT_DEATH(hub.DeliverToNanoapp(0, 1, nullptr), "!delivering_");
+  hub.DisconnectHostEndpoint(1);
 }
 
 TEST(Messages, DamagedFramesAreNoReports) {

@@ -1,5 +1,5 @@
-// A hub that a suite looks into: its log, what its clients receive, and the faults that must not be
-// there at the end.
+// A hub with a record of its log and of what its clients receive; faults found at its end fail the
+// test.
 #pragma once
 
 #include <gmock/gmock.h>
@@ -20,7 +20,7 @@ struct Received {
   std::vector<uint8_t> bytes;
 };
 
-// Lines stand in `log` as "E text", "W text" or "I text", without the nanoapp's prefix.
+// Lines are in `log` as "E text", "W text" or "I text", without the nanoapp's prefix.
 class TestHub {
  public:
   explicit TestHub(int64_t host_time_offset_ns = 0) : hub(host_time_offset_ns) {
@@ -53,9 +53,10 @@ class TestHub {
     return list;
   }
 
-  // Host clients.
+  // Host clients. Every message is a heap block of its own size, but the answer to a query.
   void Connect(uint16_t endpoint) {
     hub.ConnectHostEndpoint(endpoint, [=](uint32_t type, const uint8_t* bytes, size_t size) {
+      EXPECT_EQ(hub.heap().SizeOf(bytes), type == hub::kQueryResponse ? 1024 : size) << type;
       messages.push_back({endpoint, type, {bytes, bytes + size}});
     });
   }
@@ -82,8 +83,8 @@ class TestHub {
   void Register(uint32_t client) { hub.SendFromClientNanoapp(client, hub::kRegisterEvent); }
   void Unregister(uint32_t client) { hub.SendFromClientNanoapp(client, hub::kUnregisterEvent); }
 
-  // What host endpoints and client nanoapps received, in order; before the hub, which sends to its
-  // end.
+  // What host endpoints and client nanoapps received, in order. Declared before the hub, which may
+  // deliver until it is destroyed.
   std::vector<Received> messages;
   std::vector<Received> events;
   std::vector<std::string> log;
