@@ -11,7 +11,7 @@
 #include "frontend/real_fft.h"
 #include "kernels/x86_64/processor.h"
 #include "network/mobilenet_backend.h"
-#include "network/operators.h"
+#include "network/network.h"
 #include "tests/support/random.h"
 
 namespace {
@@ -66,8 +66,11 @@ void PrintBaselineLines() {
 
 // PART|operator|quiet microseconds
 void PrintParts() {
-  for (size_t i = 0; i < qz::kOperatorCount; ++i) {
-    std::printf("PART|%s|%zu|%.4f\n", Name(), i, qz::bench::Measure(qz::kOperators[i].run).quiet);
+  using qz::network::arena;
+  using qz::network::module_weights;
+  for (size_t i = 0; i < qz::config::kOperatorCount; ++i) {
+    const auto run = [&] { qz::network::RunOperator(i, arena, module_weights); };
+    std::printf("PART|%s|%zu|%.4f\n", Name(), i, qz::bench::Measure(run).quiet);
   }
 }
 

@@ -1,7 +1,8 @@
 // What follows from the description of the detector, and what must hold of any.
 #pragma once
 
-#include "detector_description.h"
+// In angle brackets: the build's choice, not this folder's file.
+#include <detector_description.h>
 
 namespace qz::config {
 

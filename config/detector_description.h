@@ -1,10 +1,12 @@
-// The one description of this detector: timing, classes and versions. All else follows from it
-// (config/detector.h). A build of another detector puts another file of this name in its place
-// (QZ_DESCRIPTION_DIR).
+// The one description of this detector: timing, classes, versions and the network's operators. All
+// else follows from it (config/detector.h, config/network.h). A build of another detector puts
+// another file of this name in its place (QZ_DESCRIPTION_DIR).
 #pragma once
 
 #include <cstddef>
 #include <cstdint>
+
+#include "config/operator_description.h"
 
 namespace qz::config {
 
@@ -31,6 +33,35 @@ constexpr size_t kShortSmoothedOutput = 1;
 constexpr size_t kShortSmoothingRuns = 5;
 constexpr size_t kLongSmoothedOutput = 3;
 constexpr size_t kLongSmoothingRuns = 16;
+
+// The network, a row an operator, in the order in which they run. Channels of the last ones are the
+// outputs.
+constexpr OperatorDescription kNetwork[] = {
+    // kind, taps, stride, channels, table, zero point, scale, multiplier, shift, placement
+    {OperatorKind::kDepthwise, 3, 1, 48, "w0", 15, 0.0076417988, 0, 0, Placement::kStart},
+    {OperatorKind::kPointwise, 1, 1, 60, "w1", -128, 0, 0, 0, Placement::kBehindInput},
+    {OperatorKind::kMaxPool, 2, 2, 60, "", -128, 0, 0, 0, Placement::kStart},
+    {OperatorKind::kDepthwise, 3, 1, 60, "w3", 36, 0.0058224415, 0, 0, Placement::kBehindInput},
+    {OperatorKind::kPointwise, 1, 1, 60, "w4", -128, 0, 0, 0, Placement::kBehindInput},
+    {OperatorKind::kMaxPool, 2, 2, 60, "", -128, 0, 0, 0, Placement::kStart},
+    {OperatorKind::kConvolution, 3, 1, 60, "w6", -128, 0, 0, 0, Placement::kBehindInput},
+    {OperatorKind::kMaxPool, 2, 2, 60, "", -128, 0, 0, 0, Placement::kBehindInput},
+    {OperatorKind::kConvolution, 3, 1, 60, "w8", -128, 0, 0, 0, Placement::kBehindInput},
+    {OperatorKind::kMaxPool, 2, 2, 60, "", -128, 0, 0, 0, Placement::kBehindInput},
+    {OperatorKind::kConvolution, 3, 1, 60, "w10", -128, 0, 0, 0, Placement::kBehindInput},
+    {OperatorKind::kMaxPool, 2, 2, 60, "", -128, 0, 0, 0, Placement::kBehindInput},
+    {OperatorKind::kConvolution, 3, 1, 60, "w12", -128, 0, 0, 0, Placement::kBehindInput},
+    {OperatorKind::kConvolution, 3, 1, 60, "w13", -128, 0, 0, 0, Placement::kBehindInput},
+    {OperatorKind::kMaxPool, 2, 2, 60, "", -128, 0, 0, 0, Placement::kBehindInput},
+    {OperatorKind::kConvolution, 3, 1, 60, "w15", -128, 0, 0, 0, Placement::kStart},
+    {OperatorKind::kFlatten, 1, 1, 60, "", -128, 0, 0, 0, Placement::kInPlace},
+    {OperatorKind::kFullyConnected, 1, 1, 64, "w17", -128, 0, 1427340160, 5,
+     Placement::kBehindInput},
+    {OperatorKind::kFullyConnected, 1, 1, kClasses, "w18", 82, 0, 1234879616, 8,
+     Placement::kBehindScores},
+    {OperatorKind::kLogistic, 1, 1, kClasses, "", -128, 0.256, 0, 0, Placement::kInPlace},
+    {OperatorKind::kDequantise, 1, 1, kClasses, "", 0, 1.0 / 256, 0, 0, Placement::kAtWindow},
+};
 
 // Version codes of what the detector sends.
 constexpr uint32_t kReportVersion = 202208270;     // the report to client nanoapps

@@ -22,7 +22,7 @@ std::string ArrayName(const TableLayout& table, const char* array) {
 std::vector<size_t> WeightShape(const TableLayout& table) {
   std::vector<size_t> shape;
   if (table.taps > 1) shape.push_back(static_cast<size_t>(table.taps));
-  if (table.kind != TableKind::kDepthwise) shape.push_back(static_cast<size_t>(table.inputs));
+  if (!table.IsDepthwise()) shape.push_back(static_cast<size_t>(table.inputs));
   shape.push_back(static_cast<size_t>(table.outputs));
   return shape;
 }

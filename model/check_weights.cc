@@ -23,7 +23,7 @@ class TableChecker {
   }
 
  private:
-  bool depthwise() const { return table_.kind == TableKind::kDepthwise; }
+  bool depthwise() const { return table_.IsDepthwise(); }
 
   std::string ColumnName(int column) const {
     return (depthwise() ? "channel " : "column ") + std::to_string(column);

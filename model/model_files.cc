@@ -86,7 +86,10 @@ std::string TablesHeader(const PackedModel& model) {
     }
     text += "\n};\n";
   }
-  return text;
+  text +=
+      "\n// In the order of the file.\nconstexpr const unsigned char* embedded_tables[] = {\n    ";
+  for (const TableLayout& table : kTables) text += std::string(table.name) + ", ";
+  return text + "\n};\n";
 }
 
 }  // namespace qz::model

@@ -28,7 +28,7 @@ void CheckWritable(const std::string& path);
 void WriteWholeFile(const std::string& path, const std::string& bytes);
 
 // A header that defines every table under its name, 16-byte aligned, at global scope with internal
-// linkage. The model has passed the checker.
+// linkage, and a list of them, embedded_tables. The model has passed the checker.
 std::string TablesHeader(const PackedModel& model);
 
 }  // namespace qz::model

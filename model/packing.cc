@@ -28,7 +28,7 @@ size_t WeightIndex(const TableLayout& table, int tap, int input, int output) {
 std::string WeightLocation(const TableLayout& table, int tap, int input, int output) {
   std::string index;
   if (table.taps > 1) index += std::to_string(tap) + ",";
-  if (table.kind != TableKind::kDepthwise) index += std::to_string(input) + ",";
+  if (!table.IsDepthwise()) index += std::to_string(input) + ",";
   return Location(table, "weight", index + std::to_string(output));
 }
 
@@ -88,10 +88,10 @@ class TablePacker {
     const int32_t bias = arrays_.bias[static_cast<size_t>(output)];
     const std::string what =
         Location(table_, "bias", std::to_string(output)) + " is " + std::to_string(bias);
-    if (table_.kind == TableKind::kDepthwise && bias != 0) {
+    if (table_.IsDepthwise() && bias != 0) {
       Report(what, "operator " + std::to_string(table_.op) + " has no biases: 0 would be right");
     }
-    const int64_t offset = int64_t{InputZeroPoint(table_)} * sum;
+    const int64_t offset = int64_t{table_.input_zero_point} * sum;
     const int64_t folded = bias - offset;
     if (!FitsInt32(folded)) {
       Report(what + ", with the input's zero point folded in " + std::to_string(folded),
@@ -133,7 +133,7 @@ LayerArrays UnpackTable(const PackedModel& model, const TableLayout& table,
       }
     }
     const int64_t bias =
-        Load<int32_t>(model, table.BiasOffset(output)) + int64_t{InputZeroPoint(table)} * sum;
+        Load<int32_t>(model, table.BiasOffset(output)) + int64_t{table.input_zero_point} * sum;
     if (!FitsInt32(bias)) {
       findings.push_back(Location(table, "bias", std::to_string(output)) + " would be " +
                          std::to_string(bias) +

@@ -28,11 +28,6 @@ constexpr size_t WeightCount(const TableLayout& table) {
          static_cast<size_t>(table.outputs);
 }
 
-// The zero point of what a table's operator reads.
-constexpr int InputZeroPoint(const TableLayout& table) {
-  return table.op == 1 ? 15 : table.op == 4 ? 36 : -128;
-}
-
 // Arrays that make no sound model. Every finding is one sentence that names the array, the index,
 // the value and what would be right, in the order of the tables; there is at least one.
 class PackingError : public std::runtime_error {

@@ -4,6 +4,7 @@
 #include <cmath>
 #include <limits>
 #include <stdexcept>
+#include <string>
 
 namespace qz::model {
 namespace {
@@ -34,26 +35,16 @@ Tensor MaxPool(const Tensor& in) {
   return out;
 }
 
-// The score's byte for a logit of scale 0.256 and zero point 82: round(256 x logistic) - 128.
-int8_t Logistic(int8_t logit) {
-  return Clamp(std::llround(256.0 / (1.0 + std::exp(-0.256 * (logit - 82)))) - 128);
+// The score's byte for a logit: round(256 x logistic) - 128.
+int8_t Logistic(int8_t logit, double scale, int zero_point) {
+  return Clamp(std::llround(256.0 / (1.0 + std::exp(-scale * (logit - zero_point)))) - 128);
 }
 
 }  // namespace
 
 Requantisation RequantisationOf(int op) {
-  switch (op) {
-    case 0:
-      return {15, 0, 0};
-    case 3:
-      return {36, 0, 0};
-    case 17:
-      return {-128, 1427340160, 5};
-    case 18:
-      return {82, 1234879616, 8};
-    default:
-      return {-128, 0, 0};
-  }
+  const config::Operator& each = config::kOperators[static_cast<size_t>(op)];
+  return {each.zero_point, each.multiplier, each.shift};
 }
 
 int8_t RequantiseFloat(int32_t acc, float scale, int zero_point) {
@@ -70,7 +61,7 @@ int8_t RequantiseFixed(int32_t acc, const Requantisation& requantisation) {
 
 std::vector<int32_t> Accumulate(const PackedModel& model, const TableLayout& table,
                                 const Tensor& in) {
-  const bool depthwise = table.kind == TableKind::kDepthwise;
+  const bool depthwise = table.IsDepthwise();
   const int columns = table.BlockColumns();
   const int rows = in.rows - table.taps + 1;
   std::vector<int32_t> out(static_cast<size_t>(rows * table.outputs));
@@ -100,10 +91,11 @@ std::vector<int32_t> Accumulate(const PackedModel& model, const TableLayout& tab
 }
 
 Tensor RunOperator(const PackedModel& model, int op, const Tensor& in) {
-  if (op == 16) return in;
-  if (op == 19) {
+  const config::Operator& each = config::kOperators[static_cast<size_t>(op)];
+  if (each.kind == OperatorKind::kFlatten) return in;
+  if (each.kind == OperatorKind::kLogistic) {
     Tensor out = in;
-    std::transform(in.values.begin(), in.values.end(), out.values.begin(), Logistic);
+    for (int8_t& value : out.values) value = Logistic(value, each.scale, each.input.zero_point);
     return out;
   }
   const TableLayout* table = FindTable(op);
@@ -126,7 +118,9 @@ Tensor RunOperator(const PackedModel& model, int op, const Tensor& in) {
 
 NetworkRun RunNetwork(const PackedModel& model, const Tensor& input) {
   if (model.size() != kModelBytes || input.rows != kInputRows || input.channels != kInputChannels) {
-    throw std::invalid_argument("RunNetwork needs an 86000-byte model and a 382 x 48 window");
+    throw std::invalid_argument("RunNetwork needs a model of " + std::to_string(kModelBytes) +
+                                " bytes and a window of " + std::to_string(kInputRows) + " x " +
+                                std::to_string(kInputChannels));
   }
   NetworkRun run;
   const Tensor* in = &input;
@@ -135,7 +129,7 @@ NetworkRun RunNetwork(const PackedModel& model, const Tensor& input) {
     in = &run.outputs[op];
   }
   for (size_t i = 0; i < run.scores.size(); ++i) {
-    run.scores[i] = static_cast<float>(in->values[i] + 128) * 0.00390625f;
+    run.scores[i] = static_cast<float>(in->values[i] + 128) / 256;
   }
   return run;
 }

@@ -10,10 +10,10 @@
 
 namespace qz::model {
 
-inline constexpr int kInputRows = 382;     // feature frames, 10 ms apart, oldest first
-inline constexpr int kInputChannels = 48;  // features of a frame, lowest frequency first
-inline constexpr int kClasses = 5;
-inline constexpr int kOperators = 21;
+constexpr int kInputRows = static_cast<int>(config::kWindowFrames);  // oldest first
+constexpr int kInputChannels = static_cast<int>(config::kFeatureChannels);
+constexpr int kClasses = static_cast<int>(config::kClasses);
+constexpr int kOperators = static_cast<int>(config::kOperatorCount);
 
 // An int8 tensor, rows (time steps) x channels, row-major.
 struct Tensor {

@@ -33,7 +33,7 @@ class SyntheticModelMaker {
   }
 
   PackedModel Make() {
-    for (int op = 0; op < 19; ++op) {
+    for (int op = 0; op + 2 < kOperators; ++op) {
       const TableLayout* table = FindTable(op);
       if (table != nullptr) MakeTable(*table);
       for (Tensor& tensor : tensors_) tensor = RunOperator(model_, op, tensor);
@@ -44,15 +44,14 @@ class SyntheticModelMaker {
  private:
   void MakeTable(const TableLayout& table) {
     switch (table.kind) {
-      case TableKind::kDepthwise:
+      case OperatorKind::kDepthwise:
         return MakeDepthwise(table);
-      case TableKind::kGemm:
-      case TableKind::kIndirectGemm:
+      case OperatorKind::kFullyConnected:
+        DrawWeights(table);
+        return SetFixedPoint(table);
+      default:
         DrawWeights(table);
         return SetScalesAndBiases(table);
-      case TableKind::kPlainGemm:
-        DrawWeights(table);
-        return SetPlainGemm(table);
     }
   }
 
@@ -162,11 +161,11 @@ class SyntheticModelMaker {
   }
 
   // The factor is fixed: the weights' size makes the deviation, the bias the mean.
-  void SetPlainGemm(const TableLayout& table) {
+  void SetFixedPoint(const TableLayout& table) {
     const Requantisation requantisation = RequantisationOf(table.op);
     const double factor = static_cast<double>(requantisation.multiplier) /
                           static_cast<double>(int64_t{1} << (31 + requantisation.shift));
-    const bool logits = table.op == 18;
+    const bool logits = &table == &kTables.back();
     std::vector<Spread> spreads = Measure(table);
     for (int column = 0; column < table.outputs; ++column) {
       const double deviation = logits ? kLogitDeviation : 80;

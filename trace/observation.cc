@@ -4,7 +4,7 @@
 #include <cstring>
 
 #include "frontend/audio_frontend.h"
-#include "network/operators.h"
+#include "network/network.h"
 #include "trace/recorder.h"
 
 namespace qz::trace {
@@ -12,29 +12,24 @@ namespace {
 
 Recorder* recorder = nullptr;
 
-static_assert(kOperatorCount == kOperatorsPerRun);
-static_assert(kWatchedObjects[0].bytes == kInput.Bytes() &&
-              kWatchedObjects[0].channels == kInput.channels &&
-              kWatchedObjects[1].bytes == kArenaBytes);
-
 std::vector<uint8_t> ScoreBytes() {
   std::vector<uint8_t> bytes;
-  for (size_t i = 0; i < kScores.channels / sizeof(float); ++i) {
+  for (size_t i = 0; i < config::kClasses; ++i) {
     uint32_t bits = 0;
-    std::memcpy(&bits, mobilenet_backend_output_ptr + i, sizeof bits);
+    std::memcpy(&bits, network::ScoresOf(network::arena) + i, sizeof bits);
     AppendLittleEndian(bits, sizeof bits, &bytes);
   }
   return bytes;
 }
 
 void RunOperators() {
-  for (uint32_t op = 0; op < kOperatorCount; ++op) {
-    kOperators[op].run();
-    const Tensor& out = kOperators[op].output;
+  for (uint32_t op = 0; op < kOperatorsPerRun; ++op) {
+    network::RunOperator(op, network::arena, network::module_weights);
+    const config::Tensor& out = config::kOperators[op].output;
     if (op == kScoresOperator) {
-      recorder->OnOutput(op, kScores.channels / sizeof(float), ScoreBytes());
+      recorder->OnOutput(op, config::kClasses, ScoreBytes());
     } else {
-      const int8_t* values = BytesOf(out);
+      const int8_t* values = network::BytesOf(network::arena, out);
       recorder->OnOutput(op, static_cast<uint32_t>(out.channels), {values, values + out.Bytes()});
     }
   }

@@ -12,6 +12,8 @@
 #include <utility>
 #include <vector>
 
+#include "config/network.h"
+
 namespace qz::trace {
 
 enum class Kind : uint8_t {
@@ -37,13 +39,14 @@ struct WatchedObject {
   uint32_t bytes;
   uint32_t channels;  // 0: bytes of several tensors
 };
-constexpr WatchedObject kWatchedObjects[] = {{"inference_input_buffer", 18336, 48},
-                                             {"arena", 41040, 0}};
+constexpr WatchedObject kWatchedObjects[] = {
+    {"inference_input_buffer", config::kWindow.Bytes(), config::kFeatureChannels},
+    {"arena", config::kArenaBytes, 0}};
 constexpr uint32_t kWatchedObjectCount = 2;
 
 // Operators of a network run, in order. The values of the last, the scores, are floats of 4 bytes,
 // those of all others int8.
-constexpr uint32_t kOperatorsPerRun = 21;
+constexpr uint32_t kOperatorsPerRun = config::kOperatorCount;
 constexpr uint32_t kScoresOperator = kOperatorsPerRun - 1;
 
 struct Record {
@@ -54,8 +57,9 @@ struct Record {
   std::vector<uint8_t> bytes;
 };
 
-// No record has more: the largest object has 41,040.
+// No record has more: the largest object is the arena.
 constexpr size_t kMaxRecordBytes = 65536;
+static_assert(config::kArenaBytes <= kMaxRecordBytes);
 
 // Appends the `size` low bytes of `value`, the lowest first.
 void AppendLittleEndian(uint64_t value, size_t size, std::vector<uint8_t>* bytes);

@@ -2,17 +2,20 @@
 
 #include <algorithm>
 #include <cstdio>
+#include <memory>
 
 #include "base/digest.h"
-#include "network/loaded/loaded_network.h"
-#include "network/operators.h"
+#include "network/network.h"
 #include "train/validation.h"
 
 namespace qz::train {
 namespace {
 
-constexpr size_t kLogistic = 19;
-constexpr size_t kConversion = 20;
+using config::kFramesBetweenRuns;
+using config::kOperatorCount;
+using config::OperatorKind;
+
+constexpr int kLogitOperator = kOperatorCount - 3;  // the logistic function's input
 
 // As many windows at a time as are quick and small.
 constexpr int kMaxWindows = 16;
@@ -22,8 +25,8 @@ Batch WindowsOf(const Batch& features, int first, int count) {
   Batch windows;
   windows.Resize(count, FramesFor(1), features.channels());
   for (int w = 0; w < count; ++w) {
-    windows.values.middleRows(w * FramesFor(1), FramesFor(1)) =
-        features.values.middleRows((first + w) * 64, FramesFor(1));
+    windows.values.middleRows(w * FramesFor(1), FramesFor(1)) = features.values.middleRows(
+        (first + w) * static_cast<int>(kFramesBetweenRuns), FramesFor(1));
   }
   return windows;
 }
@@ -31,12 +34,11 @@ Batch WindowsOf(const Batch& features, int first, int count) {
 class Prover {
  public:
   Prover(const QuantisedParameters& parameters, const model::PackedModel& model)
-      : parameters_(parameters) {
-    std::copy(model.begin(), model.end(), loaded_tables);
-  }
+      : parameters_(parameters), weights_(network::WeightsOf(model.data())) {}
 
   void Compare(const Batch& features) {
-    const auto count = static_cast<int>((features.steps() - FramesFor(1)) / 64 + 1);
+    const auto count = static_cast<int>(
+        (features.steps() - FramesFor(1)) / static_cast<int>(kFramesBetweenRuns) + 1);
     for (int first = 0; first < count; first += kMaxWindows) {
       CompareWindows(WindowsOf(features, first, std::min(kMaxWindows, count - first)));
     }
@@ -49,7 +51,7 @@ class Prover {
     network_.Forward(parameters_, windows);
     for (int w = 0; w < windows.sequences; ++w) {
       const auto input = windows.values.middleRows(w * FramesFor(1), FramesFor(1));
-      std::transform(input.data(), input.data() + input.size(), mobilenet_backend_input_ptr,
+      std::transform(input.data(), input.data() + input.size(), network::InputOf(*arena_),
                      [](float feature) { return static_cast<int8_t>(feature - 128); });
       for (size_t op = 0; op < kOperatorCount; ++op) CompareOperator(op, w);
       ++check_.runs;
@@ -57,9 +59,9 @@ class Prover {
   }
 
   void CompareOperator(size_t op, int window) {
-    kOperators[op].run();
-    const Tensor& tensor = kOperators[op].output;
-    const int8_t* const theirs = BytesOf(tensor);
+    network::RunOperator(op, *arena_, weights_);
+    const config::Tensor& tensor = config::kOperators[op].output;
+    const int8_t* const theirs = network::BytesOf(*arena_, tensor);
     const std::vector<int8_t> ours = OursOf(op, window);
     check_.trainer_digest = base::Digest(ours.data(), ours.size(), check_.trainer_digest);
     check_.module_digest = base::Digest(theirs, tensor.Bytes(), check_.module_digest);
@@ -79,9 +81,10 @@ class Prover {
 
   // The tensor of a window as bytes.
   std::vector<int8_t> OursOf(size_t op, int window) const {
-    if (op >= kLogistic) return ScoreBytes(window, op == kConversion);
-    // Operator 16 hands on what 15 wrote.
-    const int written = op == 16 ? 15 : static_cast<int>(op);
+    const OperatorKind kind = config::kOperators[op].kind;
+    if (kind == OperatorKind::kLogistic) return ScoreBytes(window, false);
+    if (kind == OperatorKind::kDequantise) return ScoreBytes(window, true);
+    const int written = static_cast<int>(op - (kind == OperatorKind::kFlatten ? 1 : 0));
     const Batch& out = network_.OutputOf(written);
     const auto rows = out.values.middleRows(window * out.steps(), out.steps());
     const int zero_point = QuantisedNetwork::ZeroPointOf(written);
@@ -95,7 +98,7 @@ class Prover {
   std::vector<int8_t> ScoreBytes(int window, bool as_floats) const {
     std::vector<int8_t> bytes;
     for (int c = 0; c < model::kClasses; ++c) {
-      const float score = DeviceScore(network_.OutputOf(18).values(window, c));
+      const float score = DeviceScore(network_.OutputOf(kLogitOperator).values(window, c));
       if (as_floats) {
         const auto* begin = reinterpret_cast<const int8_t*>(&score);
         bytes.insert(bytes.end(), begin, begin + sizeof(score));
@@ -107,6 +110,8 @@ class Prover {
   }
 
   const QuantisedParameters& parameters_;
+  const network::Weights weights_;
+  const std::unique_ptr<network::Arena> arena_ = std::make_unique<network::Arena>();
   QuantisedNetwork network_;
   EquivalenceCheck check_;
 };

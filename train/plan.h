@@ -33,7 +33,7 @@ struct LayerPlan {
   constexpr const model::TableLayout& layout() const {
     return model::kTables[static_cast<size_t>(table)];
   }
-  constexpr bool depthwise() const { return layout().kind == model::TableKind::kDepthwise; }
+  constexpr bool depthwise() const { return layout().IsDepthwise(); }
   constexpr int taps() const { return layout().taps; }
   constexpr int weight_rows() const { return layout().taps * layout().inputs; }
   constexpr int outputs() const { return layout().outputs; }

@@ -14,7 +14,6 @@ INDIRECT_IN_SOURCES = [
     ("app/audio_binding.cc", "funcPtr(", 2, RUNTIME),
     ("classifier/detection.cc", "listener_->OnSoundDetectionEvent(", 1,
      ["AppManager::OnSoundDetectionEvent"]),
-    ("network/mobilenet_backend.cc", "each.run()", 1, ["table kOperators"]),
     ("chre/singleton.h", "->~T()", 1, ["AppManager::~AppManager"]),
 ]
 

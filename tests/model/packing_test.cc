@@ -10,8 +10,7 @@
 #include "model/check_weights.h"
 #include "model/reference_network.h"
 #include "model/synthetic_model.h"
-#include "network/loaded/loaded_network.h"
-#include "network/operators.h"
+#include "network/network.h"
 #include "tests/support/random.h"
 #include "tests/support/temporary_folder.h"
 
@@ -36,7 +35,7 @@ ModelArrays RandomArrays(uint64_t seed) {
     // The factor of operator 17 is larger than that of 18, and both are fixed.
     const int widest = table.op == 17 ? 3 : table.op == 18 ? 30 : 127;
     all[i].weight = random.Fill<int8_t>(WeightCount(table), -widest, widest);
-    const bool free_bias = table.kind != TableKind::kDepthwise;
+    const bool free_bias = !table.IsDepthwise();
     all[i].bias =
         free_bias ? random.Fill<int32_t>(outputs, -5000, 5000) : std::vector<int32_t>(outputs);
     if (!table.HasScales()) continue;
@@ -53,7 +52,7 @@ ModelArrays RandomArrays(uint64_t seed) {
 // The accumulators of a table's operator, plainly from its arrays.
 std::vector<int32_t> PlainSums(const TableLayout& table, const LayerArrays& arrays,
                                const std::vector<int8_t>& in) {
-  const bool depthwise = table.kind == TableKind::kDepthwise;
+  const bool depthwise = table.IsDepthwise();
   const int channels = depthwise ? table.outputs : table.inputs;
   const int rows = static_cast<int>(in.size()) / channels - table.taps + 1;
   const int zero_point = table.op == 1 ? 15 : table.op == 4 ? 36 : -128;
@@ -74,23 +73,20 @@ std::vector<int32_t> PlainSums(const TableLayout& table, const LayerArrays& arra
   return sums;
 }
 
-std::vector<int8_t> ValuesOf(const qz::Tensor& tensor) {
-  return {BytesOf(tensor), BytesOf(tensor) + tensor.Bytes()};
-}
-
 TEST(Packing, PutsEveryValueWhereTheNetworkLooksForIt) {
   const ModelArrays arrays = RandomArrays(1);
   const PackedModel packed = Pack(arrays);
   EXPECT_THAT(CheckWeights(packed), ElementsAre());
-  std::copy(packed.begin(), packed.end(), loaded_tables);
+  static network::Arena arena;
   test::Random random(2);
   for (size_t i = 0; i < kTableCount; ++i) {
     const TableLayout& table = kTables[i];
-    const qz::Tensor& from = table.op == 0 ? kInput : qz::kOperators[table.op - 1].output;
-    const std::vector<int8_t> in = random.Fill<int8_t>(from.Bytes(), -128, 127);
-    std::copy(in.begin(), in.end(), BytesOf(from));
-    qz::kOperators[table.op].run();
-    const std::vector<int8_t> out = ValuesOf(qz::kOperators[table.op].output);
+    const config::Operator& op = config::kOperators[static_cast<size_t>(table.op)];
+    const std::vector<int8_t> in = random.Fill<int8_t>(op.input.Bytes(), -128, 127);
+    std::copy(in.begin(), in.end(), network::BytesOf(arena, op.input));
+    network::RunOperator(static_cast<size_t>(table.op), arena, network::WeightsOf(packed.data()));
+    const int8_t* const written = network::BytesOf(arena, op.output);
+    const std::vector<int8_t> out(written, written + op.output.Bytes());
     std::vector<int8_t> expected;
     for (const int32_t sum : PlainSums(table, arrays[i], in)) {
       const size_t output = expected.size() % static_cast<size_t>(table.outputs);

@@ -1,5 +1,7 @@
 // The network against its plain evaluation from the packed model, operator by operator.
 
+#include "network/mobilenet_backend.h"
+
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -12,13 +14,18 @@
 #include "model/model_files.h"
 #include "model/reference_network.h"
 #include "model/synthetic_features.h"
-#include "network/operators.h"
+#include "network/network.h"
 #include "tests/support/random.h"
 
 namespace qz::test {
 namespace {
 
-int8_t* Arena() { return mobilenet_backend_input_ptr - kInput.offset; }
+using config::kArenaBytes;
+using config::kOperators;
+using config::kWindow;
+
+// The module's own.
+int8_t* Arena() { return network::arena.bytes; }
 
 // All of the arena is compared, so that a byte written beside its tensor shows as well.
 size_t FirstUnexpectedByte(const std::vector<int8_t>& expected) {
@@ -32,20 +39,20 @@ TEST(Network, EqualsThePlainEvaluationWhateverTheArenaHeld) {
   std::set<std::array<float, 5>> different;
   for (uint64_t i = 0; i < 40; ++i) {
     model::Tensor input = model::SyntheticWindow(i);
-    if (i % 8 == 0) input.values = random.Fill<int8_t>(kInput.Bytes(), -128, 127);
+    if (i % 8 == 0) input.values = random.Fill<int8_t>(kWindow.Bytes(), -128, 127);
     std::vector<int8_t> expected = random.Fill<int8_t>(kArenaBytes, -128, 127);
-    std::copy(input.values.begin(), input.values.end(), &expected[kInput.offset]);
+    std::copy(input.values.begin(), input.values.end(), &expected[kWindow.offset]);
     const std::vector<int8_t> before = expected;
     std::copy(before.begin(), before.end(), Arena());
     const model::NetworkRun run = model::RunNetwork(packed, input);
-    for (size_t op = 0; op < kOperatorCount; ++op) {
-      const Tensor& output = kOperators[op].output;
+    for (size_t op = 0; op < kOperators.size(); ++op) {
+      const config::Tensor& output = kOperators[op].output;
       const bool scores = op == run.outputs.size();
       ASSERT_EQ(output.Bytes(), scores ? sizeof run.scores : run.outputs[op].values.size());
       const void* values =
           scores ? static_cast<const void*>(run.scores.data()) : run.outputs[op].values.data();
       std::memcpy(&expected[output.offset], values, output.Bytes());
-      kOperators[op].run();
+      network::RunOperator(op, network::arena, network::module_weights);
       ASSERT_EQ(FirstUnexpectedByte(expected), kArenaBytes)
           << "of window " << i << ", operator " << op;
     }
@@ -59,8 +66,7 @@ TEST(Network, EqualsThePlainEvaluationWhateverTheArenaHeld) {
 
 TEST(Network, KeepsItsPlaces) {
   EXPECT_EQ(static_cast<const void*>(mobilenet_backend_output_ptr), mobilenet_backend_input_ptr);
-  // Row 3 of a tile with two real rows meets the same row as the last of these, at every tap.
-  EXPECT_EQ(TileList<2>(Arena(), kOut12)[12 + 2 * 4 + 3], Arena() + kOut12.offset + 7 * 60);
+  EXPECT_EQ(mobilenet_backend_input_ptr, Arena() + kWindow.offset);
 }
 
 TEST(Network, LogisticTableIsTheRoundedFunction) {

@@ -2,27 +2,44 @@
 
 #include <algorithm>
 #include <cstdio>
+#include <memory>
 
 #include "dataset/clip_features.h"
-#include "network/loaded/loaded_network.h"
-#include "network/operators.h"
+#include "network/network.h"
 
 namespace qz::tools {
 namespace {
 
-using model::TableKind;
+using config::kFramesBetweenRuns;
+using config::kOperators;
+using config::kWindow;
+using config::Tensor;
+using model::OperatorKind;
 using model::TableLayout;
 
-constexpr size_t kFramesBetweenRuns = 64;
+std::string OperatorName(const config::Operator& op) {
+  switch (op.kind) {
+    case OperatorKind::kDepthwise:
+      return "depthwise";
+    case OperatorKind::kPointwise:
+      return "pointwise";
+    case OperatorKind::kConvolution:
+      return std::to_string(op.taps) + "-tap";
+    case OperatorKind::kMaxPool:
+      return "max pool";
+    case OperatorKind::kFlatten:
+      return "as vector";
+    case OperatorKind::kFullyConnected:
+      return "connected";
+    case OperatorKind::kLogistic:
+      return "logistic";
+    case OperatorKind::kDequantise:
+      return "dequantise";
+  }
+  return "";
+}
 
-constexpr const char* kOperatorNames[model::kOperators - 1] = {
-    "depthwise", "pointwise", "max pool",  "depthwise", "pointwise", "max pool", "3-tap",
-    "max pool",  "3-tap",     "max pool",  "3-tap",     "max pool",  "3-tap",    "3-tap",
-    "max pool",  "3-tap",     "as vector", "connected", "connected", "logistic"};
-static_assert(kOperatorCount == model::kOperators);
-
-void Add(const Tensor& tensor, TensorSummary* summary) {
-  const int8_t* values = BytesOf(tensor);
+void Add(const int8_t* values, const Tensor& tensor, TensorSummary* summary) {
   summary->values += tensor.Bytes();
   for (size_t i = 0; i < tensor.Bytes(); ++i) {
     const int value = values[i];
@@ -47,7 +64,7 @@ std::string Line(const char* format, Values... values) {
 
 std::string WeightShape(const TableLayout& table) {
   std::string shape = std::to_string(table.outputs);
-  if (table.kind != TableKind::kDepthwise) shape = std::to_string(table.inputs) + " x " + shape;
+  if (!table.IsDepthwise()) shape = std::to_string(table.inputs) + " x " + shape;
   return (table.taps > 1 ? std::to_string(table.taps) + " x " : "") + shape;
 }
 
@@ -69,7 +86,8 @@ std::string TableLine(const TableLayout& table, const model::LayerArrays& arrays
       std::count_if(arrays.weight.begin(), arrays.weight.end(),
                     [](int8_t weight) { return weight == 127 || weight == -127; });
   return Line("%-5s  %2d %-9s  %-11s  %6zu  %-12s  %5.1f %%  %-18s  %s\n",
-              std::string(table.name).c_str(), table.op, kOperatorNames[table.op],
+              std::string(table.name).c_str(), table.op,
+              OperatorName(kOperators[static_cast<size_t>(table.op)]).c_str(),
               WeightShape(table).c_str(), table.Bytes(), Range(arrays.weight).c_str(),
               Percent(static_cast<uint64_t>(at_the_end), arrays.weight.size()),
               Range(arrays.bias).c_str(), ScaleRange(arrays.scale).c_str());
@@ -87,21 +105,24 @@ std::string TensorLine(const std::string& name, const Tensor& shape, int zero_po
 }  // namespace
 
 TensorSummaries TensorsOf(const model::PackedModel& packed, const std::vector<uint16_t>& features) {
-  std::copy(packed.begin(), packed.end(), loaded_tables);
+  const auto arena = std::make_unique<network::Arena>();
+  const network::Weights weights = network::WeightsOf(packed.data());
   TensorSummaries tensors;
-  tensors.frames = features.size() / kInput.channels;
-  for (size_t first = 0; first + kInput.rows <= tensors.frames; first += kFramesBetweenRuns) {
-    const uint16_t* window = features.data() + first * kInput.channels;
-    std::transform(window, window + kInput.Bytes(), mobilenet_backend_input_ptr,
+  tensors.frames = features.size() / kWindow.channels;
+  for (size_t first = 0; first + kWindow.rows <= tensors.frames; first += kFramesBetweenRuns) {
+    const uint16_t* window = features.data() + first * kWindow.channels;
+    std::transform(window, window + kWindow.Bytes(), network::InputOf(*arena),
                    dataset::NetworkInput);
-    Add(kInput, &tensors.input);
-    for (size_t op = 0; op < kOperatorCount; ++op) {
-      kOperators[op].run();
-      if (op < tensors.outputs.size()) Add(kOperators[op].output, &tensors.outputs[op]);
+    Add(network::InputOf(*arena), kWindow, &tensors.input);
+    for (size_t op = 0; op < kOperators.size(); ++op) {
+      network::RunOperator(op, *arena, weights);
+      if (op >= tensors.outputs.size()) continue;
+      const Tensor& output = kOperators[op].output;
+      Add(network::BytesOf(*arena, output), output, &tensors.outputs[op]);
     }
     for (size_t i = 0; i < tensors.max_scores.size(); ++i) {
       float& max = tensors.max_scores[i];
-      max = std::max(max, mobilenet_backend_output_ptr[i]);
+      max = std::max(max, network::ScoresOf(*arena)[i]);
     }
     ++tensors.runs;
   }
@@ -123,11 +144,11 @@ std::string TensorsText(const TensorSummaries& tensors) {
                           tensors.frames, tensors.runs);
   text += Line("%-12s  %-8s  %6s  %7s  %10s  %8s  %8s  %s\n", "tensor", "values", "lowest",
                "highest", "zero point", "at -128", "at 127", "digest");
-  text += TensorLine("   input", kInput, -128, tensors.input);
+  text += TensorLine("   input", kWindow, -128, tensors.input);
   for (size_t op = 0; op < tensors.outputs.size(); ++op) {
-    const int number = static_cast<int>(op);
-    text += TensorLine(Line("%2d %s", number, kOperatorNames[op]), kOperators[op].output,
-                       model::RequantisationOf(number).zero_point, tensors.outputs[op]);
+    const config::Operator& each = kOperators[op];
+    text += TensorLine(Line("%2zu %s", op, OperatorName(each).c_str()), each.output,
+                       each.zero_point, tensors.outputs[op]);
   }
   text += "highest scores:";
   for (const float score : tensors.max_scores) {

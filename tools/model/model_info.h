@@ -31,8 +31,8 @@ struct TensorSummaries {
   std::array<float, model::kClasses> max_scores{};
 };
 
-// Runs the module's own network over features, frames x 48: over the first 382 and then every 64
-// further. The model has passed the checker.
+// Runs the network over features, frames x channels: over the first window and then at the
+// detector's cadence. The model has passed the checker.
 TensorSummaries TensorsOf(const model::PackedModel& packed, const std::vector<uint16_t>& features);
 
 // A line for each table.

@@ -3,9 +3,6 @@
 #include <algorithm>
 #include <numeric>
 
-#include "network/loaded/loaded_network.h"
-#include "network/mobilenet_backend.h"
-
 namespace qz::tools {
 namespace {
 
@@ -26,10 +23,8 @@ float Smooth(std::deque<float>* newest, size_t capacity, float score) {
 
 }  // namespace
 
-ScoreStream::ScoreStream(const model::PackedModel& model) {
-  static_assert(kLoadedTableBytes == model::kModelBytes);
-  std::copy_n(model.begin(), kLoadedTableBytes, loaded_tables);
-}
+ScoreStream::ScoreStream(const model::PackedModel& model)
+    : model_(model), arena_(std::make_unique<network::Arena>()) {}
 
 PassScores ScoreStream::Follow(const int16_t* samples, size_t count) {
   PassScores pass;
@@ -41,8 +36,8 @@ void ScoreStream::TakeFrame(const uint16_t* features, PassScores* pass) {
   std::transform(features, features + kChannels, window_.begin() + frames_ * kChannels,
                  dataset::NetworkInput);
   if (++frames_ < model::kInputRows) return;
-  std::copy(window_.begin(), window_.end(), mobilenet_backend_input_ptr);
-  mobilenet_backend_invoke();
+  std::copy(window_.begin(), window_.end(), network::InputOf(*arena_));
+  network::Run(*arena_, network::WeightsOf(model_.data()));
   FoldRun(pass);
   std::copy(window_.begin() + kFramesBetweenRuns * kChannels, window_.end(), window_.begin());
   frames_ -= kFramesBetweenRuns;
@@ -52,7 +47,7 @@ void ScoreStream::TakeFrame(const uint16_t* features, PassScores* pass) {
 void ScoreStream::FoldRun(PassScores* pass) {
   ++pass->runs;
   for (int i = 0; i < model::kClasses; ++i) {
-    const float score = mobilenet_backend_output_ptr[i];
+    const float score = network::ScoresOf(*arena_)[i];
     float value = score;
     if (i == kShortSmoothed) value = Smooth(&short_scores_, kShortRuns, score);
     if (i == kLongSmoothed) value = Smooth(&long_scores_, kLongRuns, score);

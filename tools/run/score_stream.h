@@ -6,9 +6,11 @@
 #include <cstddef>
 #include <cstdint>
 #include <deque>
+#include <memory>
 
 #include "dataset/clip_features.h"
 #include "model/reference_network.h"
+#include "network/network.h"
 
 namespace qz::tools {
 
@@ -24,7 +26,7 @@ struct PassScores {
   Scores confidences{};
 };
 
-// There is one network and one front end in the program, so one follower at a time.
+// There is one front end in the program, so one stream at a time.
 class ScoreStream {
  public:
   // Begins with a fresh start. The model has passed the checker.
@@ -37,6 +39,8 @@ class ScoreStream {
   void TakeFrame(const uint16_t* features, PassScores* pass);
   void FoldRun(PassScores* pass);
 
+  model::PackedModel model_;
+  std::unique_ptr<network::Arena> arena_;
   dataset::FeatureStream stream_;
   // The newest `frames_` frames, oldest first.
   std::array<int8_t, size_t{model::kInputRows} * model::kInputChannels> window_{};
