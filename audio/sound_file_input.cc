@@ -27,13 +27,13 @@ std::string OneLine(std::string text) {
 
 SoundFileInput::SoundFileInput(std::string name, base::FileDescriptor file)
     : name_(std::move(name)), file_(std::move(file)) {
+  truncation_ = FindTruncation(file_.get());
   sound_file_.reset(sf_open_fd(file_.get(), SFM_READ, &info_, SF_FALSE));
   if (sound_file_ == nullptr) {
+    if (!truncation_.empty()) throw AudioError(name_ + ": no audio: " + truncation_);
     throw AudioError(name_ + ": not a readable sound file: " + OneLine(sf_strerror(nullptr)));
   }
   CheckHeader();
-  const std::string truncation = FindTruncation(file_.get());
-  if (!truncation.empty()) throw AudioError(name_ + ": " + truncation);
   converter_ = std::make_unique<SampleConverter>(info_.samplerate, info_.channels);
   block_.resize(kBlockFrames * static_cast<size_t>(info_.channels));
 }
@@ -48,7 +48,9 @@ void SoundFileInput::CheckHeader() const {
     throw AudioError(name_ + ": " + std::to_string(info_.channels) + " channels, should be 1 to " +
                      std::to_string(kMaxChannels));
   }
-  if (info_.frames == 0) throw AudioError(name_ + ": no audio: 0 frames");
+  if (info_.frames == 0) {
+    throw AudioError(name_ + ": no audio: " + (truncation_.empty() ? "0 frames" : truncation_));
+  }
 }
 
 std::string SoundFileInput::Description() const {
@@ -140,6 +142,7 @@ void SoundFileInput::CheckEnd() const {
     throw AudioError(location + "truncated or corrupt: the audio ends here, the header promises " +
                      std::to_string(info_.frames) + " frames");
   }
+  if (!truncation_.empty()) throw AudioError(location + truncation_);
 }
 
 }  // namespace qz::audio

@@ -12,10 +12,11 @@
 
 namespace qz::audio {
 
-// A sound file in any container that libsndfile knows, told by its contents.
+// A sound file in any container that libsndfile knows, recognised by its contents. One that was cut
+// off gives what is there, and then the error.
 class SoundFileInput final : public AudioInput {
  public:
-  // `name` stands for the file in messages; `file` is seekable and stands at its beginning. Throws
+  // `name` is the file's name in messages; `file` is seekable and at its beginning. Throws
   // AudioError.
   SoundFileInput(std::string name, base::FileDescriptor file);
 
@@ -39,6 +40,7 @@ class SoundFileInput final : public AudioInput {
 
   std::string name_;
   base::FileDescriptor file_;
+  std::string truncation_;  // what shows that the file was cut off; empty if nothing does
   SF_INFO info_ = {};
   std::unique_ptr<SNDFILE, CloseSoundFile> sound_file_;
   std::unique_ptr<SampleConverter> converter_;

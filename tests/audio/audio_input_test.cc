@@ -1,4 +1,5 @@
-// What comes out of sound files of all kinds, and what is said of those that can't be used.
+// What comes out of sound files of all kinds, and the errors of those that can't be used or were
+// cut off.
 
 #include "audio/audio_input.h"
 
@@ -23,6 +24,8 @@ using testing::Not;
 constexpr int kWav16 = SF_FORMAT_WAV | SF_FORMAT_PCM_16;
 constexpr int kWavFloat = SF_FORMAT_WAV | SF_FORMAT_FLOAT;
 constexpr int kFlac16 = SF_FORMAT_FLAC | SF_FORMAT_PCM_16;
+constexpr int kOgg = SF_FORMAT_OGG | SF_FORMAT_VORBIS;
+constexpr int kMp3 = SF_FORMAT_MPEG | SF_FORMAT_MPEG_LAYER_III;
 
 // In odd amounts, so that block borders fall anywhere.
 std::vector<int16_t> ReadFile(const std::string& path, bool raw = false) {
@@ -123,13 +126,8 @@ TEST_F(AudioInputTest, UnusableFilesAreNamedInOneLine) {
       {WriteBytes("empty.wav", ""), "empty: 0 bytes"},
       {WriteSound<int16_t>("none.wav", kWav16, 16000, 1, {}), "no audio: 0 frames"},
       {WriteBytes("text.wav", std::string(5000, 'x')), "not a readable sound file: "},
-      {cut("cut.wav", kWav16, 30044),
-       "truncated: the header promises 60000 bytes of audio, the file holds 30000"},
-      {cut("cut.aiff", SF_FORMAT_AIFF | SF_FORMAT_PCM_16, 30000),
-       "truncated: the header promises 60008 bytes"},
-      {cut("cut.ogg", SF_FORMAT_OGG | SF_FORMAT_VORBIS, 9000),
-       "truncated: the page that ends the stream is missing"},
-      {cut("cut.flac", kFlac16, 30000), "frame "},
+      {cut("head.wav", kWav16, 44), "no audio: truncated: the header promises 60000 bytes"},
+      {cut("head.ogg", kOgg, 3000), "no audio: truncated: its last Ogg page is cut off"},
       {WriteSound("slow.wav", kWav16, 999, 1, noise), "999 Hz, should be 1000 to 768000"},
       {WriteSound<int16_t>("wide.wav", kWav16, 16000, 65, {}), "65 channels, should be 1 "},
       {WriteSound("nan.wav", kWavFloat, 16000, 2, frames),
@@ -143,6 +141,76 @@ TEST_F(AudioInputTest, UnusableFilesAreNamedInOneLine) {
   }
   EXPECT_EQ(ErrorOf(WriteBytes("odd.raw", "abcde"), true),
             Path("odd.raw") + ": ends after 5 bytes, in the middle of a 16-bit sample");
+}
+
+// What a file gives before its error, and the error.
+std::pair<size_t, std::string> ReadToError(const std::string& path) {
+  const auto input = OpenAudio(path, false);
+  std::vector<int16_t> part(1000);
+  size_t total = 0;
+  try {
+    while (const size_t got = input->Read(part.data(), part.size())) total += got;
+  } catch (const AudioError& error) {
+    return {total, error.what()};
+  }
+  return {total, "no error"};
+}
+
+TEST_F(AudioInputTest, CutFilesGiveWhatIsThereAndThenAnError) {
+  constexpr size_t kSamples = 160000;
+  const auto noise = test::Random(2).Fill<int16_t>(kSamples, -9000, 9000);
+  const struct {
+    std::string name;
+    int format;
+    std::string error;
+  } cases[] = {
+      {"a.wav", kWav16, "truncated: the header promises 320000 bytes of audio, the file holds "},
+      {"a.aiff", SF_FORMAT_AIFF | SF_FORMAT_PCM_16, "truncated: the header promises 320008 bytes"},
+      {"a.au", SF_FORMAT_AU | SF_FORMAT_PCM_16, "truncated: the header promises 320000 bytes"},
+      {"a.ogg", kOgg, "truncated: its last Ogg page is cut off"},
+      {"a.opus", SF_FORMAT_OGG | SF_FORMAT_OPUS, "truncated: its last Ogg page is cut off"},
+      {"a.flac", kFlac16, "corrupt: "},
+      {"a.mp3", kMp3, "truncated: the header promises "},
+  };
+  for (const auto& [name, format, error] : cases) {
+    SCOPED_TRACE(name);
+    const std::string path = WriteSound(name, format, 16000, 1, noise);
+    EXPECT_EQ(ReadToError(path), std::make_pair(kSamples, std::string("no error")));
+    std::filesystem::resize_file(path, std::filesystem::file_size(path) * 3 / 5);
+    const auto [samples, message] = ReadToError(path);
+    EXPECT_NEAR(static_cast<double>(samples), kSamples * 0.6, kSamples * 0.12);
+    EXPECT_THAT(message, AllOf(HasSubstr(path + ": frame "), HasSubstr(error)));
+  }
+}
+
+TEST_F(AudioInputTest, OggPagesAndMpegFramesShowWhereAFileWasCut) {
+  const auto noise = test::Random(2).Fill<int16_t>(160000, -9000, 9000);
+  const std::string no_error = "no error";
+  // Whole pages without the end-of-stream mark are a complete stream; whatever follows is not of
+  // it.
+  WriteSound("a.ogg", kOgg, 16000, 1, noise);
+  const std::string ogg = Contents("a.ogg");
+  const size_t last_page = ogg.rfind("OggS");
+  EXPECT_EQ(ErrorOf(WriteBytes("unmarked.ogg", ogg.substr(0, last_page))), no_error);
+  EXPECT_EQ(ErrorOf(WriteBytes("tagged.ogg", ogg + "TAG of another kind")), no_error);
+  for (const size_t more : {size_t{2}, size_t{20}, ogg.size() - last_page - 1}) {
+    EXPECT_THAT(ErrorOf(WriteBytes("cut.ogg", ogg.substr(0, last_page + more))),
+                HasSubstr("truncated: its last Ogg page is cut off"))
+        << more;
+  }
+
+  // Without its first frame, which states how many there are, and which has no sync word inside.
+  WriteSound("a.mp3", kMp3, 32000, 1, noise);
+  const std::string mp3 = Contents("a.mp3");
+  const size_t first = mp3.find("\xFF\xFB");
+  ASSERT_NE(first, std::string::npos);
+  const std::string plain = mp3.substr(mp3.find("\xFF\xFB", first + 190));
+  const std::string id3 = "ID3\4" + std::string(5, '\0') + "\5" + "title";
+  EXPECT_EQ(ErrorOf(WriteBytes("plain.mp3", plain)), no_error);
+  EXPECT_EQ(ErrorOf(WriteBytes("tagged.mp3", id3 + plain + "TAG" + std::string(125, ' '))),
+            no_error);
+  EXPECT_THAT(ErrorOf(WriteBytes("cut.mp3", id3 + plain.substr(0, plain.size() - 9))),
+              HasSubstr("truncated: its last MPEG frame is cut off"));
 }
 
 TEST_F(AudioInputTest, WavOfUnknownLengthGoesToTheEnd) {

@@ -4,6 +4,7 @@
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
+#include <iterator>
 #include <string>
 
 namespace qz::test {
@@ -25,6 +26,10 @@ class TemporaryFolder {
   std::string WriteBytes(const std::string& name, const std::string& bytes) const {
     std::ofstream(Path(name), std::ios::binary) << bytes;
     return Path(name);
+  }
+  std::string Contents(const std::string& name) const {
+    std::ifstream file(Path(name), std::ios::binary);
+    return {std::istreambuf_iterator<char>(file), {}};
   }
 
  private:

@@ -4,8 +4,6 @@
 #include <sys/wait.h>
 
 #include <cstdlib>
-#include <fstream>
-#include <iterator>
 
 #include "tests/support/random.h"
 #include "tests/support/sound_folder.h"
@@ -26,10 +24,6 @@ class QzProgram : public testing::Test, protected SoundFolder {
     out_ = Contents("out");
     err_ = Contents("err");
     return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-  }
-  std::string Contents(const std::string& name) const {
-    std::ifstream file(Path(name), std::ios::binary);
-    return {std::istreambuf_iterator<char>(file), {}};
   }
   // The path of a headerless file with so many samples.
   std::string Noise(size_t samples) const {

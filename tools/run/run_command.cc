@@ -52,8 +52,9 @@ class Run {
 
  private:
   bool StartModule(base::ExitCode* exit_code);
-  // Plays the input, of which `first_samples` stand in the cutter's room already.
-  void Stream(audio::AudioInput* input, size_t first_samples);
+  // Plays the input, of which the chunker already holds `first_samples`. Gives the error that ended
+  // it early; empty if none did.
+  std::string Stream(audio::AudioInput* input, size_t first_samples);
   void Play(const int16_t* buffer);
   void ReportShortAudio();
   RunSummary Summarise() const;
@@ -116,18 +117,13 @@ base::ExitCode Run::Execute() {
   const bool audio_taken = hub_.audio_enabled();
   if (!audio_taken) console_.Message("no audio source was taken: the nanoapp hears nothing");
 
-  std::string broken_off;
-  try {
-    Stream(input.get(), first_samples);
-    if (audio_taken && !console_.output_lost()) ReportShortAudio();
-  } catch (const audio::AudioError& error) {
-    broken_off = std::string("qz: ") + error.what();
-  }
+  const std::string input_error = Stream(input.get(), first_samples);
+  if (audio_taken && !console_.output_lost()) ReportShortAudio();
   clients_.Leave();
   hub_.End();
   exit_code = Conclude();
-  if (broken_off.empty()) return exit_code;
-  console_.Message(broken_off);
+  if (input_error.empty()) return exit_code;
+  console_.Message("qz: " + input_error);
   return base::kUnreadableInput;
 }
 
@@ -152,15 +148,21 @@ void Run::Play(const int16_t* buffer) {
   }
 }
 
-void Run::Stream(audio::AudioInput* input, size_t first_samples) {
+std::string Run::Stream(audio::AudioInput* input, size_t first_samples) {
   if (options_.real_time) hub_.RunInRealTime();
   const auto start = std::chrono::steady_clock::now();
-  for (size_t got = first_samples; got > 0 && !console_.output_lost();) {
-    chunker_.Commit(got);
-    console_.Progress(delivered_samples_, input->ExpectedSamples());
-    got = base::Interrupted() ? 0 : input->Read(chunker_.space(), chunker_.space_samples());
+  std::string input_error;
+  try {
+    for (size_t got = first_samples; got > 0 && !console_.output_lost();) {
+      chunker_.Commit(got);
+      console_.Progress(delivered_samples_, input->ExpectedSamples());
+      got = base::Interrupted() ? 0 : input->Read(chunker_.space(), chunker_.space_samples());
+    }
+  } catch (const audio::AudioError& error) {
+    input_error = error.what();
   }
-  if (console_.output_lost()) return;
+  if (console_.output_lost()) return input_error;
+  // What was read before an error is played to its end, too.
   silent_samples_ = chunker_.Finish();
   wall_seconds_ = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
   if (base::Interrupted()) console_.Message("interrupted");
@@ -170,6 +172,7 @@ void Run::Stream(audio::AudioInput* input, size_t first_samples) {
                   static_cast<double>(silent_samples_) / audio::kSampleRateHz);
     console_.Message(text);
   }
+  return input_error;
 }
 
 void Run::ReportShortAudio() {
