@@ -4,7 +4,7 @@
 // marks it has. On a PC scripts/instruction-counts.py runs it under callgrind, which needs no
 // marks.
 //
-// The module's rooms are linked in, over a runtime that does next to nothing, so that its own
+// The module's components are linked in, over a runtime that does next to nothing, so that its own
 // instructions hardly count.
 
 #include <array>
@@ -16,53 +16,13 @@
 
 #include "app/nanoapp.h"
 #include "app/sound_service.h"
+#include "bench/minimal_runtime.h"
 #include "chre.h"
-#include "chrex.h"
 #include "classifier/audio_classifier.h"
 #include "frontend/audio_frontend.h"
 #include "network/mobilenet_backend.h"
 #include "tests/support/instruction_mark.h"
 #include "tests/support/random.h"
-
-namespace {
-
-// The most that is held at a time: a message and a copy of it, and the list of clients.
-alignas(8) unsigned char heap[4][1024];
-bool taken[4];
-uint32_t reports;
-
-}  // namespace
-
-extern "C" {
-
-void chreLog(chreLogLevel, const char*, ...) {}
-void* chreHeapAlloc(uint32_t bytes) {
-  for (size_t i = 0; i < 4; ++i) {
-    if (taken[i] || bytes > sizeof heap[i]) continue;
-    taken[i] = true;
-    return heap[i];
-  }
-  return nullptr;
-}
-void chreHeapFree(void* block) {
-  for (size_t i = 0; i < 4; ++i) {
-    if (block == heap[i]) taken[i] = false;
-  }
-}
-uint64_t chreGetTime(void) { return 1; }
-int64_t chreGetEstimatedHostTimeOffset(void) { return 0; }
-bool chreSendEvent(uint16_t type, void* data, chreEventCompleteFunction* free_callback, uint32_t) {
-  ++reports;
-  free_callback(type, data);
-  return true;
-}
-bool chreSendMessageToHostEndpoint(void*, size_t, uint32_t, uint16_t, chreMessageFreeFunction*) {
-  return true;
-}
-bool chreAudioGetSource(uint32_t, chreAudioSource*) { return false; }
-bool chreAudioConfigureSource(uint32_t, bool, uint64_t, uint64_t) { return true; }
-bool chrexClockRateChangeRequest(uint32_t) { return true; }
-}
 
 namespace {
 
@@ -147,11 +107,11 @@ int main() {
     nanoappHandleEvent(0, CHRE_EVENT_AUDIO_DATA, &data);
   };
   for (int i = 0; i < kPasses; ++i) event(i);
-  reports = 0;
+  qz::bench::sent = {};
   Count("event", kPasses, nothing, event);
   nanoappEnd();
-  if (reports != kPasses) {
-    std::fprintf(stderr, "counts: %u reports, should be %d\n", reports, kPasses);
+  if (qz::bench::sent.events != kPasses) {
+    std::fprintf(stderr, "counts: %u reports, expected %d\n", qz::bench::sent.events, kPasses);
     return 1;
   }
   return 0;

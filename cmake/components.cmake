@@ -27,8 +27,8 @@ target_compile_options(
             -fno-asynchronous-unwind-tables
             $<$<COMPILE_LANGUAGE:CXX>:-fno-exceptions -fno-rtti -fno-threadsafe-statics>)
 if(CMAKE_CROSSCOMPILING AND CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
-  # Each function's stack and calls, in a file beside the object, for scripts/footprint.
-  target_compile_options(qz_module_flags INTERFACE -fcallgraph-info=su)
+  # Each function's stack frame, in a file beside the object, for scripts/footprint.
+  target_compile_options(qz_module_flags INTERFACE -fstack-usage)
 endif()
 
 # On a PC the loader chooses among texts for its processors (kernels/x86_64/choices.h); elsewhere the

@@ -34,7 +34,7 @@ for build in sys.argv[2:]:
     for entry in json.load(open(os.path.join(build, "compile_commands.json"))):
         file = os.path.normpath(os.path.join(entry["directory"], entry["file"]))
         if file.startswith(root + os.sep) and not file.startswith(generated):
-            entry["command"] = re.sub(r" -fcallgraph-info\S*", "", entry["command"])
+            entry["command"] = re.sub(r" -fstack-usage", "", entry["command"])
             entries.setdefault(file, entry)
 json.dump(list(entries.values()), open("build/lint/compile_commands.json", "w"))
 print("\n".join(sorted(entries)))

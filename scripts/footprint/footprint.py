@@ -1,5 +1,5 @@
 #!/usr/bin/env python3
-"""Measures what the module takes of the device and holds it against the committed figures.
+"""Measures what the module takes of the device and compares it with the committed page.
 
 Usage: footprint.py [--update] [--build FOLDER] [--counter FILE] [--page FILE]
 Exit code: 0 nothing grew, 1 something did or could not be measured."""
@@ -15,7 +15,7 @@ sys.dont_write_bytecode = True
 import goals
 import page
 import stack
-from module_file import (CHANGING, CODE, CONSTANTS, Failure, ZERO, bytes_by_room, dynamic_symbols)
+from module_file import (CHANGING, CODE, CONSTANTS, Failure, ZERO, bytes_by_component, dynamic_symbols)
 
 ROOT = pathlib.Path(__file__).resolve().parents[2]
 PASS_S = 2
@@ -36,24 +36,25 @@ def instructions(build, counter):
         name, times = line.split()
         own, spans = spans[:int(times)], spans[int(times):]
         if len(own) != int(times):
-            raise Failure(f"{name}: {len(own)} spans between marks, should be {times}")
+            raise Failure(f"{name}: {len(own)} spans between marks, expected {times}")
         counts[name] = round(sum(own) / len(own) - counts.get("nothing", 0))
     if spans or counts.keys() != {"nothing", "frame", "network_run", "pass", "event"}:
-        raise Failure(f"counts tells of {sorted(counts)} and {len(spans)} spans more")
+        raise Failure(f"counts measured {sorted(counts)} and {len(spans)} spans more")
     return counts
 
 
-def short_table(total, counts, stacks):
-    def against(name, figure, limit):
-        if figure <= limit:
-            return [name, figure, limit, "yes"]
+def short_table(total, counts, depths):
+    def against(name, value, limit):
+        if value <= limit:
+            return [name, value, limit, "yes"]
         if name not in goals.MISSED:
-            raise Failure(f"{name}: {figure:,}, should be at most {limit:,}, or its reason in goals.MISSED")
-        return [name, figure, limit, f"no: {goals.MISSED[name]}"]
+            raise Failure(f"{name}: {value:,}, expected at most {limit:,}, or its reason in goals.MISSED")
+        return [name, value, limit, f"no: {goals.MISSED[name]}"]
 
     clock_khz = round(counts["event"] / PASS_S / 1000)
     data = total[CHANGING] + total[ZERO]
-    return page.Table(page.HEADLINE, ["Figure", "Now", "At most", "Reached"], [
+    stack_of_events = max(size for call, size in depths.items() if call.startswith("nanoappHandleEvent"))
+    return page.Table(page.HEADLINE, ["Value", "Now", "Limit", "Met"], [
         against("Instructions a run of the network", counts["network_run"], goals.RUN_INSTRUCTIONS),
         against("Instructions a frame of the front end", counts["frame"], goals.FRAME_INSTRUCTIONS),
         ["Instructions a pass (2 s of sound)", counts["pass"], "", ""],
@@ -61,17 +62,16 @@ def short_table(total, counts, stacks):
         against("Code, bytes", total[CODE], goals.CODE_BYTES),
         against("Constants, bytes", total[CONSTANTS], goals.CONSTANTS_BYTES),
         against("Changing and zero data, bytes", data, goals.DATA_BYTES),
-        against("Stack of nanoappHandleEvent, bytes", stacks["nanoappHandleEvent"][0],
-                goals.STACK_BYTES),
+        against("Stack of nanoappHandleEvent, bytes", stack_of_events, goals.STACK_BYTES),
     ], "The clock is that of a processor that executes one instruction a cycle, whole audio events. A "
        "run of the\nnetwork would take 930,000 instructions if each were 4 multiply-accumulates and "
        "nothing else were to do.")
 
 
-def room_table(by_room, total):
-    rows = [[room, *figures.values()] for room, figures in by_room.items()]
+def component_table(by_component, total):
+    rows = [[component, *sizes.values()] for component, sizes in by_component.items()]
     return page.Table(
-        "Bytes by room", ["Room", *total], [*rows, ["**All**", *total.values()]],
+        "Bytes by component", ["Component", *total], [*rows, ["**All**", *total.values()]],
         "Changing data has values at load, zero data has none. nanopb and the compiler's library come "
         "without\nsources; the stubs are those through which the runtime is called.")
 
@@ -81,15 +81,22 @@ def linking_table(linking, imports, exports):
         ["Tables for the loader", linking, ""],
         ["Imported functions", "", len(imports)],
         ["Exported symbols", "", len(exports)],
-    ], "Loaded besides what the rooms bring.")
+    ], "Loaded besides what the components add.")
 
 
-def stack_table(stacks):
-    rows = [[name, size, " → ".join(path)] for name, (size, path) in stacks.items()]
+def stack_table(depths):
     return page.Table(
-        "Stack by entry point", ["Entry point", "Bytes", "Deepest way down"], rows,
-        "At most: the compiler's frames along the calls. Functions of the runtime count 0, for what they "
-        "use is\ntheir own.")
+        "Stack by call", ["Call", "Bytes"], [[call, size] for call, size in depths.items()],
+        "Measured: each call runs on a stack filled with a pattern, and the deepest byte that changed "
+        "counts\n(`bench/stack_depth.cc`). The calls are the deepest of each kind that are known; what "
+        "they don't reach is not\nmeasured. The runtime's functions are replaced by nearly empty ones.")
+
+
+def frame_table(frames):
+    return page.Table(
+        "Largest stack frame by component", ["Component", "Bytes", "Function"],
+        [[component, size, f"`{name}`"] for component, (size, name) in frames.items()],
+        "Of one function, as the compiler reports it. A frame without a bound fails.")
 
 
 def instruction_table(counts):
@@ -107,14 +114,14 @@ def instruction_table(counts):
 def measure(build, counter):
     module = build / "lib/qz.so"
     map_text = (build / "lib/qz.map").read_text()
-    by_room, linking = bytes_by_room(module, map_text)
-    total = {kind: sum(figures[kind] for figures in by_room.values())
+    by_component, linking = bytes_by_component(module, map_text)
+    total = {kind: sum(sizes[kind] for sizes in by_component.values())
              for kind in (CODE, CONSTANTS, CHANGING, ZERO)}
-    stacks = stack.measure(build, ROOT, module, map_text)
+    depths = stack.measured(build)
     counts = instructions(build, counter)
-    return [short_table(total, counts, stacks), room_table(by_room, total),
-            linking_table(linking, *dynamic_symbols(module)), stack_table(stacks),
-            instruction_table(counts)]
+    return [short_table(total, counts, depths), component_table(by_component, total),
+            linking_table(linking, *dynamic_symbols(module)), stack_table(depths),
+            frame_table(stack.largest_frames(build, map_text)), instruction_table(counts)]
 
 
 def main():

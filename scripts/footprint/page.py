@@ -1,8 +1,8 @@
-"""The page of committed figures: written here, read back here, compared here."""
+"""The page of committed values: written, read back and compared here."""
 
 import re
 
-# Of figures in bytes: growth that is not worth a word, say by another alignment.
+# Growth in bytes that is not worth reporting, for example of alignment.
 SLACK_BYTES = 16
 GROWTH_PERCENT = 2
 
@@ -10,17 +10,17 @@ HEADLINE = "In short"
 
 INTRODUCTION = """# Footprint
 
-What the module takes of the device: bytes, stack and instructions, of the build for the hub's own
-processor. `make footprint` measures all of it anew and fails when a figure is more than 2 % (and,
-of bytes, more than 16) above the one that stands here; `make footprint UPDATE=1` rewrites this page,
-which scripts/footprint made, and the copy of its first table in the README. Instructions are counted
-under emulation, the same on every machine.
+What the module uses on the device: bytes, stack and instructions, of the build for the hub's processor.
+`make footprint` measures all of it and fails when a value is more than 2 % (and, of bytes, more than 16)
+above the one on this page. `make footprint UPDATE=1` rewrites this page, which scripts/footprint generates,
+and the copy of its first table in the README. Instructions are counted under emulation; the count is the same
+on every machine.
 """
 
 
 class Table:
-    """Rows of cells under column heads. Whole numbers in the cells are figures, but for those in a
-    column of limits."""
+    """Rows of cells under column heads. Whole numbers in the cells are values to compare, except those
+    in the column of limits."""
 
     def __init__(self, title, columns, rows, note=""):
         self.title, self.columns, self.rows, self.note = title, columns, rows, note
@@ -41,8 +41,8 @@ def render(tables):
 
 
 def read(text):
-    """{(table, row, column): figure} of a page."""
-    figures, title, columns = {}, "", None
+    """{(table, row, column): value} of a page."""
+    values, title, columns = {}, "", None
     for line in text.splitlines():
         if line.startswith("## "):
             title, columns = line[3:], None
@@ -52,13 +52,13 @@ def read(text):
         if columns is None:
             columns = cells
         for column, cell in zip(columns[1:], cells[1:]):
-            if column != "At most" and re.fullmatch(r"[\d,]+", cell):
-                figures[title, cells[0], column] = int(cell.replace(",", ""))
-    return figures
+            if column != "Limit" and re.fullmatch(r"[\d,]+", cell):
+                values[title, cells[0], column] = int(cell.replace(",", ""))
+    return values
 
 
 def allowed(key, committed):
-    """The most that a figure may be without its page changing."""
+    """The largest value that needs no change of the page."""
     table, row, column = key
     if column == "Number":
         return committed
@@ -67,7 +67,7 @@ def allowed(key, committed):
 
 
 def compare(committed, measured):
-    """What is wrong with the measured figures, one sentence each."""
+    """One error message for each value that grew, is missing or is new."""
     for key in sorted(committed.keys() | measured.keys()):
         name = ", ".join(part for part in key if part)
         if key not in measured:
@@ -75,7 +75,7 @@ def compare(committed, measured):
         elif key not in committed:
             yield f"{name}: measured as {measured[key]:,}, not on the page"
         elif measured[key] > allowed(key, committed[key]):
-            yield (f"{name}: {measured[key]:,}, committed as {committed[key]:,}, should be at most "
+            yield (f"{name}: {measured[key]:,}, committed as {committed[key]:,}, expected at most "
                    f"{allowed(key, committed[key]):,}")
 
 
@@ -90,13 +90,13 @@ def renew_copy(text, table):
 
 
 def check_copy(text, committed, name):
-    """What is wrong with the copy of the short table between the two marks of another page."""
+    """Error messages about the copy of the short table between the two marks of another page."""
     inside = text.partition(BEGIN)[2].partition(END)
     if not inside[1]:
-        yield f"{name}: '{BEGIN}' and '{END}' should stand around the table, in this order"
+        yield f"{name}: '{BEGIN}' and '{END}' are expected around the table, in this order"
         return
     copied = read(f"## {HEADLINE}\n{inside[0]}")
-    headline = {key: figure for key, figure in committed.items() if key[0] == HEADLINE}
+    headline = {key: value for key, value in committed.items() if key[0] == HEADLINE}
     for key in sorted(copied.keys() | headline.keys()):
         if copied.get(key) != headline.get(key):
-            yield f"{name}: {key[1]}: {copied.get(key)}, should be as committed: {headline.get(key)}"
+            yield f"{name}: {key[1]}: {copied.get(key)}, expected as committed: {headline.get(key)}"
