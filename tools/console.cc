@@ -15,7 +15,6 @@ namespace qz::tools {
 namespace {
 
 constexpr int64_t kProgressIntervalMs = 200;
-constexpr uint64_t kLongAudioSamples = uint64_t{120} * audio::kSampleRateHz;
 
 int64_t SteadyMs() {
   return std::chrono::duration_cast<std::chrono::milliseconds>(
@@ -33,35 +32,49 @@ Console::Console()
   signal(SIGPIPE, SIG_IGN);
 }
 
-Console::~Console() { EraseProgress(); }
+Console::~Console() { ClearProgress(); }
 
 void Console::Data(const std::string& line) {
   if (output_lost()) return;
-  EraseProgress();
+  // On a terminal, which is taken to be that of stderr, the line takes the place of the progress.
+  if (data_on_terminal_) Erase();
   if (std::fwrite((line + '\n').data(), 1, line.size() + 1, stdout) != line.size() + 1 ||
       std::fflush(stdout) != 0) {
     lost_error_ = errno;
   }
+  if (data_on_terminal_) Draw();
 }
 
 void Console::Message(const std::string& line) {
-  EraseProgress();
+  Erase();
   std::fprintf(stderr, "%s\n", line.c_str());
+  Draw();
 }
 
 void Console::Progress(uint64_t done, uint64_t total) {
-  if (total < kLongAudioSamples || !ProgressDue()) return;
-  std::fprintf(stderr, "\r%.0f of %.0f s, %.0f%%\x1b[K",
-               static_cast<double>(done) / audio::kSampleRateHz,
-               static_cast<double>(total) / audio::kSampleRateHz,
-               100.0 * static_cast<double>(done) / static_cast<double>(total));
+  if (total == 0 || !ProgressDue()) return;
+  char text[96];
+  std::snprintf(text, sizeof(text), "%.0f of %.0f s, %.0f%%",
+                static_cast<double>(done) / audio::kSampleRateHz,
+                static_cast<double>(total) / audio::kSampleRateHz,
+                100.0 * static_cast<double>(done) / static_cast<double>(total));
+  progress_ = text;
+  Draw();
 }
 
 void Console::ClipProgress(uint64_t done, uint64_t total) {
   if (!ProgressDue()) return;
-  std::fprintf(stderr, "\r%llu of %llu clips, %.0f%%\x1b[K", static_cast<unsigned long long>(done),
-               static_cast<unsigned long long>(total),
-               100.0 * static_cast<double>(done) / static_cast<double>(total));
+  char text[96];
+  std::snprintf(text, sizeof(text), "%llu of %llu clips, %.0f%%",
+                static_cast<unsigned long long>(done), static_cast<unsigned long long>(total),
+                100.0 * static_cast<double>(done) / static_cast<double>(total));
+  progress_ = text;
+  Draw();
+}
+
+void Console::ClearProgress() {
+  Erase();
+  progress_.clear();
 }
 
 std::string Console::OutputFault() const {
@@ -69,11 +82,10 @@ std::string Console::OutputFault() const {
   return std::string("standard output: can't be written: ") + std::strerror(lost_error_);
 }
 
-// If so, the caller writes the line.
+// If so, the caller draws it.
 bool Console::ProgressDue() {
   if (!messages_on_terminal_ || SteadyMs() < next_progress_ms_) return false;
   next_progress_ms_ = SteadyMs() + kProgressIntervalMs;
-  progress_shown_ = true;
   return true;
 }
 
@@ -82,9 +94,12 @@ bool Console::data_in_colour() const {
   return data_on_terminal_ && (no_colour == nullptr || no_colour[0] == '\0');
 }
 
-void Console::EraseProgress() {
-  if (progress_shown_) std::fputs("\r\x1b[K", stderr);
-  progress_shown_ = false;
+void Console::Draw() const {
+  if (!progress_.empty()) std::fprintf(stderr, "\r%s\x1b[K", progress_.c_str());
+}
+
+void Console::Erase() const {
+  if (!progress_.empty()) std::fputs("\r\x1b[K", stderr);
 }
 
 }  // namespace qz::tools

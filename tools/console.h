@@ -5,7 +5,8 @@
 
 namespace qz::tools {
 
-// The two outputs: data lines on stdout, messages and the progress line on stderr.
+// The two outputs: data lines on stdout, messages on stderr and, if that is a terminal, a progress
+// line below everything else.
 class Console {
  public:
   Console();
@@ -16,11 +17,13 @@ class Console {
   // A line of message.
   void Message(const std::string& line);
 
-  // `done` of `total` samples in a progress line that the next line replaces; at most five a
-  // second. Only on a terminal, and only for audio that is long.
+  // Shows `done` of `total` samples in the progress line, at most five times a second and not in
+  // the first 0.2 s. Shows nothing of audio of unknown length, whose total is 0.
   void Progress(uint64_t done, uint64_t total);
-  // The same of clips, however few.
+  // The same of clips.
   void ClipProgress(uint64_t done, uint64_t total);
+  // Removes the progress line: what it counted is done.
+  void ClearProgress();
 
   // True once nobody reads stdout any more, or it can't be written.
   bool output_lost() const { return lost_error_ != 0; }
@@ -33,11 +36,12 @@ class Console {
 
  private:
   bool ProgressDue();
-  void EraseProgress();
+  void Draw() const;
+  void Erase() const;
 
   bool data_on_terminal_;
   bool messages_on_terminal_;
-  bool progress_shown_ = false;
+  std::string progress_;      // as shown last; empty: none
   int64_t next_progress_ms_;  // on the steady clock
   int lost_error_ = 0;        // errno of the first failed write of data
 };

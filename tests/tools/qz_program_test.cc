@@ -54,6 +54,28 @@ TEST_F(QzProgram, NobodyNeedsToListen) {
   EXPECT_THAT(out_, HasSubstr("2.00 s of audio (2.00 s of it silence), 0 passes, 0 reports"));
 }
 
+TEST_F(QzProgram, ProgressIsVisibleBetweenReports) {
+  const std::string shown = "\r2 of 4 s, 50%\x1b[K";
+  const std::string line = "$QZ run --realtime --raw " + Noise(4 * kSecond);
+  // `script` gives the program a terminal and copies what it shows to standard output. At once, as
+  // each takes 4 s.
+  const std::string one = Path("one"), both = Path("both"), reports = Path("reports");
+  EXPECT_EQ(Run("export QZ; script -qec \"" + line + " >" + reports + "\" /dev/null >" + one +
+                " & script -qec \"" + line + "\" /dev/null >" + both + " && wait $!"),
+            0);
+  // Lines on the terminal erase the progress, those in a file don't.
+  const std::string report = "[   4.000 s] report";
+  EXPECT_THAT(Contents("one"), AllOf(HasSubstr(shown), Not(HasSubstr(report))));
+  EXPECT_THAT(Contents("reports"), AllOf(HasSubstr(report), Not(HasSubstr("\x1b"))));
+  const std::string terminal = Contents("both");
+  const size_t erased = terminal.find(shown + "\r\x1b[K" + report);
+  ASSERT_NE(erased, std::string::npos) << terminal;
+  // It is drawn again below them, until the summary.
+  const size_t below = terminal.find('\n', erased) + 1;
+  EXPECT_EQ(terminal.compare(below, shown.size(), shown), 0) << terminal;
+  EXPECT_EQ(terminal.find("50%", terminal.find("summary")), std::string::npos);
+}
+
 TEST_F(QzProgram, AnInterruptOrAReaderThatLeavesEndsLiveInput) {
   const std::string live = "(cat " + Noise(3 * kSecond) + "; exec sleep 60)";
   EXPECT_EQ(Run("timeout --foreground --preserve-status -k 9 -s INT 3 $QZ run --raw - < <" + live),

@@ -161,6 +161,7 @@ std::string Run::Stream(audio::AudioInput* input, size_t first_samples) {
   } catch (const audio::AudioError& error) {
     input_error = error.what();
   }
+  console_.ClearProgress();
   if (console_.output_lost()) return input_error;
   // What was read before an error is played to its end, too.
   silent_samples_ = chunker_.Finish();
