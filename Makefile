@@ -7,8 +7,8 @@ CLIP := build/host/clip.wav
 DEMO := build/host/demo.wav
 AUDIO ?= $(DEMO)
 
-# Which kernels the comparison has held against their plain texts, out of a log of CTest.
-SHOW_COMPARISONS := grep -E '^[0-9]+ comparisons: |not compared: |^[0-9]+ texts of [0-9]+ kernels '
+# Which kernels were compared with their references, out of a log of CTest.
+SHOW_COMPARISONS := grep -E '^[0-9]+ comparisons: |not compared: |^[0-9]+ variants of [0-9]+ kernels '
 
 # Parallelism is the builds' own; two set-ups at a time would fight over dpkg's lock.
 .NOTPARALLEL:
@@ -26,7 +26,7 @@ help:
 	@echo 'make bench-baselines       time ours and the libraries that others would use, in one table'
 	@echo 'make counts            count instructions on this PC; compare with bench/instruction_counts.txt'
 	@echo 'make footprint         measure bytes, stack and instructions; compare with docs/footprint.md'
-	@echo 'make kernel-gains      what each kernel costs: its plain text, and those for some processors'
+	@echo 'make kernel-gains      what each kernel costs: its reference, and variants for some processors'
 	@echo 'make lint              check formatting and the rules of clang-tidy'
 	@echo 'make setup             install what is missing of the Debian packages for all this'
 	@echo 'make clean             remove everything that was built'
@@ -111,7 +111,7 @@ footprint: configure-host build-target
 kernel-gains: configure-host build-target
 	cmake --build --preset host --parallel $(JOBS) --target instruction_counter kernel_comparison_test
 	scripts/kernel-gains.py
-	@echo 'On this PC, nanoseconds: plain for every x86-64, plain for AVX2, own for AVX2, for AVX512-VNNI'
+	@echo 'On this PC, nanoseconds: reference, reference compiled for AVX2, variant for AVX2, for AVX512-VNNI'
 	build/host/bin/kernel_comparison_test --time
 
 lint: build-host build-target

@@ -31,25 +31,26 @@ if(CMAKE_CROSSCOMPILING AND CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
   target_compile_options(qz_module_flags INTERFACE -fstack-usage)
 endif()
 
-# On a PC the loader chooses among texts for its processors (kernels/x86_64/choices.h); elsewhere the
-# build does.
+# On a PC the kernels choose among their implementations at the first call (kernels/kernel_table.h); elsewhere
+# the build does.
 if(CMAKE_SYSTEM_PROCESSOR MATCHES "^(x86_64|AMD64)$")
   set(own_kernels x86_64)
 else()
   set(own_kernels plain)
 endif()
 set(QZ_KERNELS ${own_kernels} CACHE STRING
-    "Whose kernels: plain (any processor's), neon (AArch32) or x86_64 (a PC's, chosen by the loader)")
+    "Whose kernels: plain (the references, for any processor), neon (AArch32) or x86_64 (a PC's, chosen as they run)")
 set_property(CACHE QZ_KERNELS PROPERTY STRINGS plain neon x86_64)
 
-# The instruction sets for which the kernels of this build may have texts of their own.
-set(QZ_TEXT_SETS ${QZ_KERNELS})
+# The instruction sets for which the kernels of this build may have variants.
+set(QZ_VARIANT_SETS ${QZ_KERNELS})
 if(QZ_KERNELS STREQUAL "x86_64")
-  set(QZ_TEXT_SETS avx2 avx512vnni)
+  set(QZ_VARIANT_SETS avx2 avx512vnni)
 endif()
 # Never without optimisation: what is inline must not become a function that others could be linked to.
 set(QZ_FLAGS_avx2 -mavx2 $<$<CONFIG:Debug>:-O1>)
 set(QZ_FLAGS_avx512vnni ${QZ_FLAGS_avx2} -mavx512f -mavx512bw -mavx512vl -mavx512vnni)
+set(QZ_FLAGS_reference_avx2 ${QZ_FLAGS_avx2})
 
 # qz_module_component(NAME SOURCES... LINKS... USES...): a component of the module, as a static library. Who links it
 # sees the components of LINKS too, which its headers include, but not those of USES.
@@ -60,70 +61,59 @@ function(qz_module_component name)
   target_link_libraries(${name} PUBLIC ${component_LINKS} PRIVATE ${component_USES} qz_module_flags)
 endfunction()
 
-# qz_kernel_texts(NAME SET SOURCES...): texts under names with __SET behind them, as a library.
-function(qz_kernel_texts name set)
-  qz_module_component(${name}_${set} SOURCES ${ARGN} LINKS ${name})
-  target_compile_options(
-    ${name}_${set}
-    PRIVATE "SHELL:-D \"QZ_TEXT(kernel)=kernel##__${set}\""
-            "SHELL:-include \"${PROJECT_SOURCE_DIR}/kernels/variant_names.h\"")
+# qz_kernel_variant(NAME VARIANT SOURCES...): implementations whose names end in __VARIANT (kernels/variant.h), as
+# the library NAME_VARIANT.
+function(qz_kernel_variant name variant)
+  qz_module_component(${name}_${variant} SOURCES ${ARGN} LINKS ${name})
+  target_compile_definitions(${name}_${variant} PRIVATE QZ_VARIANT=${variant})
+  target_compile_options(${name}_${variant} PRIVATE ${QZ_FLAGS_${variant}})
 endfunction()
 
-# qz_kernel_component(NAME TEXTS rows... TABLES sources...): a component of kernels. A row names a text, NAME.cc,
-# and then the instruction sets for which there is another, SET/NAME.cc, that gives the same bytes.
+# qz_kernel_component(NAME REFERENCES names... TABLES sources...): a component of kernels. NAME.cc is a reference
+# implementation, and SET/NAME.cc the variant for an instruction set, if there is one, which gives the same bytes.
 #
-# The library NAME holds what runs in this build, under the kernels' own names: those of QZ_KERNELS, else
-# the plain texts; or on a PC the choice among NAME_plain, NAME_avx2 and NAME_avx512vnni. NAME_plain holds the
-# plain texts, always, under names of their own, for those who compare. The global property QZ_VECTOR_TEXTS
-# lists SET/NAME of all texts that are not plain.
+# The library NAME holds what runs in this build, under the kernels' own names: the variants for QZ_KERNELS and the
+# references of the other kernels; or on a PC functions that choose. NAME_reference always holds the references,
+# under names of their own, for those who compare. The global property QZ_VECTOR_VARIANTS lists SET/NAME of all
+# variants in this build.
 function(qz_kernel_component name)
-  cmake_parse_arguments(component "" "" "TEXTS;TABLES" ${ARGN})
-  file(GLOB unnamed RELATIVE ${CMAKE_CURRENT_SOURCE_DIR} */*.cc)
-  foreach(row IN LISTS component_TEXTS)
-    separate_arguments(sets UNIX_COMMAND "${row}")
-    list(POP_FRONT sets text)
-    list(APPEND plain ${text}.cc)
-    foreach(set IN LISTS sets)
-      if(NOT ${set}/${text}.cc IN_LIST unnamed)
-        message(FATAL_ERROR "${name}: the row '${row}' names ${set}/${text}.cc, which does not exist")
-      endif()
-      list(REMOVE_ITEM unnamed ${set}/${text}.cc)
-      list(APPEND texts_${set} ${set}/${text}.cc)
-      if(set IN_LIST QZ_TEXT_SETS)
-        list(APPEND vector_texts ${set}/${text})
-      endif()
-    endforeach()
-    foreach(set ${QZ_KERNELS} avx2)
-      if(set IN_LIST sets)
-        list(APPEND all_${set} ${set}/${text}.cc)
-      else()
-        list(APPEND all_${set} ${text}.cc)
-      endif()
-    endforeach()
+  cmake_parse_arguments(component "" "" "REFERENCES;TABLES" ${ARGN})
+  list(TRANSFORM component_REFERENCES APPEND .cc OUTPUT_VARIABLE references)
+  file(GLOB variants RELATIVE ${CMAKE_CURRENT_SOURCE_DIR} CONFIGURE_DEPENDS */*.cc)
+  foreach(variant IN LISTS variants)
+    get_filename_component(set ${variant} DIRECTORY)
+    get_filename_component(source ${variant} NAME)
+    if(NOT source IN_LIST references)
+      message(FATAL_ERROR "${name}: ${variant} is a variant of ${source}, which does not exist")
+    endif()
+    list(APPEND variants_${set} ${variant})
+    if(set IN_LIST QZ_VARIANT_SETS)
+      string(REGEX REPLACE ".cc$" "" variant ${variant})
+      set_property(GLOBAL APPEND PROPERTY QZ_VECTOR_VARIANTS ${variant})
+    endif()
   endforeach()
-  if(unnamed)
-    message(FATAL_ERROR "${name}: no row names ${unnamed}")
-  endif()
 
   if(QZ_KERNELS STREQUAL "x86_64")
-    # kernels/x86_64/signal_choice.cc of signal_kernels, and so on. Called by the loader, before
-    # sanitizers are ready.
-    string(REPLACE _kernels _choice choice ${PROJECT_SOURCE_DIR}/kernels/x86_64/${name}.cc)
-    set_source_files_properties(${choice} PROPERTIES COMPILE_OPTIONS -fno-sanitize=all)
-    qz_module_component(${name} SOURCES ${choice} ${component_TABLES})
-    qz_kernel_texts(${name} avx2 ${all_avx2})
-    target_compile_options(${name}_avx2 PRIVATE ${QZ_FLAGS_avx2})
-    target_link_libraries(${name} PUBLIC x86_64_processor PRIVATE ${name}_plain ${name}_avx2)
-    if(texts_avx512vnni)
-      qz_kernel_texts(${name} avx512vnni ${texts_avx512vnni})
-      target_compile_options(${name}_avx512vnni PRIVATE ${QZ_FLAGS_avx512vnni})
-      target_link_libraries(${name} PRIVATE ${name}_avx512vnni)
-    endif()
+    qz_module_component(${name} SOURCES ${PROJECT_SOURCE_DIR}/kernels/x86_64/${name}.cc ${component_TABLES})
+    qz_kernel_variant(${name} reference_avx2 ${references})
+    target_link_libraries(${name} PUBLIC x86_64_processor PRIVATE ${name}_reference ${name}_reference_avx2)
+    foreach(set IN LISTS QZ_VARIANT_SETS)
+      if(variants_${set})
+        qz_kernel_variant(${name} ${set} ${variants_${set}})
+        target_link_libraries(${name} PRIVATE ${name}_${set})
+      endif()
+    endforeach()
   else()
-    qz_module_component(${name} SOURCES ${all_${QZ_KERNELS}} ${component_TABLES})
+    foreach(source IN LISTS references)
+      if(${QZ_KERNELS}/${source} IN_LIST variants)
+        list(APPEND running ${QZ_KERNELS}/${source})
+      else()
+        list(APPEND running ${source})
+      endif()
+    endforeach()
+    qz_module_component(${name} SOURCES ${running} ${component_TABLES})
   endif()
-  set_property(GLOBAL APPEND PROPERTY QZ_VECTOR_TEXTS ${vector_texts})
-  qz_kernel_texts(${name} plain ${plain})
+  qz_kernel_variant(${name} reference ${references})
 endfunction()
 
 # qz_component(NAME SOURCES... LINKS...): a component of the PC side, as a static library.

@@ -1,41 +1,49 @@
 #include "tools/kernel_versions.h"
 
+#include "kernels/kernel_table.h"
 #ifdef QZ_KERNELS_X86_64
-#include "kernels/x86_64/choices.h"
 #include "kernels/x86_64/processor.h"
 #endif
 
 namespace qz::tools {
-
-#ifdef QZ_KERNELS_X86_64
-
 namespace {
 
-const char* Running(ChoiceRow row, InstructionSet best) {
-  if (best == InstructionSet::kBaseline) return "plain      ";
-  if (row == avx2_plain) return "plain, avx2";
-  return row == avx512vnni && best == InstructionSet::kAvx512Vnni ? "avx512vnni " : "avx2       ";
+// As in the table of kernels.
+std::string Implementation([[maybe_unused]] const KernelRow& row) {
+#ifdef QZ_KERNELS_X86_64
+  switch (BestInstructionSet()) {
+    case InstructionSet::kAvx512Vnni:
+      return row.avx512vnni;
+    case InstructionSet::kAvx2:
+      return row.avx2;
+    case InstructionSet::kBaseline:
+      break;
+  }
+#else
+  const std::string kernels = QZ_KERNELS;
+  if (kernels == "neon") return row.neon;
+#endif
+  return "reference";
+}
+
+std::string ForPeople(const std::string& implementation) {
+  if (implementation == "reference_avx2") return "C++ compiled for AVX2";
+  if (implementation == "avx2") return "AVX2";
+  if (implementation == "avx512vnni") return "AVX512-VNNI";
+  if (implementation == "neon") return "NEON";
+  return "C++";
 }
 
 }  // namespace
 
-std::string KernelVersions() {
-  const InstructionSet best = BestInstructionSet();
-  std::string text =
-      "kernels on this processor (\"plain, avx2\" is the plain text, compiled for AVX2):";
-  for (const Choice& choice : kChoices) {
-    text += std::string("\n  ") + Running(choice.row, best) + "  " + choice.kernel;
+std::string KernelVersions(bool verbose) {
+  std::string lines = "kernels on this processor:";
+  for (const KernelRow& row : kKernelTable) {
+    const std::string implementation = Implementation(row);
+    lines += std::string("\n  ") + row.title + ": " + ForPeople(implementation);
+    if (verbose) lines += std::string("\n    ") + row.kernel + ", " + implementation;
   }
-  return text;
+  return lines;
 }
-
-#else
-
-std::string KernelVersions() {
-  const std::string texts = QZ_VECTOR_TEXTS;
-  return texts.empty() ? "kernels: plain texts" : "kernels: plain texts, but for " + texts;
-}
-
-#endif
 
 }  // namespace qz::tools

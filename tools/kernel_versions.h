@@ -4,8 +4,9 @@
 
 namespace qz::tools {
 
-// Which text of each kernel runs in the module that is built beside this program, on this
-// processor: a heading and a line for each, without a line break at the end.
-std::string KernelVersions();
+// Which implementation of each kernel runs in the module that is built beside this program, on this
+// processor: a heading and a line for each, without a line break at the end. Verbose: also the
+// kernels' symbols, a line each.
+std::string KernelVersions(bool verbose);
 
 }  // namespace qz::tools

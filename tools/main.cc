@@ -37,8 +37,11 @@ int NoCommand(const CLI::App& app) {
 
 int Main(int argc, char** argv) {
   CLI::App app("Sound event detector, run on a PC", "qz");
-  app.set_version_flag("--version",
-                       [] { return "qz " QZ_VERSION "\n" + qz::tools::KernelVersions(); });
+  bool verbose = false;
+  app.add_flag("--verbose", verbose, "with --version: the kernels' symbols too");
+  app.set_version_flag("--version", [&verbose] {
+    return "qz " QZ_VERSION " (build " QZ_BUILD_NUMBER ")\n" + qz::tools::KernelVersions(verbose);
+  });
   app.failure_message([](const CLI::App* parsed, const CLI::Error& error) {
     const auto commands = parsed->get_subcommands();
     const std::string command = commands.empty() ? "" : commands[0]->get_name() + " ";

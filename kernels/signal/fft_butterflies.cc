@@ -4,6 +4,7 @@
 #include "kernels/signal/signal_arithmetic.h"
 #include "kernels/signal/signal_kernels.h"
 #include "kernels/signal/signal_tables.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -38,11 +39,9 @@ inline void Butterfly(int16_t* x0, size_t quarter, const int16_t* w1, const int1
 
 }  // namespace
 
-extern "C" void orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4(size_t butterflies,
-                                                                      size_t /*quarter_bytes*/,
-                                                                      int16_t* data,
-                                                                      const int16_t* /*twiddles*/,
-                                                                      size_t /*twiddle_stride*/) {
+QZ_KERNEL(orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4)
+(size_t butterflies, size_t /*quarter_bytes*/, int16_t* data, const int16_t* /*twiddles*/,
+ size_t /*twiddle_stride*/) {
   for (size_t b = 0; b < butterflies; ++b) {
     int16_t* x = data + 8 * b;
     StoreSums(x, 2, Scaled(x, kPrescale), Scaled(x + 2, kPrescale), Scaled(x + 4, kPrescale),
@@ -50,9 +49,9 @@ extern "C" void orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4(size_t but
   }
 }
 
-extern "C" void orra_cs16_bfly4_samples4_ukernel__neon(size_t groups, size_t quarter_bytes,
-                                                       int16_t* data, const int16_t* /*twiddles*/,
-                                                       size_t /*twiddle_stride*/) {
+QZ_KERNEL(orra_cs16_bfly4_samples4_ukernel__neon)
+(size_t groups, size_t quarter_bytes, int16_t* data, const int16_t* /*twiddles*/,
+ size_t /*twiddle_stride*/) {
   const auto& twiddles = vrd_table_fft256_samples4_twiddle;
   const size_t quarter = quarter_bytes / sizeof(int16_t);
   for (size_t group = 0; group < groups; ++group) {
@@ -63,8 +62,9 @@ extern "C" void orra_cs16_bfly4_samples4_ukernel__neon(size_t groups, size_t qua
   }
 }
 
-extern "C" void orra_cs16_bfly4_ukernel__neon_x4(size_t groups, size_t quarter_bytes, int16_t* data,
-                                                 const int16_t* twiddles, size_t twiddle_stride) {
+QZ_KERNEL(orra_cs16_bfly4_ukernel__neon_x4)
+(size_t groups, size_t quarter_bytes, int16_t* data, const int16_t* twiddles,
+ size_t twiddle_stride) {
   const size_t quarter = quarter_bytes / sizeof(int16_t);
   const size_t stride = twiddle_stride / sizeof(int16_t);
   for (size_t group = 0; group < groups; ++group) {

@@ -2,14 +2,15 @@
 
 #include "kernels/signal/signal_arithmetic.h"
 #include "kernels/signal/signal_kernels.h"
+#include "kernels/variant.h"
 
 using qz::signal::Complex;
 using qz::signal::Rotated;
 using qz::signal::Scaled;
 using qz::signal::StoreWrapped;
 
-extern "C" void orra_cs16_fftr_ukernel__asm_aarch32_neon_x4(size_t count, int16_t* data,
-                                                            const int16_t* twiddles) {
+QZ_KERNEL(orra_cs16_fftr_ukernel__asm_aarch32_neon_x4)
+(size_t count, int16_t* data, const int16_t* twiddles) {
   constexpr int32_t kHalf = 16383;  // Q15, just under 1/2
 
   const Complex first = Scaled(data, kHalf);

@@ -1,12 +1,11 @@
 // Energies of overlapping triangular channels.
 
 #include "kernels/signal/signal_kernels.h"
+#include "kernels/variant.h"
 
-extern "C" void orra_u32_filterbank_accumulate_ukernel__asm_aarch32_neon_x2(size_t rows,
-                                                                            const uint32_t* input,
-                                                                            const uint8_t* widths,
-                                                                            const uint16_t* weights,
-                                                                            uint64_t* output) {
+QZ_KERNEL(orra_u32_filterbank_accumulate_ukernel__asm_aarch32_neon_x2)
+(size_t rows, const uint32_t* input, const uint8_t* widths, const uint16_t* weights,
+ uint64_t* output) {
   // Each segment falls for the current channel (w0) and rises for the next (w1); the first only
   // rises.
   uint64_t current = 0;

@@ -2,6 +2,7 @@
 
 #include "kernels/signal/signal_kernels.h"
 #include "kernels/signal/signal_tables.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -25,9 +26,9 @@ inline uint32_t Log2(uint32_t y) {
 
 }  // namespace
 
-extern "C" void orra_u32_vlog_ukernel__scalar_x1(size_t count, const uint32_t* input,
-                                                 uint32_t input_shift, uint32_t output_scale,
-                                                 uint16_t* output) {
+QZ_KERNEL(orra_u32_vlog_ukernel__scalar_x1)
+(size_t count, const uint32_t* input, uint32_t input_shift, uint32_t output_scale,
+ uint16_t* output) {
   constexpr uint32_t kMax = 32767;
   for (size_t i = 0; i < count; ++i) {
     const uint32_t y = input_shift < 32 ? input[i] << input_shift : 0;

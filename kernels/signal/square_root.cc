@@ -3,6 +3,7 @@
 #include <cmath>
 
 #include "kernels/signal/signal_kernels.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -31,8 +32,8 @@ inline uint32_t NearestRoot(uint64_t v) {
 
 }  // namespace
 
-extern "C" void orra_u64_u32_vsqrtshift_ukernel__scalar_cvtu32_sqrt_cvtu32f64_x1(
-    size_t bytes, const uint64_t* input, uint32_t* output, uint32_t shift) {
+QZ_KERNEL(orra_u64_u32_vsqrtshift_ukernel__scalar_cvtu32_sqrt_cvtu32f64_x1)
+(size_t bytes, const uint64_t* input, uint32_t* output, uint32_t shift) {
   for (size_t i = 0; i < bytes / sizeof(uint64_t); ++i) {
     const uint32_t root = NearestRoot(input[i]);
     output[i] = shift < 32 ? root >> shift : 0;

@@ -19,8 +19,7 @@ uint32_t KeptRegisters() {
 
 }  // namespace
 
-// Bits of leaves 1 and 7 and of XCR0 by the processor makers' manuals. Called while the module is
-// being loaded, before any address in it is ready: nothing here may call another file.
+// Bits of leaves 1 and 7 and of XCR0 by the processor makers' manuals.
 InstructionSet BestInstructionSet() {
   constexpr uint32_t kXsaveInUse = Bit(27), kAvx = Bit(28);                            // 1, ecx
   constexpr uint32_t kAvx2 = Bit(5), kAvx512Foundation = Bit(16);                      // 7, ebx

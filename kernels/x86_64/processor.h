@@ -1,4 +1,4 @@
-// What the PC's processor can do, of what a kernel has a text for.
+// What the PC's processor can do, of what kernels have implementations for.
 #pragma once
 
 namespace qz {
@@ -9,8 +9,8 @@ enum class InstructionSet {
   kAvx512Vnni,  // kAvx2, and sums of byte products on 256-bit vectors (AVX512-VNNI, AVX512VL)
 };
 
-// The largest that both the processor and the operating system offer. Apart in a library, so that a
-// program can pretend to have less.
-__attribute__((visibility("hidden"))) InstructionSet BestInstructionSet();
+// The largest that both the processor and the operating system offer. In a library of its own, so
+// that a program can force a smaller one.
+InstructionSet BestInstructionSet();
 
 }  // namespace qz

@@ -4,6 +4,7 @@
 #include "kernels/quantised/avx2/requantise.h"
 #include "kernels/quantised/indirection.h"
 #include "kernels/quantised/quantised_kernels.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -53,10 +54,10 @@ inline __m256i Convolve(const int8_t* const (&rows)[kTaps], size_t count, const 
 }  // namespace
 
 // Group by group, two positions at a time.
-extern "C" void orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35(
-    size_t channels, size_t width, const int8_t* const* in_ptrs, const void* w, int8_t* out,
-    size_t in_ptrs_step, size_t out_gap, size_t in_offset, const int8_t* zero,
-    const orra_fp32_requant_params* params) {
+QZ_KERNEL(orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35)
+(size_t channels, size_t width, const int8_t* const* in_ptrs, const void* w, int8_t* out,
+ size_t in_ptrs_step, size_t out_gap, size_t in_offset, const int8_t* zero,
+ const orra_fp32_requant_params* params) {
   const qz::OutputRange256 range = qz::Range256Of(*params);
   const uint8_t* packed = static_cast<const uint8_t*>(w);
   const size_t stride = channels + out_gap;

@@ -7,6 +7,7 @@
 
 #include "kernels/quantised/quantised_kernels.h"
 #include "kernels/quantised/requantisation.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -24,10 +25,9 @@ inline __m256i Pair(const uint8_t* weights, bool alone) {
 
 // Two input channels at a time; a last one alone is paired with the byte behind it, whose weights
 // are 0.
-extern "C" void orra_qs8_gemm_minmax_rndnu_ukernel_1x8__asm_aarch32_neon_mlal_lane_cortex_a7(
-    size_t /*m*/, size_t n, size_t k, const int8_t* a, size_t /*a_stride*/, const void* w,
-    int8_t* c, size_t /*c_stride*/, size_t c_block_stride,
-    const orra_rndnu_requant_params* params) {
+QZ_KERNEL(orra_qs8_gemm_minmax_rndnu_ukernel_1x8__asm_aarch32_neon_mlal_lane_cortex_a7)
+(size_t /*m*/, size_t n, size_t k, const int8_t* a, size_t /*a_stride*/, const void* w, int8_t* c,
+ size_t /*c_stride*/, size_t c_block_stride, const orra_rndnu_requant_params* params) {
   const uint8_t* block = static_cast<const uint8_t*>(w);
   for (size_t column = 0; column < n; column += kColumns, c += c_block_stride) {
     __m256i sums = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(block));

@@ -7,6 +7,7 @@
 
 #include "kernels/quantised/indirection.h"
 #include "kernels/quantised/quantised_kernels.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -43,12 +44,10 @@ inline __m128i Max16(const Pool& pool, size_t c) {
 
 // 32 channels at a time, of which the last 32 may have been met in part; fewer than 32 go by 16,
 // and may read 15 bytes too far.
-extern "C" void orra_s8_maxpool_minmax_ukernel_2p2x__neon_c16(size_t positions, size_t pool_size,
-                                                              size_t channels,
-                                                              const int8_t* const* in_ptrs,
-                                                              size_t in_offset, int8_t* out,
-                                                              size_t in_ptrs_gap, size_t out_gap,
-                                                              const orra_s8_clamp_params* params) {
+QZ_KERNEL(orra_s8_maxpool_minmax_ukernel_2p2x__neon_c16)
+(size_t positions, size_t pool_size, size_t channels, const int8_t* const* in_ptrs,
+ size_t in_offset, int8_t* out, size_t in_ptrs_gap, size_t out_gap,
+ const orra_s8_clamp_params* params) {
   const size_t list_bytes = (pool_size + pool_size % 2) * sizeof(const int8_t*) + in_ptrs_gap;
   Pool pool{in_ptrs, pool_size, in_offset, _mm256_set1_epi8(params->output_min),
             _mm256_set1_epi8(params->output_max)};

@@ -6,6 +6,7 @@
 #include "kernels/quantised/indirection.h"
 #include "kernels/quantised/neon/requantise.h"
 #include "kernels/quantised/quantised_kernels.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -60,10 +61,10 @@ inline void ConvolveLast(const int8_t* const (&rows)[kTaps], size_t channels, co
 
 }  // namespace
 
-extern "C" void orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35(
-    size_t channels, size_t width, const int8_t* const* in_ptrs, const void* w, int8_t* out,
-    size_t in_ptrs_step, size_t out_gap, size_t in_offset, const int8_t* zero,
-    const orra_fp32_requant_params* params) {
+QZ_KERNEL(orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35)
+(size_t channels, size_t width, const int8_t* const* in_ptrs, const void* w, int8_t* out,
+ size_t in_ptrs_step, size_t out_gap, size_t in_offset, const int8_t* zero,
+ const orra_fp32_requant_params* params) {
   const qz::OutputRange range = qz::RangeOf(*params);
   for (; width > 0; --width) {
     const int8_t* rows[kTaps];

@@ -7,6 +7,7 @@
 
 #include "kernels/quantised/neon/requantise.h"
 #include "kernels/quantised/quantised_kernels.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -44,10 +45,9 @@ struct Steps {
 
 }  // namespace
 
-extern "C" void orra_qs8_gemm_minmax_rndnu_ukernel_1x8__asm_aarch32_neon_mlal_lane_cortex_a7(
-    size_t /*m*/, size_t n, size_t k, const int8_t* a, size_t /*a_stride*/, const void* w,
-    int8_t* c, size_t /*c_stride*/, size_t c_block_stride,
-    const orra_rndnu_requant_params* params) {
+QZ_KERNEL(orra_qs8_gemm_minmax_rndnu_ukernel_1x8__asm_aarch32_neon_mlal_lane_cortex_a7)
+(size_t /*m*/, size_t n, size_t k, const int8_t* a, size_t /*a_stride*/, const void* w, int8_t* c,
+ size_t /*c_stride*/, size_t c_block_stride, const orra_rndnu_requant_params* params) {
   const Steps steps(*params);
   const uint8_t* block = static_cast<const uint8_t*>(w);
   for (size_t left = n; left > 0; left -= std::min(left, kColumns)) {

@@ -3,12 +3,13 @@
 
 #include "kernels/quantised/neon/vector_tile.h"
 #include "kernels/quantised/quantised_kernels.h"
+#include "kernels/variant.h"
 
 // Rows from m on repeat row m - 1: the tile is computed whole, and only its first m rows are
 // stored.
-extern "C" void orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
-    size_t m, size_t n, size_t k, const int8_t* a, size_t a_stride, const void* w, int8_t* c,
-    size_t c_stride, size_t c_block_stride, const orra_fp32_requant_params* params) {
+QZ_KERNEL(orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35)
+(size_t m, size_t n, size_t k, const int8_t* a, size_t a_stride, const void* w, int8_t* c,
+ size_t c_stride, size_t c_block_stride, const orra_fp32_requant_params* params) {
   const qz::OutputRange range = qz::RangeOf(*params);
   const int8_t* rows[qz::kTileRows];
   for (size_t r = 0; r < qz::kTileRows; ++r) rows[r] = a + std::min(r, m - 1) * a_stride;

@@ -4,12 +4,13 @@
 #include "kernels/quantised/indirection.h"
 #include "kernels/quantised/neon/vector_tile.h"
 #include "kernels/quantised/quantised_kernels.h"
+#include "kernels/variant.h"
 
 // The tile is computed whole, from the list's 4 rows a tap, and only its first m rows are stored.
-extern "C" void orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
-    size_t m, size_t n, size_t k, size_t tap_bytes, const int8_t* const* a_ptrs, const void* w,
-    int8_t* c, size_t c_stride, size_t c_block_stride, size_t a_offset, const int8_t* zero,
-    const orra_fp32_requant_params* params) {
+QZ_KERNEL(orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35)
+(size_t m, size_t n, size_t k, size_t tap_bytes, const int8_t* const* a_ptrs, const void* w,
+ int8_t* c, size_t c_stride, size_t c_block_stride, size_t a_offset, const int8_t* zero,
+ const orra_fp32_requant_params* params) {
   const qz::OutputRange range = qz::RangeOf(*params);
   const int8_t* const* end = qz::Advance(a_ptrs, tap_bytes);
 

@@ -9,6 +9,7 @@
 #include "kernels/quantised/indirection.h"
 #include "kernels/quantised/neon/requantise.h"
 #include "kernels/quantised/quantised_kernels.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -47,12 +48,10 @@ inline void Pool(const int8_t* first, const int8_t* second, size_t channels, Cla
 
 }  // namespace
 
-extern "C" void orra_s8_maxpool_minmax_ukernel_2p2x__neon_c16(size_t positions, size_t pool_size,
-                                                              size_t channels,
-                                                              const int8_t* const* in_ptrs,
-                                                              size_t in_offset, int8_t* out,
-                                                              size_t in_ptrs_gap, size_t out_gap,
-                                                              const orra_s8_clamp_params* params) {
+QZ_KERNEL(orra_s8_maxpool_minmax_ukernel_2p2x__neon_c16)
+(size_t positions, size_t pool_size, size_t channels, const int8_t* const* in_ptrs,
+ size_t in_offset, int8_t* out, size_t in_ptrs_gap, size_t out_gap,
+ const orra_s8_clamp_params* params) {
   const Clamp clamp = {vdupq_n_s8(params->output_min), vdupq_n_s8(params->output_max)};
   const size_t entries = pool_size + pool_size % 2;
   const size_t list_step = entries * sizeof(const int8_t*) + in_ptrs_gap;

@@ -6,6 +6,7 @@
 #include "kernels/signal/avx2/complex_vector.h"
 #include "kernels/signal/signal_kernels.h"
 #include "kernels/signal/signal_tables.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -133,11 +134,9 @@ inline void EightsOfEveryGroup(size_t groups, size_t quarter, int16_t* data,
 
 }  // namespace
 
-extern "C" void orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4(size_t butterflies,
-                                                                      size_t /*quarter_bytes*/,
-                                                                      int16_t* data,
-                                                                      const int16_t* /*twiddles*/,
-                                                                      size_t /*twiddle_stride*/) {
+QZ_KERNEL(orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4)
+(size_t butterflies, size_t /*quarter_bytes*/, int16_t* data, const int16_t* /*twiddles*/,
+ size_t /*twiddle_stride*/) {
   for (; butterflies >= 2; butterflies -= 2) {
     Store(data, FirstStageButterflies(Load(data)));
     data += 16;
@@ -148,9 +147,9 @@ extern "C" void orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4(size_t but
   }
 }
 
-extern "C" void orra_cs16_bfly4_samples4_ukernel__neon(size_t groups, size_t /*quarter_bytes*/,
-                                                       int16_t* data, const int16_t* /*twiddles*/,
-                                                       size_t /*twiddle_stride*/) {
+QZ_KERNEL(orra_cs16_bfly4_samples4_ukernel__neon)
+(size_t groups, size_t /*quarter_bytes*/, int16_t* data, const int16_t* /*twiddles*/,
+ size_t /*twiddle_stride*/) {
   const auto& rows = vrd_table_fft256_samples4_twiddle;
   constexpr size_t kQuarter = 8;  // the only length that the stage is for
   FourOfEveryGroup(groups, kQuarter, data,
@@ -159,8 +158,9 @@ extern "C" void orra_cs16_bfly4_samples4_ukernel__neon(size_t groups, size_t /*q
                     _mm256_broadcastsi128_si256(LoadFour(rows[2][0]))});
 }
 
-extern "C" void orra_cs16_bfly4_ukernel__neon_x4(size_t groups, size_t quarter_bytes, int16_t* data,
-                                                 const int16_t* twiddles, size_t twiddle_stride) {
+QZ_KERNEL(orra_cs16_bfly4_ukernel__neon_x4)
+(size_t groups, size_t quarter_bytes, int16_t* data, const int16_t* twiddles,
+ size_t twiddle_stride) {
   const size_t quarter = quarter_bytes / sizeof(int16_t);
   const size_t stride = twiddle_stride / sizeof(int16_t);
   if (stride == 2) {

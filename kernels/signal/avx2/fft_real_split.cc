@@ -6,6 +6,7 @@
 
 #include "kernels/signal/avx2/complex_vector.h"
 #include "kernels/signal/signal_kernels.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -58,8 +59,8 @@ inline __m128i ReversedFour(__m128i four) { return _mm_shuffle_epi32(four, 0x1B)
 
 }  // namespace
 
-extern "C" void orra_cs16_fftr_ukernel__asm_aarch32_neon_x4(size_t count, int16_t* data,
-                                                            const int16_t* twiddles) {
+QZ_KERNEL(orra_cs16_fftr_ukernel__asm_aarch32_neon_x4)
+(size_t count, int16_t* data, const int16_t* twiddles) {
   const __m256i first = Scaled(_mm256_castsi128_si256(_mm_loadu_si32(data)), kHalf);
   const auto re = static_cast<int16_t>(_mm256_extract_epi16(first, 0));
   const auto im = static_cast<int16_t>(_mm256_extract_epi16(first, 1));

@@ -6,6 +6,7 @@
 #include <immintrin.h>
 
 #include "kernels/signal/signal_kernels.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -51,11 +52,9 @@ inline __m128i TwoChannels(__m256i first, __m256i second, __m256i third) {
 
 }  // namespace
 
-extern "C" void orra_u32_filterbank_accumulate_ukernel__asm_aarch32_neon_x2(size_t rows,
-                                                                            const uint32_t* input,
-                                                                            const uint8_t* widths,
-                                                                            const uint16_t* weights,
-                                                                            uint64_t* output) {
+QZ_KERNEL(orra_u32_filterbank_accumulate_ukernel__asm_aarch32_neon_x2)
+(size_t rows, const uint32_t* input, const uint8_t* widths, const uint16_t* weights,
+ uint64_t* output) {
   Bins bins = {input, weights, 0};
   __m256i first = bins.Segment(widths[0]);
   size_t row = 0;

@@ -6,6 +6,7 @@
 #include "kernels/signal/avx2/lanes.h"
 #include "kernels/signal/signal_kernels.h"
 #include "kernels/signal/signal_tables.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -60,9 +61,9 @@ inline __m128i Logarithms(__m256i input, __m128i input_shift, __m256i output_sca
 
 }  // namespace
 
-extern "C" void orra_u32_vlog_ukernel__scalar_x1(size_t count, const uint32_t* input,
-                                                 uint32_t input_shift, uint32_t output_scale,
-                                                 uint16_t* output) {
+QZ_KERNEL(orra_u32_vlog_ukernel__scalar_x1)
+(size_t count, const uint32_t* input, uint32_t input_shift, uint32_t output_scale,
+ uint16_t* output) {
   const __m128i shift = _mm_cvtsi32_si128(static_cast<int>(input_shift));
   const __m256i scale = _mm256_set1_epi32(static_cast<int>(output_scale));
   for (; count >= 8; count -= 8) {

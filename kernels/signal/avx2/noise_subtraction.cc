@@ -5,6 +5,7 @@
 
 #include "kernels/signal/avx2/lanes.h"
 #include "kernels/signal/signal_kernels.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -45,10 +46,10 @@ inline __m256i InTurn(uint32_t even, uint32_t odd) {
 
 }  // namespace
 
-extern "C" void orra_u32_filterbank_subtract_ukernel__scalar_x2(
-    size_t count, const uint32_t* input, uint32_t smoothing_even, uint32_t smoothing_odd,
-    uint32_t retain_even, uint32_t retain_odd, uint32_t floor_fraction, uint32_t scale_bits,
-    uint32_t fraction_bits, uint32_t* noise, uint32_t* output) {
+QZ_KERNEL(orra_u32_filterbank_subtract_ukernel__scalar_x2)
+(size_t count, const uint32_t* input, uint32_t smoothing_even, uint32_t smoothing_odd,
+ uint32_t retain_even, uint32_t retain_odd, uint32_t floor_fraction, uint32_t scale_bits,
+ uint32_t fraction_bits, uint32_t* noise, uint32_t* output) {
   const Factors factors = {InTurn(smoothing_even, smoothing_odd), InTurn(retain_even, retain_odd),
                            InTurn(floor_fraction, 0),
                            _mm_cvtsi32_si128(static_cast<int>(scale_bits)),

@@ -5,6 +5,7 @@
 
 #include "kernels/signal/avx2/lanes.h"
 #include "kernels/signal/signal_kernels.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -13,8 +14,8 @@ inline __m256i Power(__m256i bins) { return _mm256_madd_epi16(bins, bins); }
 
 }  // namespace
 
-extern "C" void orra_cs16_vsquareabs_ukernel__neon_mlal_ld128_x8(size_t bytes, const int16_t* input,
-                                                                 uint32_t* output) {
+QZ_KERNEL(orra_cs16_vsquareabs_ukernel__neon_mlal_ld128_x8)
+(size_t bytes, const int16_t* input, uint32_t* output) {
   size_t left = bytes / (2 * sizeof(int16_t));
   for (; left >= 8; left -= 8) {
     const __m256i bins = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(input));

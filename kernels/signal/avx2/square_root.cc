@@ -6,6 +6,7 @@
 #include <immintrin.h>
 
 #include "kernels/signal/signal_kernels.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -54,8 +55,8 @@ inline __m128i Roots(__m256i v, __m128i shift) {
 
 }  // namespace
 
-extern "C" void orra_u64_u32_vsqrtshift_ukernel__scalar_cvtu32_sqrt_cvtu32f64_x1(
-    size_t bytes, const uint64_t* input, uint32_t* output, uint32_t shift) {
+QZ_KERNEL(orra_u64_u32_vsqrtshift_ukernel__scalar_cvtu32_sqrt_cvtu32f64_x1)
+(size_t bytes, const uint64_t* input, uint32_t* output, uint32_t shift) {
   const __m128i shift_count = _mm_cvtsi32_si128(static_cast<int>(shift));
   size_t left = bytes / sizeof(uint64_t);
   for (; left >= 4; left -= 4) {

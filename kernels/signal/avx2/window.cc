@@ -6,6 +6,7 @@
 #include <immintrin.h>
 
 #include "kernels/signal/signal_kernels.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -22,10 +23,9 @@ inline __m256i Load(const int16_t* samples) {
 
 }  // namespace
 
-extern "C" void orra_s16_window_shift12_ukernel__neon_x32(size_t rows, size_t row_bytes,
-                                                          const int16_t* input,
-                                                          const int16_t* weights, int16_t* output,
-                                                          uint32_t /*shift*/) {
+QZ_KERNEL(orra_s16_window_shift12_ukernel__neon_x32)
+(size_t rows, size_t row_bytes, const int16_t* input, const int16_t* weights, int16_t* output,
+ uint32_t /*shift*/) {
   const size_t row_samples = row_bytes / sizeof(int16_t);
   for (size_t row = 0; row < rows; ++row) {
     const int16_t* w = weights;

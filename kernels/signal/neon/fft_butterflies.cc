@@ -10,6 +10,7 @@
 #include "kernels/signal/neon/complex_lanes.h"
 #include "kernels/signal/signal_kernels.h"
 #include "kernels/signal/signal_tables.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -92,11 +93,9 @@ inline void Stage(size_t groups, size_t quarter, int16_t* data, TwiddlesOf twidd
 
 }  // namespace
 
-extern "C" void orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4(size_t butterflies,
-                                                                      size_t /*quarter_bytes*/,
-                                                                      int16_t* data,
-                                                                      const int16_t* /*twiddles*/,
-                                                                      size_t /*twiddle_stride*/) {
+QZ_KERNEL(orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4)
+(size_t butterflies, size_t /*quarter_bytes*/, int16_t* data, const int16_t* /*twiddles*/,
+ size_t /*twiddle_stride*/) {
   for (; butterflies >= 4; butterflies -= 4) {
     FirstStageButterflies(data);
     data += 32;
@@ -109,17 +108,18 @@ extern "C" void orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4(size_t but
   }
 }
 
-extern "C" void orra_cs16_bfly4_samples4_ukernel__neon(size_t groups, size_t /*quarter_bytes*/,
-                                                       int16_t* data, const int16_t* /*twiddles*/,
-                                                       size_t /*twiddle_stride*/) {
+QZ_KERNEL(orra_cs16_bfly4_samples4_ukernel__neon)
+(size_t groups, size_t /*quarter_bytes*/, int16_t* data, const int16_t* /*twiddles*/,
+ size_t /*twiddle_stride*/) {
   const auto& rows = vrd_table_fft256_samples4_twiddle;
   const Twiddles w = {Load(rows[0][0]), Load(rows[1][0]), Load(rows[2][0])};
   constexpr size_t kQuarter = 8;  // the only length that the stage is for
   Stage(groups, kQuarter, data, [&](size_t) { return w; });
 }
 
-extern "C" void orra_cs16_bfly4_ukernel__neon_x4(size_t groups, size_t quarter_bytes, int16_t* data,
-                                                 const int16_t* twiddles, size_t twiddle_stride) {
+QZ_KERNEL(orra_cs16_bfly4_ukernel__neon_x4)
+(size_t groups, size_t quarter_bytes, int16_t* data, const int16_t* twiddles,
+ size_t twiddle_stride) {
   const size_t quarter = quarter_bytes / sizeof(int16_t);
   const size_t stride = twiddle_stride / sizeof(int16_t);
   if (stride == 2) {

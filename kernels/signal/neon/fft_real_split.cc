@@ -9,6 +9,7 @@
 #include "kernels/signal/neon/complex_lanes.h"
 #include "kernels/signal/signal_arithmetic.h"
 #include "kernels/signal/signal_kernels.h"
+#include "kernels/variant.h"
 
 using qz::signal::Complex;
 using qz::signal::ComplexLanes;
@@ -20,8 +21,8 @@ using qz::signal::Store;
 using qz::signal::StoreWrapped;
 using qz::signal::WideComplexLanes;
 
-extern "C" void orra_cs16_fftr_ukernel__asm_aarch32_neon_x4(size_t count, int16_t* data,
-                                                            const int16_t* twiddles) {
+QZ_KERNEL(orra_cs16_fftr_ukernel__asm_aarch32_neon_x4)
+(size_t count, int16_t* data, const int16_t* twiddles) {
   constexpr int16_t kHalf = 16383;  // Q15, just under 1/2
 
   const Complex first = Scaled(data, kHalf);

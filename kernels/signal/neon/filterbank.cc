@@ -6,6 +6,7 @@
 #include <arm_neon.h>
 
 #include "kernels/signal/signal_kernels.h"
+#include "kernels/variant.h"
 
 namespace {
 
@@ -45,11 +46,9 @@ inline uint64x2_t AddSegment(uint64x2_t sums, size_t width, const uint32_t*& inp
 
 }  // namespace
 
-extern "C" void orra_u32_filterbank_accumulate_ukernel__asm_aarch32_neon_x2(size_t rows,
-                                                                            const uint32_t* input,
-                                                                            const uint8_t* widths,
-                                                                            const uint16_t* weights,
-                                                                            uint64_t* output) {
+QZ_KERNEL(orra_u32_filterbank_accumulate_ukernel__asm_aarch32_neon_x2)
+(size_t rows, const uint32_t* input, const uint8_t* widths, const uint16_t* weights,
+ uint64_t* output) {
   uint64x2_t sums = vdupq_n_u64(0);
   for (size_t bin = 0; bin < widths[0]; ++bin) {
     sums = vmlal_u32(sums, vld1_dup_u32(input++), vdup_n_u32(weights[1]));

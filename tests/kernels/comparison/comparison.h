@@ -1,5 +1,5 @@
-// What the lists of kernels are made of: the texts for some processors are held against the plain
-// ones, byte for byte, and what they cost is measured side by side.
+// What the lists of kernels are made of: variants for some processors are compared with the
+// references, byte for byte, and what they cost is measured side by side.
 #pragma once
 
 #include <algorithm>
@@ -13,51 +13,50 @@
 #include <vector>
 
 #include "tests/support/random.h"
+#ifdef QZ_KERNELS_X86_64
+#include "kernels/x86_64/implementations.h"
+#endif
 
 namespace qz::test {
 
-// The texts of a kernel that stand beside each other in this build.
+// The implementations of a kernel that are beside each other in this build, named as
+// kernels/kernel_table.h names them.
 #ifdef QZ_KERNELS_X86_64
-enum Side { kPlain, kPlainForAvx2, kAvx2, kAvx512Vnni, kSides };
-// As rows in kernels/*/CMakeLists.txt name them; the second is the plain text, compiled for AVX2.
-constexpr const char* kSets[kSides] = {"", "", "avx2", "avx512vnni"};
+enum Side { kReference, kReferenceForAvx2, kAvx2, kAvx512Vnni, kSides };
+constexpr const char* kSideNames[kSides] = {"reference", "reference_avx2", "avx2", "avx512vnni"};
 #else
-enum Side { kPlain, kRunning, kSides };
-constexpr const char* kSets[kSides] = {"", QZ_KERNELS};
+enum Side { kReference, kRunning, kSides };
+constexpr const char* kSideNames[kSides] = {"reference", QZ_KERNELS};
 #endif
 
 template <typename Function>
-struct Texts {
+struct Implementations {
   std::string_view name;
-  Function* text[kSides];  // null where there is none
+  Function* of[kSides];
 };
 
-// Defines a kernel's Texts and declares those that have a name of their own.
-// NOLINTBEGIN(bugprone-macro-parentheses): what is declared stands in none.
+// Defines a kernel's Implementations. Where a kernel has no variant for a set of instructions, the
+// table gives what runs instead.
+// NOLINTBEGIN(bugprone-macro-parentheses): names can't be in parentheses.
 #ifdef QZ_KERNELS_X86_64
-#define QZ_TEXTS(texts, kernel)                                                      \
-  extern "C" decltype(kernel) kernel##__plain, kernel##__avx2_plain, kernel##__avx2; \
-  constexpr Texts<decltype(kernel)> texts {                                          \
-#kernel, { kernel##__plain, kernel##__avx2_plain, kernel##__avx2, nullptr }      \
-  }
-#define QZ_TEXTS_AND_AVX512VNNI(texts, kernel)                                               \
-  extern "C" decltype(kernel) kernel##__plain, kernel##__avx2_plain, kernel##__avx2,         \
-      kernel##__avx512vnni;                                                                  \
-  constexpr Texts<decltype(kernel)> texts {                                                  \
-#kernel, { kernel##__plain, kernel##__avx2_plain, kernel##__avx2, kernel##__avx512vnni } \
+#define QZ_IMPLEMENTATIONS(variable, component, kernel)                         \
+  constexpr Implementations<decltype(kernel)> variable {                        \
+#kernel, {                                                                  \
+      kernel##__reference, kernel##__reference_avx2, k##component##Avx2.kernel, \
+          k##component##Avx512Vnni.kernel                                       \
+    }                                                                           \
   }
 #else
-#define QZ_TEXTS(texts, kernel)                \
-  extern "C" decltype(kernel) kernel##__plain; \
-  constexpr Texts<decltype(kernel)> texts {    \
-#kernel, { kernel##__plain, kernel }       \
+#define QZ_IMPLEMENTATIONS(variable, component, kernel)  \
+  extern "C" decltype(kernel) kernel##__reference;       \
+  constexpr Implementations<decltype(kernel)> variable { \
+#kernel, { kernel##__reference, kernel }             \
   }
-#define QZ_TEXTS_AND_AVX512VNNI(texts, kernel) QZ_TEXTS(texts, kernel)
 #endif
 // NOLINTEND(bugprone-macro-parentheses)
 
-// Random numbers of one comparison of a text with the plain one; a failure names those that were
-// picked.
+// Random numbers of one comparison of an implementation with the reference; a failure names those
+// that were picked.
 class CaseRandom : public Random {
  public:
   CaseRandom(uint64_t seed, Side compared) : Random(seed), side(compared) {}
@@ -66,9 +65,9 @@ class CaseRandom : public Random {
     return picked_.back().second;
   }
   std::string Picked() const {
-    std::string text;
-    for (const auto& [name, value] : picked_) text += ", " + (name + (" " + std::to_string(value)));
-    return text;
+    std::string list;
+    for (const auto& [name, value] : picked_) list += ", " + (name + (" " + std::to_string(value)));
+    return list;
   }
 
   const Side side;
@@ -79,8 +78,7 @@ class CaseRandom : public Random {
 
 struct Kernel {
   std::string_view name;
-  std::string_view text;  // its row in the room's CMakeLists.txt
-  // Null where no build has another text than the plain one. A comparison gives what differs, or
+  // Null where no build has a variant. A comparison gives what differs, or
   // nothing; a run is one call as the graphs make it, always on the same data.
   std::string (*compare)(CaseRandom& random) = nullptr;
   void (*run)(Side side) = nullptr;
@@ -95,7 +93,7 @@ constexpr size_t kFreeBytes = 131072;
 uint8_t* EndOfFreePages(size_t bytes);
 
 // A kernel's input: a copy of values, with `readable` random bytes behind them. Right behind those,
-// or else right before the values, is a page that can't be read: a text that does ends the program,
+// or else right before the values, is a page that can't be read: what reads it ends the program,
 // which names kernel and seed. (qemu 7.2's x86 processors trip there over masked loads of AVX2 that
 // read nothing of that page.)
 template <typename T>
@@ -109,23 +107,24 @@ const T* Location(Random& random, const std::vector<T>& values, size_t readable 
   return location;
 }
 
-// Calls both texts with an output each that holds `contents` between random values, so that
-// whatever one text alone writes shows. Empty, or the first value that differs, counted from the
-// output's first.
+// Calls both implementations with an output each that holds `contents` between random values, so
+// that whatever one of them alone writes shows. Empty, or the first value that differs, counted
+// from the output's first.
 template <typename Function, typename T, typename Call>
-std::string Difference(CaseRandom& random, const Texts<Function>& texts,
+std::string Difference(CaseRandom& random, const Implementations<Function>& implementations,
                        const std::vector<T>& contents, const Call& call) {
   constexpr ptrdiff_t kGuard = 64 / sizeof(T);
   std::vector<T> compared = RandomValues<T>(random, contents.size() + 2 * kGuard);
   std::copy(contents.begin(), contents.end(), compared.begin() + kGuard);
-  std::vector<T> plain = compared;
-  call(texts.text[random.side], compared.data() + kGuard);
-  call(texts.text[kPlain], plain.data() + kGuard);
-  const auto [at, plain_at] = std::mismatch(compared.begin(), compared.end(), plain.begin());
+  std::vector<T> reference = compared;
+  call(implementations.of[random.side], compared.data() + kGuard);
+  call(implementations.of[kReference], reference.data() + kGuard);
+  const auto [at, reference_at] =
+      std::mismatch(compared.begin(), compared.end(), reference.begin());
   if (at == compared.end()) return "";
   return "value " + std::to_string(at - compared.begin() - kGuard) + " of the output's " +
-         std::to_string(contents.size()) + " is " + std::to_string(*at) + ", by the plain text " +
-         std::to_string(*plain_at);
+         std::to_string(contents.size()) + " is " + std::to_string(*at) + ", by the reference " +
+         std::to_string(*reference_at);
 }
 
 }  // namespace qz::test

@@ -1,8 +1,9 @@
-// Holds every text of a kernel for some instruction set against the kernel's plain text.
+// Compares every variant of a kernel for some instruction set with the kernel's reference.
 //
-//   kernel_comparison_test [--seed N]   compares; N is where the seeds of the comparisons start
-//   kernel_comparison_test --count      one call of each text between marks; prints their kernels
-//   kernel_comparison_test --time       the time of a call of each text, in interleaved rounds
+//   kernel_comparison_test [--seed N]   compares; N is the seed of the first comparison
+//   kernel_comparison_test --count      calls implementations between marks; prints a line for each
+//                                       kernel: its source, its name and what was called
+//   kernel_comparison_test --time       times calls of all implementations, in interleaved rounds
 
 #include <sys/mman.h>
 #include <unistd.h>
@@ -18,21 +19,21 @@
 #include <set>
 #include <sstream>
 
+#include "kernels/kernel_table.h"
 #include "tests/kernels/comparison/comparison.h"
 #include "tests/support/instruction_mark.h"
 #ifdef QZ_KERNELS_X86_64
-#include "kernels/x86_64/choices.h"
 #include "kernels/x86_64/processor.h"
 #endif
 
 namespace qz::test {
 namespace {
 
-constexpr uint64_t kComparisons = 10000;  // of each text
+constexpr uint64_t kComparisons = 10000;  // of each variant
 constexpr int kNothingToCompareHere =
     77;  // an exit code that CTest takes for a test that was skipped
 
-// Of the places that EndOfFreePages gives.
+// What EndOfFreePages returns.
 std::vector<uint8_t*> ends_of_pages;
 size_t ends_in_use = 0;
 
@@ -40,7 +41,7 @@ size_t ends_in_use = 0;
 char comparison[256];
 
 void OnFault(int signal) {
-  const char reason[] = "a text read or wrote where it may not: ";
+  const char reason[] = "memory that may not be accessed: ";
   [[maybe_unused]] ssize_t written = write(STDERR_FILENO, reason, sizeof reason - 1);
   written = write(STDERR_FILENO, comparison, strnlen(comparison, sizeof comparison));
   std::signal(signal, SIG_DFL);
@@ -57,15 +58,15 @@ bool ProcessorRuns([[maybe_unused]] Side side) {
 #ifdef QZ_KERNELS_X86_64
   const InstructionSet best = BestInstructionSet();
   if (side == kAvx512Vnni) return best == InstructionSet::kAvx512Vnni;
-  if (side != kPlain) return best != InstructionSet::kBaseline;
+  if (side != kReference) return best != InstructionSet::kBaseline;
 #endif
   return true;
 }
 
 // Each comparison has a seed of its own: given as the first, it comes first.
-bool CompareText(const Kernel& kernel, Side side, uint64_t first_seed) {
+bool CompareVariant(const Kernel& kernel, Side side, uint64_t first_seed) {
   for (uint64_t seed = first_seed; seed < first_seed + kComparisons; ++seed) {
-    std::snprintf(comparison, sizeof comparison, "%s of %s, --seed %llu\n", kSets[side],
+    std::snprintf(comparison, sizeof comparison, "%s of %s, --seed %llu\n", kSideNames[side],
                   kernel.name.data(), static_cast<unsigned long long>(seed));
     CaseRandom random(seed, side);
     ends_in_use = 0;
@@ -75,32 +76,39 @@ bool CompareText(const Kernel& kernel, Side side, uint64_t first_seed) {
     return false;
   }
   std::printf("%llu comparisons: %s of %s\n", static_cast<unsigned long long>(kComparisons),
-              kSets[side], kernel.name.data());
+              kSideNames[side], kernel.name.data());
   return true;
 }
 
-// The texts of this build, as SET/NAME, that are not plain.
-std::set<std::string> VectorTexts() {
-  std::istringstream words(QZ_VECTOR_TEXTS);
+const KernelRow& RowOf(const Kernel& kernel) {
+  for (const KernelRow& row : kKernelTable) {
+    if (kernel.name == row.kernel) return row;
+  }
+  std::fprintf(stderr, "kernels/kernel_table.h has no row for %s\n", kernel.name.data());
+  std::exit(EXIT_FAILURE);
+}
+
+// Whether this implementation of a kernel is a variant, not what runs instead of one.
+bool IsVariant(const KernelRow& row, Side side) {
+  const std::string_view name = kSideNames[side];
+  if (name.rfind("reference", 0) == 0) return false;
+  return name == row.neon || name == row.avx2 || name == row.avx512vnni;
+}
+
+// The variants of this build, as SET/SOURCE: by its folders, and by the table of kernels.
+std::set<std::string> VariantsByFolders() {
+  std::istringstream words(QZ_VECTOR_VARIANTS);
   return {std::istream_iterator<std::string>(words), {}};
 }
-
-// Whether the table of choices says the same of a kernel as the rooms' rows do.
-bool ChoiceAgrees([[maybe_unused]] const Kernel& kernel,
-                  [[maybe_unused]] const std::set<std::string>& vector_texts) {
-#ifdef QZ_KERNELS_X86_64
-  const bool has_avx2 = vector_texts.count("avx2/" + std::string(kernel.text)) > 0;
-  const bool has_vnni = vector_texts.count("avx512vnni/" + std::string(kernel.text)) > 0;
-  const ChoiceRow row = has_vnni ? avx512vnni : has_avx2 ? avx2 : avx2_plain;
-  for (const Choice& choice : kChoices) {
-    if (choice.kernel == kernel.name && choice.row == row) return true;
+std::set<std::string> VariantsByTable() {
+  std::set<std::string> variants;
+  for (const KernelRow& row : kKernelTable) {
+    for (int i = kReference + 1; i < kSides; ++i) {
+      const auto side = static_cast<Side>(i);
+      if (IsVariant(row, side)) variants.insert(std::string(kSideNames[side]) + "/" + row.source);
+    }
   }
-  std::printf("kernels/x86_64/choices.h does not say of %s what the rooms' tables do\n",
-              kernel.name.data());
-  return false;
-#else
-  return true;
-#endif
+  return variants;
 }
 
 struct Tally {
@@ -109,82 +117,82 @@ struct Tally {
   bool passed = true;
 };
 
-// The texts of one kernel; takes those that it finds off `unlisted`.
-void CompareKernel(const Kernel& kernel, uint64_t first_seed, std::set<std::string>* unlisted,
-                   Tally* tally) {
-  const std::set<std::string> vector_texts = VectorTexts();
-  tally->passed &= ChoiceAgrees(kernel, vector_texts);
-  size_t own_texts = 0;
-  for (int side = kPlain + 1; side < kSides; ++side) {
-    const std::string text = std::string(kSets[side]) + "/" + std::string(kernel.text);
-    if (vector_texts.count(text) == 0) continue;
-    ++own_texts;
-    unlisted->erase(text);
+// The variants of one kernel.
+void CompareKernel(const Kernel& kernel, uint64_t first_seed, Tally* tally) {
+  size_t variants = 0;
+  for (int i = kReference + 1; i < kSides; ++i) {
+    const auto side = static_cast<Side>(i);
+    if (!IsVariant(RowOf(kernel), side)) continue;
+    ++variants;
     if (kernel.compare == nullptr) {
-      std::printf("%s of %s: no comparison\n", kSets[side], kernel.name.data());
+      std::printf("%s of %s: no comparison\n", kSideNames[side], kernel.name.data());
       tally->passed = false;
-    } else if (!ProcessorRuns(static_cast<Side>(side))) {
-      std::printf("not run by this processor, not compared: %s of %s\n", kSets[side],
+    } else if (!ProcessorRuns(side)) {
+      std::printf("not run by this processor, not compared: %s of %s\n", kSideNames[side],
                   kernel.name.data());
       ++tally->not_run_here;
     } else {
-      tally->passed &= CompareText(kernel, static_cast<Side>(side), first_seed);
+      tally->passed &= CompareVariant(kernel, side, first_seed);
       ++tally->compared;
     }
   }
-  if (own_texts == 0) std::printf("plain text, not compared: %s\n", kernel.name.data());
+  if (variants == 0) std::printf("reference, not compared: %s\n", kernel.name.data());
 }
 
 int CompareAll(uint64_t first_seed) {
   std::printf("--seed %llu\n", static_cast<unsigned long long>(first_seed));
   std::signal(SIGSEGV, OnFault);
   std::signal(SIGBUS, OnFault);
-  std::set<std::string> unlisted = VectorTexts();
   const std::vector<Kernel> kernels = AllKernels();
   Tally tally;
-  for (const Kernel& kernel : kernels) CompareKernel(kernel, first_seed, &unlisted, &tally);
-  for (const std::string& text : unlisted) {
-    std::printf("the text %s has no kernel in the lists\n", text.c_str());
+  for (const Kernel& kernel : kernels) CompareKernel(kernel, first_seed, &tally);
+  if (kernels.size() != std::size(kKernelTable)) {
+    std::printf("the lists hold %zu kernels, expected %zu\n", kernels.size(),
+                std::size(kKernelTable));
+    tally.passed = false;
   }
-  if (kernels.size() != QZ_KERNEL_COUNT) {
-    std::printf("the lists hold %zu kernels, should be %d\n", kernels.size(), QZ_KERNEL_COUNT);
+  if (VariantsByFolders() != VariantsByTable()) {
+    std::printf("kernels/kernel_table.h names other variants than the folders hold\n");
+    tally.passed = false;
   }
-  std::printf("%zu texts of %d kernels compared, %zu not run by this processor\n", tally.compared,
-              QZ_KERNEL_COUNT, tally.not_run_here);
-  const bool complete = kernels.size() == QZ_KERNEL_COUNT && unlisted.empty();
-  if (!tally.passed || !complete) return EXIT_FAILURE;
+  std::printf("%zu variants of %zu kernels compared, %zu not run by this processor\n",
+              tally.compared, kernels.size(), tally.not_run_here);
+  if (!tally.passed) return EXIT_FAILURE;
   if (tally.compared > 0) return EXIT_SUCCESS;
   return tally.not_run_here > 0 ? kNothingToCompareHere : EXIT_FAILURE;
 }
 
-// The sides of a kernel that have a text of their own, or are what such a text has to beat.
+// The sides of a kernel that are variants, or are what such a variant has to beat.
 std::vector<Side> SidesToMeasure(const Kernel& kernel) {
-  const std::set<std::string> vector_texts = VectorTexts();
-  std::vector<Side> sides = {kPlain};
-  for (int i = kPlain + 1; i < kSides; ++i) {
+  if (kernel.run == nullptr) return {};
+  std::vector<Side> sides = {kReference};
+  for (int i = kReference + 1; i < kSides; ++i) {
     const auto side = static_cast<Side>(i);
-    const std::string set = kSets[side];
-    const bool present =
-        set.empty() || vector_texts.count(set + "/" + std::string(kernel.text)) > 0;
-    if (present && ProcessorRuns(side)) sides.push_back(side);
+    bool measured = IsVariant(RowOf(kernel), side);
+#ifdef QZ_KERNELS_X86_64
+    measured = measured || side == kReferenceForAvx2;
+#endif
+    if (measured && ProcessorRuns(side)) sides.push_back(side);
   }
-  return kernel.run == nullptr ? std::vector<Side>() : sides;
+  return sides;
 }
 
-// Two marks in a row first, for what a mark itself costs. Each text has run once before it counts.
+// Two marks in a row first, for what a mark itself costs. Each has run once before it counts.
 void CountAll() {
   Mark();
   Mark();
   for (const Kernel& kernel : AllKernels()) {
     const std::vector<Side> sides = SidesToMeasure(kernel);
-    if (sides.empty()) continue;
+    if (sides.size() < 2) continue;
     for (const Side side : sides) kernel.run(side);
     Mark();
     for (const Side side : sides) {
       kernel.run(side);
       Mark();
     }
-    std::printf("%s %s\n", kernel.text.data(), kernel.name.data());
+    std::printf("%s %s", RowOf(kernel).source, kernel.name.data());
+    for (const Side side : sides) std::printf(" %s", kSideNames[side]);
+    std::printf("\n");
   }
 }
 
@@ -209,8 +217,8 @@ void TimeAll() {
       }
     }
     if (sides.empty()) continue;
-    std::printf("%s %s", kernel.text.data(), kernel.name.data());
-    for (int side = kPlain; side < kSides; ++side) {
+    std::printf("%s %s", RowOf(kernel).source, kernel.name.data());
+    for (int side = kReference; side < kSides; ++side) {
       std::sort(times[side].begin(), times[side].end());
       std::printf(" %.1f", times[side].empty() ? 0 : times[side][kRounds / 10]);
     }
@@ -247,7 +255,7 @@ int main(int argc, char** argv) {
   } else if (arguments.size() == 1 && arguments[0] == "--time") {
     qz::test::TimeAll();
   } else {
-    std::fprintf(stderr, "arguments should be none, --seed N, --count or --time\n");
+    std::fprintf(stderr, "expected no arguments, --seed N, --count or --time\n");
     return EXIT_FAILURE;
   }
   return EXIT_SUCCESS;

@@ -8,15 +8,15 @@
 namespace qz::test {
 namespace {
 
-QZ_TEXTS_AND_AVX512VNNI(
-    kGemm, orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35);
-QZ_TEXTS_AND_AVX512VNNI(
-    kIndirectGemm, orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35);
-QZ_TEXTS(kFixedPointGemm,
-         orra_qs8_gemm_minmax_rndnu_ukernel_1x8__asm_aarch32_neon_mlal_lane_cortex_a7);
-QZ_TEXTS_AND_AVX512VNNI(
-    kDepthwise, orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35);
-QZ_TEXTS(kMaxPool, orra_s8_maxpool_minmax_ukernel_2p2x__neon_c16);
+QZ_IMPLEMENTATIONS(kGemm, Quantised,
+                   orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35);
+QZ_IMPLEMENTATIONS(kIndirectGemm, Quantised,
+                   orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35);
+QZ_IMPLEMENTATIONS(kFixedPointGemm, Quantised,
+                   orra_qs8_gemm_minmax_rndnu_ukernel_1x8__asm_aarch32_neon_mlal_lane_cortex_a7);
+QZ_IMPLEMENTATIONS(kDepthwise, Quantised,
+                   orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35);
+QZ_IMPLEMENTATIONS(kMaxPool, Quantised, orra_s8_maxpool_minmax_ukernel_2p2x__neon_c16);
 
 constexpr size_t kReadAhead = 7;
 constexpr size_t kPoolReadAhead = 15;
@@ -28,8 +28,8 @@ const uint8_t* OffsetLayer(Random& random, size_t inputs, size_t columns, size_t
   return Location(random, layer.Packed(with_scales), random.Next() % 2);
 }
 
-// Now and then more rows, columns or products in a sum than a text that unpacks them has room for
-// at a time.
+// Now and then more rows, columns or products in a sum than an implementation that unpacks them
+// has space for at a time.
 struct MatrixShape {
   explicit MatrixShape(CaseRandom& random, size_t taps = 1)
       : large(random.Next() % 16),
@@ -78,7 +78,7 @@ struct RowList {
 };
 
 // Any rows, or those of a convolution, where each tap's rows are the ones after those of the tap
-// before: texts may make use of that. A last tile names rows that are not asked for.
+// before: implementations may make use of that. A last tile names rows that are not asked for.
 std::string CompareIndirectGemm(CaseRandom& random) {
   const size_t taps = random.Pick("taps", 1, 4), tap_bytes = 4 * taps * sizeof(const int8_t*);
   const MatrixShape s(random, taps);
@@ -167,33 +167,33 @@ constexpr auto kRowList = [] {
 
 std::vector<Kernel> QuantisedKernels() {
   return {
-      {kGemm.name, "gemm", CompareGemm,
+      {kGemm.name, CompareGemm,
        [](Side side) {
-         kGemm.text[side](kGemmRows, kChannels, 48, in_rows, 48, weights, out_rows, kChannels, 8,
-                          &kParams);
+         kGemm.of[side](kGemmRows, kChannels, 48, in_rows, 48, weights, out_rows, kChannels, 8,
+                        &kParams);
        }},
-      {kIndirectGemm.name, "indirect_gemm", CompareIndirectGemm,
+      {kIndirectGemm.name, CompareIndirectGemm,
        [](Side side) {
-         kIndirectGemm.text[side](kIndirectGemmRows, kChannels, kChannels, 12 * sizeof kRowList[0],
-                                  kRowList.data(), weights, out_rows, kChannels, 8, 0, nullptr,
-                                  &kParams);
+         kIndirectGemm.of[side](kIndirectGemmRows, kChannels, kChannels, 12 * sizeof kRowList[0],
+                                kRowList.data(), weights, out_rows, kChannels, 8, 0, nullptr,
+                                &kParams);
        }},
-      {kFixedPointGemm.name, "fixed_point_gemm", CompareFixedPointGemm,
+      {kFixedPointGemm.name, CompareFixedPointGemm,
        [](Side side) {
-         kFixedPointGemm.text[side](1, 64, kChannels, in_rows, kChannels, weights, out_rows, 64, 8,
-                                    &kFixedParams);
+         kFixedPointGemm.of[side](1, 64, kChannels, in_rows, kChannels, weights, out_rows, 64, 8,
+                                  &kFixedParams);
        }},
-      {kDepthwise.name, "depthwise", CompareDepthwise,
+      {kDepthwise.name, CompareDepthwise,
        [](Side side) {
-         kDepthwise.text[side](48, 380, kRowList.data(), weights, out_rows, sizeof kRowList[0], 0,
-                               0, nullptr, &kParams);
+         kDepthwise.of[side](48, 380, kRowList.data(), weights, out_rows, sizeof kRowList[0], 0, 0,
+                             nullptr, &kParams);
        }},
-      {kMaxPool.name, "max_pool", CompareMaxPool,
+      {kMaxPool.name, CompareMaxPool,
        [](Side side) {
-         kMaxPool.text[side](190, 2, kChannels, kRowList.data(), 0, out_rows, 0, 0, &kClamp);
+         kMaxPool.of[side](190, 2, kChannels, kRowList.data(), 0, out_rows, 0, 0, &kClamp);
        }},
-      {"orra_qs8_f32_vcvt_ukernel__neon_x32", "conversion"},
-      {"orra_x8_lut_ukernel__scalar_x2", "lookup"},
+      {"orra_qs8_f32_vcvt_ukernel__neon_x32"},
+      {"orra_x8_lut_ukernel__scalar_x2"},
   };
 }
 

@@ -7,16 +7,18 @@
 namespace qz::test {
 namespace {
 
-QZ_TEXTS(kWindow, orra_s16_window_shift12_ukernel__neon_x32);
-QZ_TEXTS(kFirstStage, orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4);
-QZ_TEXTS(kSecondStage, orra_cs16_bfly4_samples4_ukernel__neon);
-QZ_TEXTS(kLaterStage, orra_cs16_bfly4_ukernel__neon_x4);
-QZ_TEXTS(kSplit, orra_cs16_fftr_ukernel__asm_aarch32_neon_x4);
-QZ_TEXTS(kPower, orra_cs16_vsquareabs_ukernel__neon_mlal_ld128_x8);
-QZ_TEXTS(kFilterbank, orra_u32_filterbank_accumulate_ukernel__asm_aarch32_neon_x2);
-QZ_TEXTS(kSquareRoot, orra_u64_u32_vsqrtshift_ukernel__scalar_cvtu32_sqrt_cvtu32f64_x1);
-QZ_TEXTS(kNoiseSubtraction, orra_u32_filterbank_subtract_ukernel__scalar_x2);
-QZ_TEXTS(kLogarithm, orra_u32_vlog_ukernel__scalar_x1);
+QZ_IMPLEMENTATIONS(kWindow, Signal, orra_s16_window_shift12_ukernel__neon_x32);
+QZ_IMPLEMENTATIONS(kFirstStage, Signal, orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4);
+QZ_IMPLEMENTATIONS(kSecondStage, Signal, orra_cs16_bfly4_samples4_ukernel__neon);
+QZ_IMPLEMENTATIONS(kLaterStage, Signal, orra_cs16_bfly4_ukernel__neon_x4);
+QZ_IMPLEMENTATIONS(kSplit, Signal, orra_cs16_fftr_ukernel__asm_aarch32_neon_x4);
+QZ_IMPLEMENTATIONS(kPower, Signal, orra_cs16_vsquareabs_ukernel__neon_mlal_ld128_x8);
+QZ_IMPLEMENTATIONS(kFilterbank, Signal,
+                   orra_u32_filterbank_accumulate_ukernel__asm_aarch32_neon_x2);
+QZ_IMPLEMENTATIONS(kSquareRoot, Signal,
+                   orra_u64_u32_vsqrtshift_ukernel__scalar_cvtu32_sqrt_cvtu32f64_x1);
+QZ_IMPLEMENTATIONS(kNoiseSubtraction, Signal, orra_u32_filterbank_subtract_ukernel__scalar_x2);
+QZ_IMPLEMENTATIONS(kLogarithm, Signal, orra_u32_vlog_ukernel__scalar_x1);
 
 // A shaped fill, or values most of which are at either extreme, in no order.
 std::vector<int16_t> Samples(Random& random, size_t count) {
@@ -154,8 +156,8 @@ constexpr std::array<T, 48> Scattered(int bits) {
 }
 
 // The front end's data. What they hold changes nothing that is counted or timed, but for the
-// widths, which are the front end's, and for channels of 0, for which the plain texts have less to
-// do.
+// widths, which are the front end's, and for channels of 0, for which the references have less
+// to do.
 int16_t samples[514];
 int16_t table[2 * 256];
 uint16_t weights[2 * 237];
@@ -172,34 +174,32 @@ constexpr uint8_t kWidths[49] = {1, 1, 2, 1, 2, 1, 2, 2, 1, 2,  2,  2,  3,  2,  
 
 std::vector<Kernel> SignalKernels() {
   return {
-      {kWindow.name, "window", CompareWindow,
-       [](Side side) { kWindow.text[side](1, 800, samples, table, samples, 12); }},
-      {"orra_s16_rmaxabs_ukernel__neon_x32", "peak"},
-      {"orra_i16_vlshift_ukernel__neon_x32", "left_shift"},
-      {kFirstStage.name, "fft_butterflies", CompareFirstStage,
-       [](Side side) { kFirstStage.text[side](64, 0, samples, nullptr, 0); }},
-      {kSecondStage.name, "fft_butterflies", CompareSecondStage,
-       [](Side side) { kSecondStage.text[side](16, 16, samples, nullptr, 0); }},
-      {kLaterStage.name, "fft_butterflies", CompareLaterStage,
+      {kWindow.name, CompareWindow,
+       [](Side side) { kWindow.of[side](1, 800, samples, table, samples, 12); }},
+      {"orra_s16_rmaxabs_ukernel__neon_x32"},
+      {"orra_i16_vlshift_ukernel__neon_x32"},
+      {kFirstStage.name, CompareFirstStage,
+       [](Side side) { kFirstStage.of[side](64, 0, samples, nullptr, 0); }},
+      {kSecondStage.name, CompareSecondStage,
+       [](Side side) { kSecondStage.of[side](16, 16, samples, nullptr, 0); }},
+      {kLaterStage.name, CompareLaterStage,
        [](Side side) {
-         kLaterStage.text[side](4, 64, samples, table, 16);
-         kLaterStage.text[side](1, 256, samples, table, 4);
+         kLaterStage.of[side](4, 64, samples, table, 16);
+         kLaterStage.of[side](1, 256, samples, table, 4);
        }},
-      {kSplit.name, "fft_real_split", CompareSplit,
-       [](Side side) { kSplit.text[side](256, samples, table); }},
-      {kPower.name, "power_spectrum", ComparePower,
-       [](Side side) { kPower.text[side](948, samples, levels); }},
-      {kFilterbank.name, "filterbank", CompareFilterbank,
-       [](Side side) { kFilterbank.text[side](48, levels, kWidths, weights, energies); }},
-      {kSquareRoot.name, "square_root", CompareSquareRoot,
-       [](Side side) { kSquareRoot.text[side](384, kEnergies.data(), roots, 1); }},
-      {kNoiseSubtraction.name, "noise_subtraction", CompareNoiseSubtraction,
+      {kSplit.name, CompareSplit, [](Side side) { kSplit.of[side](256, samples, table); }},
+      {kPower.name, ComparePower, [](Side side) { kPower.of[side](948, samples, levels); }},
+      {kFilterbank.name, CompareFilterbank,
+       [](Side side) { kFilterbank.of[side](48, levels, kWidths, weights, energies); }},
+      {kSquareRoot.name, CompareSquareRoot,
+       [](Side side) { kSquareRoot.of[side](384, kEnergies.data(), roots, 1); }},
+      {kNoiseSubtraction.name, CompareNoiseSubtraction,
        [](Side side) {
-         kNoiseSubtraction.text[side](48, kAmplitudes.data(), 655, 655, 15729, 15729, 819, 0, 14,
-                                      noise, levels);
+         kNoiseSubtraction.of[side](48, kAmplitudes.data(), 655, 655, 15729, 15729, 819, 0, 14,
+                                    noise, levels);
        }},
-      {kLogarithm.name, "logarithm", CompareLogarithm,
-       [](Side side) { kLogarithm.text[side](48, kAmplitudes.data(), 3, 16, features); }},
+      {kLogarithm.name, CompareLogarithm,
+       [](Side side) { kLogarithm.of[side](48, kAmplitudes.data(), 3, 16, features); }},
   };
 }
 

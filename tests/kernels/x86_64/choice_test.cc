@@ -1,24 +1,9 @@
-// What the loader binds each kernel's name to, by what the compiler's own library says of the
+// Which implementations are chosen, compared with what the compiler's own library knows of the
 // processor.
 
+#include "kernels/x86_64/choice.h"
+
 #include <gtest/gtest.h>
-
-#include "kernels/quantised/quantised_kernels.h"
-#include "kernels/signal/signal_kernels.h"
-#include "kernels/x86_64/choices.h"
-#include "kernels/x86_64/processor.h"
-
-#define QZ_DECLARE(kernel, row)                                \
-  extern "C" decltype(kernel) kernel##__plain, kernel##__avx2; \
-  extern "C" decltype(kernel)* kernel##__choice();
-QZ_SIGNAL_CHOICES(QZ_DECLARE)
-QZ_QUANTISED_CHOICES(QZ_DECLARE)
-
-#define QZ_DECLARE_avx2(kernel)
-#define QZ_DECLARE_avx2_plain(kernel)
-#define QZ_DECLARE_avx512vnni(kernel) extern "C" decltype(kernel) kernel##__avx512vnni;
-#define QZ_DECLARE_BEST(kernel, row) QZ_DECLARE_##row(kernel)
-QZ_QUANTISED_CHOICES(QZ_DECLARE_BEST)
 
 namespace qz {
 namespace {
@@ -30,22 +15,29 @@ InstructionSet ByTheCompiler() {
   return vnni ? InstructionSet::kAvx512Vnni : InstructionSet::kAvx2;
 }
 
-TEST(Choice, TheProcessorIsKnown) { EXPECT_EQ(BestInstructionSet(), ByTheCompiler()); }
+struct Kernels {
+  void (*kernel)(InstructionSet*);
+};
+template <InstructionSet set>
+void Kernel(InstructionSet* called) {
+  *called = set;
+}
+constexpr Kernels kSets[] = {{Kernel<InstructionSet::kBaseline>},
+                             {Kernel<InstructionSet::kAvx2>},
+                             {Kernel<InstructionSet::kAvx512Vnni>}};
 
-#define QZ_BEST_avx2(kernel) kernel##__avx2
-#define QZ_BEST_avx2_plain(kernel) kernel##__avx2
-#define QZ_BEST_avx512vnni(kernel) kernel##__avx512vnni
-// By instruction set.
-#define QZ_EXPECT(kernel, row)                                                                  \
-  {                                                                                             \
-    decltype(kernel)* const texts[] = {kernel##__plain, kernel##__avx2, QZ_BEST_##row(kernel)}; \
-    EXPECT_EQ(kernel##__choice(), texts[static_cast<size_t>(best)]) << #kernel;                 \
+extern const Choice<Kernels> choice;
+constexpr Kernels kFirstCalls = {FirstCall<choice, &Kernels::kernel>::Call};
+std::atomic<size_t> chosen;
+constexpr Choice<Kernels> choice = {{&kFirstCalls, &kSets[0], &kSets[1], &kSets[2]}, chosen};
+
+TEST(Choice, IsThatOfTheProcessorFromTheFirstCallOn) {
+  for (int call = 0; call < 2; ++call) {
+    auto called = static_cast<InstructionSet>(-1);
+    choice.Get().kernel(&called);
+    EXPECT_EQ(called, ByTheCompiler());
+    EXPECT_NE(&choice.Get(), &kFirstCalls);
   }
-
-TEST(Choice, EveryKernelRunsTheTextOfItsRow) {
-  const InstructionSet best = ByTheCompiler();
-  QZ_SIGNAL_CHOICES(QZ_EXPECT)
-  QZ_QUANTISED_CHOICES(QZ_EXPECT)
 }
 
 }  // namespace

@@ -1,5 +1,5 @@
 #!/usr/bin/env python3
-"""vector_symbols_test.py NM TEXT_NAMES ARCHIVE...: what the libraries of texts for larger instruction sets define.
+"""vector_symbols_test.py NM KERNEL_TABLE ARCHIVE...: what libraries for larger instruction sets define.
 
 A function that several files share may be defined in each; the linker keeps any one of them. If that is the one
 compiled for AVX2, a processor without it stops at an illegal instruction. So these libraries may define kernels under
@@ -25,8 +25,8 @@ def faults(nm, kernels, archive):
 
 
 def main():
-    nm, text_names, *archives = sys.argv[1:]
-    kernels = re.findall(r"^#define (\w+) QZ_TEXT", pathlib.Path(text_names).read_text(), re.MULTILINE)
+    nm, kernel_table, *archives = sys.argv[1:]
+    kernels = re.findall(r"^ROW\(.* (orra_\w+)\)", pathlib.Path(kernel_table).read_text(), re.MULTILINE)
     found = [fault for archive in archives for fault in faults(nm, kernels, archive)]
     print("\n".join(found) or f"{len(archives)} libraries define kernels only")
     sys.exit(1 if found or not archives or not kernels else 0)
