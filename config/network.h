@@ -90,6 +90,9 @@ constexpr std::array<Operator, kOperatorCount> MakeOperators() {
 }
 inline constexpr std::array<Operator, kOperatorCount> kOperators = MakeOperators();
 inline constexpr Tensor kScores = kOperators.back().output;
+inline constexpr Operator kLogisticOperator = kOperators[kOperatorCount - 2];
+constexpr size_t kLogitOperator =
+    kOperatorCount - 3;  // its output is the logistic function's input
 
 constexpr size_t MakeArenaBytes() {
   size_t bytes = kWindow.End();
@@ -143,8 +146,8 @@ static_assert(NetworkHolds(),
 static_assert(kNetwork[0].placement == Placement::kStart, "the window lies behind its output");
 static_assert(kScores.rows == 1 && kScores.channels == kClasses &&
                   kOperators.back().kind == OperatorKind::kDequantise &&
-                  kOperators[kOperatorCount - 2].kind == OperatorKind::kLogistic &&
-                  kOperators[kOperatorCount - 3].kind == OperatorKind::kFullyConnected,
+                  kLogisticOperator.kind == OperatorKind::kLogistic &&
+                  kOperators[kLogitOperator].kind == OperatorKind::kFullyConnected,
               "a score a class, by the logistic function");
 static_assert(kOperators.back().frames_seen == kWindowFrames &&
                   kOperators.back().frame_step == kFramesBetweenRuns,

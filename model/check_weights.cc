@@ -30,13 +30,13 @@ class TableChecker {
   }
 
   void Report(const char* what, int column, const std::string& location, const std::string& value,
-              const std::string& right) {
+              const std::string& expectation) {
     findings_.push_back(std::string(table_.name) + (depthwise() ? ", group " : ", block ") +
                         std::to_string(column / table_.BlockColumns()) + ": the " + what + " of " +
-                        ColumnName(column) + location + " is " + value + "; " + right + ".");
+                        ColumnName(column) + location + " is " + value + "; " + expectation + ".");
   }
 
-  // Calls visit(weight, place) for every weight of a column.
+  // Calls visit(weight, location) for every weight of a column.
   template <typename Visit>
   void ForEachWeight(int column, Visit visit) const {
     for (int tap = 0; tap < table_.taps; ++tap) {
@@ -54,43 +54,42 @@ class TableChecker {
     ForEachWeight(column, [&](int weight, const std::string& location) {
       sum += weight;
       if (weight == -128) {
-        Report("weight", column, location, "-128", "weights lie from -127 to 127");
+        Report("weight", column, location, "-128", "expected -127 to 127");
       }
     });
     if (depthwise()) CheckDepthwiseBias(column, 128 * sum);
     if (table_.HasScales()) CheckScale(column);
   }
 
-  void CheckDepthwiseBias(int column, int right) {
+  void CheckDepthwiseBias(int column, int expected) {
     const int32_t bias = Load<int32_t>(model_, table_.BiasOffset(column));
-    if (bias == right) return;
+    if (bias == expected) return;
     Report("bias", column, "", std::to_string(bias),
-           "128 x the sum of its weights, " + std::to_string(right) + ", would be right");
+           "expected " + std::to_string(expected) + ", 128 x the sum of its weights");
   }
 
   void CheckScale(int column) {
     const float scale = Load<float>(model_, table_.ScaleOffset(column));
     if (!std::isfinite(scale) || scale < 0) {
-      Report("scale", column, "", ExactText(scale), "scales are finite and not negative");
+      Report("scale", column, "", ExactText(scale), "expected finite and not negative");
     } else if (table_.fixed_scale != 0 && scale != table_.fixed_scale) {
-      Report("scale", column, "", ExactText(scale),
-             ExactText(table_.fixed_scale) + " would be right");
+      Report("scale", column, "", ExactText(scale), "expected " + ExactText(table_.fixed_scale));
     }
   }
 
   void CheckPadding(int column) {
-    const std::string right = ColumnName(column) + " is padding (" +
-                              std::to_string(table_.outputs) + " are real) and holds 0";
+    const std::string expectation = "expected 0: " + ColumnName(column) + " is padding (" +
+                                    std::to_string(table_.outputs) + " are real)";
     const int32_t bias = Load<int32_t>(model_, table_.BiasOffset(column));
-    if (bias != 0) Report("bias", column, "", std::to_string(bias), right);
+    if (bias != 0) Report("bias", column, "", std::to_string(bias), expectation);
     ForEachWeight(column, [&](int weight, const std::string& location) {
-      if (weight != 0) Report("weight", column, location, std::to_string(weight), right);
+      if (weight != 0) Report("weight", column, location, std::to_string(weight), expectation);
     });
     if (!table_.HasScales()) return;
     // By its bits: padding is zero bytes, and a negative zero is not.
     if (Load<uint32_t>(model_, table_.ScaleOffset(column)) != 0) {
       Report("scale", column, "", ExactText(Load<float>(model_, table_.ScaleOffset(column))),
-             right);
+             expectation);
     }
   }
 
@@ -104,8 +103,8 @@ class TableChecker {
 std::vector<std::string> CheckWeights(const PackedModel& model) {
   std::vector<std::string> findings;
   if (model.size() != kModelBytes) {
-    findings.push_back("The packed model has " + std::to_string(model.size()) + " bytes; " +
-                       std::to_string(kModelBytes) + " would be right.");
+    findings.push_back("The packed model has " + std::to_string(model.size()) +
+                       " bytes; expected " + std::to_string(kModelBytes) + ".");
     return findings;
   }
   for (const TableLayout& table : kTables) TableChecker(model, table, findings).Run();

@@ -9,19 +9,19 @@
 
 namespace qz::model {
 
-// Every finding as one sentence that names the table, the block (or group), the place, its value
-// and what would be right; none for a good model. A model of the wrong size yields that one
-// finding. Findings come in file order of their tables and columns.
+// Every finding as one sentence that names the table, the block (or group), the location, its value
+// and what was expected; none for a valid model. A model of another size yields that one finding.
+// Findings come in file order of their tables and columns.
 //
-// A good model has 86,000 bytes; weights from -127 to 127; zeros in all places beyond the real
-// columns; finite scales that are not negative; and in the depthwise tables the table's fixed scale
-// and the bias 128 x the sum of the channel's weights (a real bias of 0 at input zero point -128).
+// A valid model has kModelBytes; weights from -127 to 127; zeros beyond the real columns; finite
+// scales that are not negative; and in the depthwise tables the table's fixed scale and the bias
+// 128 x the sum of the channel's weights (a real bias of 0 at input zero point -128).
 std::vector<std::string> CheckWeights(const PackedModel& model);
 
-// The findings in one table of a model of 86,000 bytes.
+// The findings in one table of a model of kModelBytes.
 std::vector<std::string> CheckTable(const PackedModel& model, const TableLayout& table);
 
-// With nine significant digits, which tell any two float32 apart.
+// With nine significant digits, which distinguish any two float32.
 std::string ExactText(float value);
 
 // One line per finding, each begun by `file`; from `cap` on only their number.

@@ -6,6 +6,7 @@
 #include <string>
 
 #include "model/check_weights.h"
+#include "model/describe.h"
 #include "model/labels.h"
 #include "model/model_files.h"
 #include "model/synthetic_model.h"
@@ -14,19 +15,20 @@ namespace qz::model {
 namespace {
 
 constexpr char kUsage[] =
-    "usage: qz-model-tool synthetic --seed N -o FILE    write a stand-in for trained tables\n"
-    "       qz-model-tool check FILE                  refuse a packed model that is not sound\n"
-    "       qz-model-tool labels FILE                 refuse wrong labels of a model's outputs\n"
-    "       qz-model-tool embed FILE -o HEADER        turn a sound packed model into a C++ header\n"
+    "usage: qz-model-tool synthetic --seed N -o FILE  write a synthetic model\n"
+    "       qz-model-tool check FILE                check a packed model\n"
+    "       qz-model-tool labels FILE               check the labels of a model's outputs\n"
+    "       qz-model-tool embed FILE -o HEADER      turn a valid packed model into a C++ header\n"
+    "       qz-model-tool describe -o FILE          write the detector's description as JSON\n"
     "exit codes: 0 fine, 1 findings, 2 wrong usage, 3 a file that cannot be read or written\n";
 
-int Usage(const std::string& trouble) {
-  std::fprintf(stderr, "qz-model-tool: %s\n%s", trouble.c_str(), kUsage);
+int Usage(const std::string& error) {
+  std::fprintf(stderr, "qz-model-tool: %s\n%s", error.c_str(), kUsage);
   return kWrongUsage;
 }
 
 struct Arguments {
-  std::string trouble;  // empty when the command line is understood
+  std::string error;  // empty when the command line is understood
   std::string file;
   std::string output;
   std::string seed;
@@ -41,15 +43,15 @@ Arguments Parse(const std::vector<std::string>& words) {
     if (word == "-o" || word == "--seed") {
       value = word == "-o" ? &arguments.output : &arguments.seed;
       if (++i == words.size()) {
-        arguments.trouble = word + " needs a value";
+        arguments.error = word + " needs a value";
         return arguments;
       }
     } else if (!word.empty() && word[0] == '-') {
-      arguments.trouble = "unknown option " + word;
+      arguments.error = "unknown option " + word;
       return arguments;
     }
     if (!value->empty() || words[i].empty()) {
-      arguments.trouble = "unexpected argument '" + words[i] + "'";
+      arguments.error = "unexpected argument '" + words[i] + "'";
       return arguments;
     }
     *value = words[i];
@@ -118,17 +120,26 @@ int Embed(const Arguments& arguments) {
   return kSuccess;
 }
 
+int Describe(const Arguments& arguments) {
+  if (arguments.output.empty() || !arguments.file.empty() || !arguments.seed.empty()) {
+    return Usage("describe needs -o FILE");
+  }
+  WriteWholeFile(arguments.output, DescriptionJson());
+  return kSuccess;
+}
+
 }  // namespace
 
 int RunModelCommand(const std::vector<std::string>& words) {
   const std::string command = words.empty() ? "" : words[0];
   const Arguments arguments = Parse(words);
   try {
-    if (!arguments.trouble.empty()) return Usage(arguments.trouble);
+    if (!arguments.error.empty()) return Usage(arguments.error);
     if (command == "synthetic") return Synthetic(arguments);
     if (command == "check") return Check(arguments);
     if (command == "labels") return CheckLabels(arguments);
     if (command == "embed") return Embed(arguments);
+    if (command == "describe") return Describe(arguments);
     return Usage(command.empty() ? "no subcommand" : "unknown subcommand '" + command + "'");
   } catch (const std::exception& error) {
     std::fprintf(stderr, "qz-model-tool: %s\n", error.what());

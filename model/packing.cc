@@ -24,7 +24,7 @@ size_t WeightIndex(const TableLayout& table, int tap, int input, int output) {
          static_cast<size_t>(output);
 }
 
-// The place of a weight, with the indices that the array has.
+// The location of a weight, with the indices that the array has.
 std::string WeightLocation(const TableLayout& table, int tap, int input, int output) {
   std::string index;
   if (table.taps > 1) index += std::to_string(tap) + ",";
@@ -45,10 +45,10 @@ class TablePacker {
 
   void Run() {
     const size_t outputs = static_cast<size_t>(table_.outputs);
-    const bool sized = HasSize("weight", arrays_.weight.size(), WeightCount(table_)) &
-                       HasSize("bias", arrays_.bias.size(), outputs) &
-                       HasSize("scale", arrays_.scale.size(), table_.HasScales() ? outputs : 0);
-    if (!sized) return;
+    const bool weights = HasSize("weight", arrays_.weight.size(), WeightCount(table_));
+    const bool biases = HasSize("bias", arrays_.bias.size(), outputs);
+    const bool scales = HasSize("scale", arrays_.scale.size(), table_.HasScales() ? outputs : 0);
+    if (!weights || !biases || !scales) return;
     for (int output = 0; output < table_.outputs; ++output) {
       PackBias(output, PackWeights(output));
       if (table_.HasScales()) PackScale(output);
@@ -56,14 +56,14 @@ class TablePacker {
   }
 
  private:
-  void Report(const std::string& what, const std::string& right) {
-    findings_.push_back(what + "; " + right + ".");
+  void Report(const std::string& what, const std::string& expectation) {
+    findings_.push_back(what + "; " + expectation + ".");
   }
 
-  bool HasSize(const char* array, size_t size, size_t right) {
-    if (size == right) return true;
+  bool HasSize(const char* array, size_t size, size_t expected) {
+    if (size == expected) return true;
     Report(std::string(table_.name) + "." + array + " has " + std::to_string(size) + " values",
-           std::to_string(right) + " would be right");
+           "expected " + std::to_string(expected));
     return false;
   }
 
@@ -74,8 +74,7 @@ class TablePacker {
       for (int input = 0; input < table_.inputs; ++input) {
         const int8_t weight = arrays_.weight[WeightIndex(table_, tap, input, output)];
         if (weight == -128) {
-          Report(WeightLocation(table_, tap, input, output) + " is -128",
-                 "weights lie from -127 to 127");
+          Report(WeightLocation(table_, tap, input, output) + " is -128", "expected -127 to 127");
         }
         Store(model_, table_.WeightOffset(tap, input, output), weight);
         sum += weight;
@@ -89,7 +88,7 @@ class TablePacker {
     const std::string what =
         Location(table_, "bias", std::to_string(output)) + " is " + std::to_string(bias);
     if (table_.IsDepthwise() && bias != 0) {
-      Report(what, "operator " + std::to_string(table_.op) + " has no biases: 0 would be right");
+      Report(what, "operator " + std::to_string(table_.op) + " has no biases: expected 0");
     }
     const int64_t offset = int64_t{table_.input_zero_point} * sum;
     const int64_t folded = bias - offset;
@@ -106,9 +105,9 @@ class TablePacker {
     const std::string what =
         Location(table_, "scale", std::to_string(output)) + " is " + ExactText(scale);
     if (!std::isfinite(scale) || scale < 0) {
-      Report(what, "scales are finite and not negative");
+      Report(what, "expected finite and not negative");
     } else if (table_.fixed_scale != 0 && scale != table_.fixed_scale) {
-      Report(what, ExactText(table_.fixed_scale) + " would be right");
+      Report(what, "expected " + ExactText(table_.fixed_scale));
     }
     Store(model_, table_.ScaleOffset(output), scale);
   }

@@ -28,8 +28,8 @@ constexpr size_t WeightCount(const TableLayout& table) {
          static_cast<size_t>(table.outputs);
 }
 
-// Arrays that make no sound model. Every finding is one sentence that names the array, the index,
-// the value and what would be right, in the order of the tables; there is at least one.
+// Arrays that make no valid model. Every finding is one sentence that names the array, the index,
+// the value and what was expected, in the order of the tables; there is at least one.
 class PackingError : public std::runtime_error {
  public:
   explicit PackingError(std::vector<std::string> findings);

@@ -1,5 +1,6 @@
-// The network evaluated plainly from a packed model: a second opinion beside the module's graph,
-// bit-exact with it, sharing no code with it. Clear rather than fast (some milliseconds a run).
+// A reference evaluation of the network from a packed model: bit-exact with the module's graph,
+// sharing the description's operators with it but no arithmetic. Clear rather than fast (some
+// milliseconds a run).
 #pragma once
 
 #include <array>
@@ -33,7 +34,7 @@ struct Tensor {
 // How an operator with a table turns accumulators into int8.
 struct Requantisation {
   int zero_point;      // added after scaling
-  int32_t multiplier;  // factor of the plain GEMMs: multiplier / 2^(31 + shift)
+  int32_t multiplier;  // factor of the fully connected operators: multiplier / 2^(31 + shift)
   int shift;           // right shift with rounding, 1 to 31
 };
 
@@ -54,15 +55,16 @@ int8_t RequantiseFixed(int32_t acc, const Requantisation& requantisation);
 std::vector<int32_t> Accumulate(const PackedModel& model, const TableLayout& table,
                                 const Tensor& in);
 
-// Output of operator `op` (0 to 19) for its input. Operator 16 hands its input on.
+// Output of operator `op`, any but the last, for its input.
 Tensor RunOperator(const PackedModel& model, int op, const Tensor& in);
 
 struct NetworkRun {
-  std::array<Tensor, kOperators - 1> outputs;  // of operators 0 to 19
+  std::array<Tensor, kOperators - 1> outputs;  // of all but the last
   std::array<float, kClasses> scores;          // k / 256, k from 0 to 255
 };
 
-// One run over a 382 x 48 window of features minus 128. The model has 86,000 bytes.
+// One run over a kInputRows x kInputChannels window of features minus 128. The model has
+// kModelBytes; throws std::invalid_argument if not.
 NetworkRun RunNetwork(const PackedModel& model, const Tensor& input);
 
 }  // namespace qz::model

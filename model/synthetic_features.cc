@@ -44,7 +44,7 @@ class Scene {
     At(row, channel) = std::max(At(row, channel), level + 18 * random_.Bell());
   }
 
-  // A noise floor never stands still after its mean was subtracted: most cells lie well below it.
+  // A noise floor varies after its mean was subtracted: most cells lie well below it.
   void Background() {
     const double level = random_.Uniform(30, 150);
     const double tilt = random_.Uniform(-1.2, 0.4);

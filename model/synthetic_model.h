@@ -1,5 +1,5 @@
-// A stand-in for the trained tables: not trained for anything, but sound, and alive from the
-// features to the scores.
+// A synthetic model in place of a trained one: valid, and with scores that follow the features, but
+// trained for nothing.
 #pragma once
 
 #include <cstdint>

@@ -1,21 +1,20 @@
 """Writes w19, the network's logistic function as a table over int8.
 
-Usage: make_logistic_table.py OUTPUT
+Usage: make_logistic_table.py DESCRIPTION OUTPUT
 
-The table's input has the scale 0.256 and the zero point 82, its output the scale 1/256 and the zero
-point -128; the entry of input q stands at q mod 256, the value of q's byte.
+DESCRIPTION is the JSON of `qz-model-tool describe`, which has the scale and the zero point of the table's
+input. Its output has the scale 1/256 and the zero point -128; the entry of input q has the index q mod 256,
+the value of q's byte.
 """
 
+import json
 import math
 import os
 import sys
 
-INPUT_SCALE = 0.256
-INPUT_ZERO_POINT = 82
 
-
-def entry(q):
-    exact = 256 / (1 + math.exp(-INPUT_SCALE * (q - INPUT_ZERO_POINT)))
+def entry(q, scale, zero_point):
+    exact = 256 / (1 + math.exp(-scale * (q - zero_point)))
     nearest = math.floor(exact + 0.5)
     # So far from a tie that no library's exp can round it the other way.
     assert abs(exact - nearest) < 0.4999, q
@@ -23,7 +22,11 @@ def entry(q):
 
 
 def main():
-    table = [entry(index if index < 128 else index - 256) for index in range(256)]
+    with open(sys.argv[1], encoding="ascii") as description:
+        operators = json.load(description)["operators"]
+    index = [operator["kind"] for operator in operators].index("logistic")
+    scale, zero_point = operators[index]["scale"], operators[index - 1]["zero_point"]
+    table = [entry(q, scale, zero_point) for q in (*range(128), *range(-128, 0))]
     lines = [
         "// Made by network/make_logistic_table.py: do not edit.",
         "#pragma once",
@@ -35,8 +38,8 @@ def main():
     for start in range(0, 256, 16):
         lines.append("    " + " ".join(f"{value}," for value in table[start:start + 16]))
     lines.append("};")
-    os.makedirs(os.path.dirname(sys.argv[1]), exist_ok=True)
-    with open(sys.argv[1], "w", encoding="ascii", newline="\n") as output:
+    os.makedirs(os.path.dirname(sys.argv[2]), exist_ok=True)
+    with open(sys.argv[2], "w", encoding="ascii", newline="\n") as output:
         output.write("\n".join(lines) + "\n")
 
 

@@ -15,8 +15,6 @@ using config::kFramesBetweenRuns;
 using config::kOperatorCount;
 using config::OperatorKind;
 
-constexpr int kLogitOperator = kOperatorCount - 3;  // the logistic function's input
-
 // As many windows at a time as are quick and small.
 constexpr int kMaxWindows = 16;
 
@@ -31,9 +29,9 @@ Batch WindowsOf(const Batch& features, int first, int count) {
   return windows;
 }
 
-class Prover {
+class Comparison {
  public:
-  Prover(const QuantisedParameters& parameters, const model::PackedModel& model)
+  Comparison(const QuantisedParameters& parameters, const model::PackedModel& model)
       : parameters_(parameters), weights_(network::WeightsOf(model.data())) {}
 
   void Compare(const Batch& features) {
@@ -98,7 +96,8 @@ class Prover {
   std::vector<int8_t> ScoreBytes(int window, bool as_floats) const {
     std::vector<int8_t> bytes;
     for (int c = 0; c < model::kClasses; ++c) {
-      const float score = DeviceScore(network_.OutputOf(kLogitOperator).values(window, c));
+      const float score = DeviceScore(
+          network_.OutputOf(static_cast<int>(config::kLogitOperator)).values(window, c));
       if (as_floats) {
         const auto* begin = reinterpret_cast<const int8_t*>(&score);
         bytes.insert(bytes.end(), begin, begin + sizeof(score));
@@ -120,17 +119,17 @@ class Prover {
 
 EquivalenceCheck Prove(const QuantisedParameters& parameters, const model::PackedModel& model,
                        const std::vector<Batch>& validated) {
-  Prover prover(parameters, model);
-  for (const Batch& features : validated) prover.Compare(features);
-  return prover.check();
+  Comparison comparison(parameters, model);
+  for (const Batch& features : validated) comparison.Compare(features);
+  return comparison.check();
 }
 
 std::string Message(const EquivalenceCheck& check) {
   char text[256];
   std::snprintf(text, sizeof(text),
-                "%llu network runs, %llu bytes of 21 operators: trainer %016llx, module %016llx",
+                "%llu network runs, %llu bytes of %zu operators: trainer %016llx, module %016llx",
                 static_cast<unsigned long long>(check.runs),
-                static_cast<unsigned long long>(check.bytes),
+                static_cast<unsigned long long>(check.bytes), kOperatorCount,
                 static_cast<unsigned long long>(check.trainer_digest),
                 static_cast<unsigned long long>(check.module_digest));
   return text + std::string(check.difference.empty() ? ", the same" : ", different: ") +

@@ -1,5 +1,5 @@
-// The proof that what was trained is what the device computes: the trainer's integer network and
-// the module's own network give the same tensors, byte for byte.
+// The check that what was trained is what the device computes: the trainer's integer network and
+// the module's network give the same tensors, byte for byte.
 #pragma once
 
 #include <cstdint>

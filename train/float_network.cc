@@ -8,8 +8,7 @@ namespace {
 float MinOf(const LayerPlan& plan) { return static_cast<float>(plan.min() * plan.out_scale); }
 float MaxOf(const LayerPlan& plan) { return static_cast<float>(plan.max() * plan.out_scale); }
 
-// Puts out a share of the values and makes the others larger; *mask is what they were multiplied
-// with.
+// Dropout: sets a share of the values to 0 and scales the others up; *mask holds the factors.
 void DropOut(float share, uint64_t seed, Batch* x, Batch* mask) {
   base::NumberGenerator random(seed);
   mask->Resize(x->sequences, x->steps(), x->channels());

@@ -22,17 +22,17 @@ struct LayerTrace {
 
 // What is done in training only.
 struct TrainingNoise {
-  float dropout = 0;  // share of inputs that are put out before the layers that the plan names
-  uint64_t seed = 0;  // of what is put out
+  float dropout = 0;  // share of the inputs of the plan's layers that are set to 0
+  uint64_t seed = 0;  // of their choice
 };
 
 class FloatNetwork {
  public:
-  // Features (0 to 255, sequences of 382 + 64 k frames) into logits, k + 1 for each sequence. With
+  // Features (0 to 255, sequences of FramesFor(windows)) into logits, one for each window. With
   // `noise` normalises by the batch, else the parameters must be folded.
   const Batch& Forward(const Values& parameters, const Batch& features, const TrainingNoise* noise);
   // After Forward with the same parameters: adds the gradient of the loss to *gradient, of
-  // kParameters.learnt numbers.
+  // kParameters.trained numbers.
   void Backward(const Values& parameters, const Batch& dlogits, Values* gradient);
   // Moves the running numbers of *values to the last batch's by `rate`.
   void MoveRunning(float rate, Values* values) const;
@@ -42,7 +42,7 @@ class FloatNetwork {
   bool normalised_ = false;
 };
 
-// Clears the gradient where the output stands at a limit.
+// Clears the gradient where the output is at a limit.
 void MaskClamped(const Batch& out, float min, float max, Batch* gradient);
 
 }  // namespace qz::train

@@ -9,7 +9,7 @@ namespace qz::train {
 
 constexpr int kTaps = 3;  // of the depthwise convolutions
 
-// y[j][c] = sum over t of x[j + t][c] w[t][c]; w is 3 x channels.
+// y[j][c] = sum over t of x[j + t][c] w[t][c]; w is kTaps x channels.
 void DepthwiseForward(const Batch& x, const ConstMatrixView& w, Batch* y);
 void DepthwiseBackward(const Batch& x, const ConstMatrixView& w, const Batch& dy, MatrixView dw,
                        Batch* dx);

@@ -59,9 +59,9 @@ void FoldNormalisations(Values* values) {
 void ClampWeights(Values* values) {
   for (size_t i = 0; i < kLayers; ++i) {
     if (kPlan[i].weight_scale == 0) continue;
-    const float most = static_cast<float>(127 * kPlan[i].weight_scale);
+    const float max = static_cast<float>(127 * kPlan[i].weight_scale);
     MatrixView w = WeightOf(*values, i);
-    w = w.cwiseMin(most).cwiseMax(-most);
+    w = w.cwiseMin(max).cwiseMax(-max);
   }
 }
 

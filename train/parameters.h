@@ -1,5 +1,5 @@
-// All numbers of a network in one row, so that steps, averages and files treat them alike, and
-// views of what belongs to a layer.
+// All parameters of a network in one vector, so that steps, averages and files treat them alike,
+// and views of a layer's share.
 #pragma once
 
 #include <array>
@@ -25,7 +25,7 @@ struct LayerOffsets {
 
 struct ParameterPlan {
   std::array<LayerOffsets, kLayers> layers;
-  size_t trained = 0;  // numbers that gradients move; the running ones stand behind them
+  size_t trained = 0;  // numbers that gradients change; the running ones follow
   size_t all = 0;
 };
 
@@ -55,7 +55,7 @@ constexpr ParameterPlan MakeParameterPlan() {
 
 constexpr ParameterPlan kParameters = MakeParameterPlan();
 
-// Views of a layer in a row of kParameters.learnt or .all numbers.
+// Views of a layer in a vector of kParameters.trained or .all numbers.
 inline MatrixView WeightOf(Values& values, size_t layer) {
   return {values.data() + kParameters.layers[layer].weight, kPlan[layer].weight_rows(),
           kPlan[layer].outputs()};
@@ -64,7 +64,7 @@ inline ConstMatrixView WeightOf(const Values& values, size_t layer) {
   return {values.data() + kParameters.layers[layer].weight, kPlan[layer].weight_rows(),
           kPlan[layer].outputs()};
 }
-// `begin` is one of the layer's places: a row of its outputs.
+// `begin` is one of the layer's offsets: a row of its outputs.
 inline MatrixView RowAt(Values& values, size_t layer, size_t begin) {
   return {values.data() + begin, 1, kPlan[layer].outputs()};
 }
@@ -75,8 +75,8 @@ inline ConstMatrixView RowAt(const Values& values, size_t layer, size_t begin) {
 // The numbers to begin with. Random, by the seed alone.
 Values InitialParameters(uint64_t seed);
 
-// Puts the normalisations' work into weights and biases: afterwards gamma and the running numbers
-// mean nothing.
+// Folds the normalisations into weights and biases: afterwards gamma and the running numbers are
+// unused.
 void FoldNormalisations(Values* values);
 
 // Keeps weights of fixed scale within what int8 reaches.

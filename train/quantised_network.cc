@@ -11,27 +11,16 @@ namespace {
 // With the largest products, 180 x 255 x 127, and this every sum stays below 2^24.
 constexpr float kMaxBias = 8'000'000;
 
-// Of the fixed-point layers: multiplier / 2^(31 + shift).
-struct FixedFactor {
-  int64_t multiplier;
-  int shift;
-};
-constexpr FixedFactor FixedFactorOf(size_t layer) {
-  return layer + 1 == kLayers ? FixedFactor{1234879616, 8} : FixedFactor{1427340160, 5};
-}
-
-bool IsFixed(const LayerPlan& plan) { return !plan.layout().HasScales(); }
-
 // The device's rounding: floor of the high product, then a right shift with halves upwards.
-float RequantiseFixed(float accumulator, FixedFactor factor) {
-  const int64_t high = (static_cast<int64_t>(accumulator) * factor.multiplier) >> 31;
+float RequantiseFixed(float accumulator, const config::OperatorDescription& factor) {
+  const int64_t high = (static_cast<int64_t>(accumulator) * int64_t{factor.multiplier}) >> 31;
   return static_cast<float>((high + (int64_t{1} << (factor.shift - 1))) >> factor.shift);
 }
 
 void Requantise(const QuantisedParameters& parameters, size_t layer, Batch* x) {
   const LayerPlan& plan = kPlan[layer];
-  if (IsFixed(plan)) {
-    const FixedFactor factor = FixedFactorOf(layer);
+  if (plan.fixed_point()) {
+    const config::OperatorDescription& factor = plan.Description();
     x->values = x->values.unaryExpr([&](float sum) { return RequantiseFixed(sum, factor); });
   } else {
     // In single precision and to the nearest, halves to even, as the device.
@@ -53,7 +42,7 @@ RowVector WeightSteps(const ConstMatrixView& weight, const LayerPlan& plan) {
 // The layer that holds the operator, or that the operator pools.
 size_t LayerOf(int op) {
   size_t layer = kLayers - 1;
-  while (model::kTables[layer].op > op) --layer;
+  while (config::kTables[layer].op > op) --layer;
   return layer;
 }
 
@@ -75,10 +64,9 @@ QuantisedParameters::QuantisedParameters(const Values& folded) : integers(kParam
     const size_t bias = kParameters.layers[i].bias;
     RowAt(integers, i, bias) =
         (RowAt(folded, i, bias).array() / step.array()).rint().max(-kMaxBias).min(kMaxBias);
-    scale[i] = IsFixed(plan) ? RowVector::Constant(
-                                   weight.cols(),
-                                   static_cast<float>(i + 1 == kLayers ? kFactor18 : kFactor17))
-                             : RowVector(step / static_cast<float>(plan.out_scale));
+    scale[i] = plan.fixed_point()
+                   ? RowVector::Constant(weight.cols(), static_cast<float>(plan.Factor()))
+                   : RowVector(step / static_cast<float>(plan.out_scale));
   }
 }
 
@@ -93,7 +81,7 @@ model::ModelArrays ArraysOf(const QuantisedParameters& parameters) {
       const ConstMatrixView bias = RowAt(parameters.integers, i, kParameters.layers[i].bias);
       std::copy(bias.data(), bias.data() + bias.size(), layer.bias.begin());
     }
-    if (IsFixed(kPlan[i])) continue;
+    if (kPlan[i].fixed_point()) continue;
     layer.scale.assign(parameters.scale[i].data(),
                        parameters.scale[i].data() + parameters.scale[i].size());
   }
@@ -111,7 +99,8 @@ QuantisedParameters ParametersOf(const model::ModelArrays& arrays) {
       if (std::abs(static_cast<float>(bias)) > kMaxBias) {
         throw std::runtime_error(std::string(kPlan[i].layout().name) + ": a bias is " +
                                  std::to_string(bias) +
-                                 ", beyond the 8,000,000 up to which the trainer's sums are exact");
+                                 ", expected at most 8,000,000: beyond, the trainer's sums are "
+                                 "not exact");
       }
     }
     std::copy(layer.bias.begin(), layer.bias.end(),
@@ -173,9 +162,9 @@ void QuantisedNetwork::Backward(const QuantisedParameters& parameters, const Bat
 
 const Batch& QuantisedNetwork::OutputOf(int op) const {
   const size_t layer = LayerOf(op);
-  return model::kTables[layer].op == op ? traces_[layer].out : traces_[layer].pooled;
+  return config::kTables[layer].op == op ? traces_[layer].out : traces_[layer].pooled;
 }
 
-int QuantisedNetwork::ZeroPointOf(int op) { return kPlan[LayerOf(op)].zero_point; }
+int QuantisedNetwork::ZeroPointOf(int op) { return kPlan[LayerOf(op)].zero_point(); }
 
 }  // namespace qz::train

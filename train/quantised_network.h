@@ -1,8 +1,9 @@
 // The network in the device's own arithmetic, bit for bit: all values are integers, held in floats
-// that are exact below 2^24, so that the same matrix products serve training and proof.
+// that are exact below 2^24, so that the same matrix products serve training and the equivalence
+// check.
 //
-// Training: the forward pass rounds as the device does; the backward pass takes rounding for the
-// identity, and clamping for what it is.
+// Training: the forward pass rounds as the device does; the backward pass treats rounding as the
+// identity, and clamping as what it is.
 #pragma once
 
 #include <array>
@@ -15,7 +16,7 @@ namespace qz::train {
 
 // Integers of the device for folded parameters.
 struct QuantisedParameters {
-  Values integers;                             // weights and biases, at their places
+  Values integers;                             // weights and biases, at their offsets
   std::array<RowVector, kLayers> scale;        // output steps an accumulator step: what is packed
   std::array<RowVector, kLayers> weight_step;  // real weight = step x integer, an output each
 
@@ -30,13 +31,14 @@ QuantisedParameters ParametersOf(const model::ModelArrays& arrays);
 
 class QuantisedNetwork {
  public:
-  // Features into the output of operator 18 less its zero point, in steps of 0.256.
+  // Features into the logits: the last layer's output less its zero point, in steps of
+  // kLogitScale.
   const Batch& Forward(const QuantisedParameters& parameters, const Batch& features);
   // `dlogits`: the loss's gradient by the real logits. Adds that by the real weights and biases to
   // *gradient.
   void Backward(const QuantisedParameters& parameters, const Batch& dlogits, Values* gradient);
 
-  // The tensor that an operator with a table or a pool (0 to 18 but 16) wrote, less its zero point.
+  // The tensor that an operator with a table or a pool wrote, less its zero point.
   const Batch& OutputOf(int op) const;
   // What the device adds to it.
   static int ZeroPointOf(int op);

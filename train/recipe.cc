@@ -9,6 +9,8 @@
 #include <sstream>
 #include <stdexcept>
 
+#include "config/detector.h"
+
 namespace qz::train {
 namespace {
 
@@ -54,9 +56,9 @@ constexpr Entry kEntries[] = {
     Real("tilt", &Recipe::tilt, 0, 200),
     Real("shift_share", &Recipe::shift_share, 0, 1),
     Whole("time_masks", &Recipe::time_masks, 0, 100),
-    Whole("longest_time_mask", &Recipe::max_time_mask, 1, 382),
-    Whole("channel_masks", &Recipe::channel_masks, 0, 48),
-    Whole("widest_channel_mask", &Recipe::widest_channel_mask, 1, 48),
+    Whole("longest_time_mask", &Recipe::max_time_mask, 1, config::kWindowFrames),
+    Whole("channel_masks", &Recipe::channel_masks, 0, config::kFeatureChannels),
+    Whole("widest_channel_mask", &Recipe::widest_channel_mask, 1, config::kFeatureChannels),
 };
 
 std::string Number(double value) {

@@ -11,7 +11,7 @@ struct Recipe {
   int epochs = 300;         // of each of them
   int tuning_epochs = 200;  // of the model behind them, in the device's arithmetic
   int batch = 32;           // sequences a step
-  int windows = 4;          // network windows a sequence: 382 + 64 x (windows - 1) frames
+  int windows = 4;          // network windows a sequence, a run apart
   double rate = 0.003;      // of learning, at its highest; it falls to 0 along a cosine
   double tuning_rate = 0.001;
   double decay = 0.02;      // of weights

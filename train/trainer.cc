@@ -47,7 +47,7 @@ Trainer::Trainer(const Recipe& recipe, uint64_t seed, int threads, const std::ve
       shards_(kShards) {
   const int sequences = recipe.batch / static_cast<int>(kShards);
   for (Shard& shard : shards_) {
-    shard.features.Resize(sequences, FramesFor(recipe.windows), 48);
+    shard.features.Resize(sequences, FramesFor(recipe.windows), model::kInputChannels);
     shard.targets.resize(sequences, model::kClasses);
   }
 }

@@ -27,8 +27,9 @@ Batch ValidationFeatures(const std::vector<int16_t>& samples) {
   const std::vector<uint16_t> features = evaluation::FeaturesToPlay(samples);
   const auto frames = static_cast<int>(features.size() / dataset::kFeatureChannels);
   Batch batch;
-  batch.Resize(1, FramesFor(1 + (frames - FramesFor(1)) / 64),
-               static_cast<Eigen::Index>(dataset::kFeatureChannels));
+  batch.Resize(
+      1, FramesFor(1 + (frames - FramesFor(1)) / static_cast<int>(config::kFramesBetweenRuns)),
+      static_cast<Eigen::Index>(dataset::kFeatureChannels));
   CopyFeatures(features, 0, &batch);
   return batch;
 }

@@ -27,10 +27,12 @@ struct ClipList {
 ClipList LoadClips(const std::vector<dataset::Recording>& recordings, const model::Labels& labels);
 
 // Frames of a sequence that the network looks at `windows` times.
-constexpr int FramesFor(int windows) { return 382 + 64 * (windows - 1); }
+constexpr int FramesFor(int windows) {
+  return static_cast<int>(config::kWindowFrames + config::kFramesBetweenRuns * (windows - 1));
+}
 
 // A clip from a fresh start and the silence behind it, as features 0 to 255, for all network runs
-// that judge it: FramesFor(runs) x 48.
+// that judge it: FramesFor(runs) x features.
 Batch ValidationFeatures(const std::vector<int16_t>& samples);
 
 // Writes as many frames of features as a sequence of the batch holds, as floats from 0 to 255.

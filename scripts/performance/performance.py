@@ -6,6 +6,7 @@ Usage: performance.py FOLDER, which holds what bench-baselines.sh left there:
   parts.txt  our operators one by one    gains.txt  our kernels' texts side by side
 """
 
+import json
 import pathlib
 import re
 import subprocess
@@ -19,15 +20,13 @@ ROOT = pathlib.Path(__file__).resolve().parents[2]
 PAGE, PICTURE = ROOT / "docs/performance.md", ROOT / "docs/performance.svg"
 MARKS = ("<!-- measured -->\n", "<!-- end of what is measured -->\n")
 PRODUCTS_A_CYCLE = 32  # two instructions of 16 exact products
-RUNS_A_PASS, FRAMES_A_PASS = 25 / 8, 200
+DETECTOR = json.loads((ROOT / "build/host/model/description.json").read_text())
+FRAMES_A_PASS = DETECTOR["buffer_samples"] // DETECTOR["hop_samples"]
+RUNS_A_PASS = FRAMES_A_PASS / DETECTOR["frames_between_runs"]
 
-CONVOLUTION = 3 * 60 * 60
 # What each operator of the network multiplies; the others only compare, look up or convert.
-OPERATORS = {0: ("depthwise", 380 * 48 * 3), 1: ("pointwise", 380 * 48 * 60), 3: ("depthwise", 188 * 60 * 3),
-             4: ("pointwise", 188 * 60 * 60), 6: ("convolution", 92 * CONVOLUTION),
-             8: ("convolution", 44 * CONVOLUTION), 10: ("convolution", 20 * CONVOLUTION),
-             12: ("convolution", 8 * CONVOLUTION), 13: ("convolution", 6 * CONVOLUTION),
-             15: ("convolution", CONVOLUTION), 17: ("fully connected", 60 * 64), 18: ("fully connected", 64 * 5)}
+OPERATORS = {number: (operator["kind"], operator["products"])
+             for number, operator in enumerate(DETECTOR["operators"]) if operator["products"]}
 NETWORK_PRODUCTS = sum(products for _, products in OPERATORS.values())
 
 

@@ -1,4 +1,4 @@
-// Plain arrays, packed and unpacked; and what they mean to the module's network.
+// Arrays without padding, packed and unpacked; and what they mean to the module's network.
 
 #include <gmock/gmock.h>
 
@@ -49,13 +49,13 @@ ModelArrays RandomArrays(uint64_t seed) {
   return all;
 }
 
-// The accumulators of a table's operator, plainly from its arrays.
-std::vector<int32_t> PlainSums(const TableLayout& table, const LayerArrays& arrays,
-                               const std::vector<int8_t>& in) {
+// The accumulators of a table's operator, from its arrays.
+std::vector<int32_t> SumsOf(const TableLayout& table, const LayerArrays& arrays,
+                            const std::vector<int8_t>& in) {
   const bool depthwise = table.IsDepthwise();
   const int channels = depthwise ? table.outputs : table.inputs;
   const int rows = static_cast<int>(in.size()) / channels - table.taps + 1;
-  const int zero_point = table.op == 1 ? 15 : table.op == 4 ? 36 : -128;
+  const int zero_point = config::kOperators[static_cast<size_t>(table.op)].input.zero_point;
   std::vector<int32_t> sums;
   for (int row = 0; row < rows; ++row) {
     for (int out = 0; out < table.outputs; ++out) {
@@ -88,7 +88,7 @@ TEST(Packing, PutsEveryValueWhereTheNetworkLooksForIt) {
     const int8_t* const written = network::BytesOf(arena, op.output);
     const std::vector<int8_t> out(written, written + op.output.Bytes());
     std::vector<int8_t> expected;
-    for (const int32_t sum : PlainSums(table, arrays[i], in)) {
+    for (const int32_t sum : SumsOf(table, arrays[i], in)) {
       const size_t output = expected.size() % static_cast<size_t>(table.outputs);
       const Requantisation requantisation = RequantisationOf(table.op);
       expected.push_back(table.HasScales() ? RequantiseFloat(sum, arrays[i].scale[output],
@@ -118,7 +118,7 @@ TEST(Packing, IsUndoneByUnpacking) {
   }
 }
 
-// Where tables stand in ModelArrays.
+// Indices of tables in ModelArrays.
 constexpr size_t kW0 = 0, kW1 = 1, kW3 = 2, kW6 = 4, kW17 = 10, kW18 = 11;
 
 template <typename Change>
@@ -137,24 +137,24 @@ std::vector<std::string> FindingsAfter(Change change) {
 TEST(Packing, NamesEveryKindOfDefect) {
   const std::pair<std::vector<std::string>, const char*> cases[] = {
       {FindingsAfter([](auto& a) { a[kW6].weight[(2 * 60 + 14) * 60 + 7] = -128; }),
-       "w6.weight[2,14,7] is -128; weights lie from -127 to 127."},
-      {FindingsAfter([](auto& a) { a[kW3].weight[60 + 5] = -128; }), "w3.weight[1,5] is -128; w"},
+       "w6.weight[2,14,7] is -128; expected -127 to 127."},
+      {FindingsAfter([](auto& a) { a[kW3].weight[60 + 5] = -128; }), "w3.weight[1,5] is -128; e"},
       {FindingsAfter([](auto& a) { a[kW0].bias[47] = 1; }),
-       "w0.bias[47] is 1; operator 0 has no biases: 0 would be right."},
+       "w0.bias[47] is 1; operator 0 has no biases: expected 0."},
       {FindingsAfter([](auto& a) { a[kW3].scale[2] = 0.5f; }),
-       "w3.scale[2] is 0.5; 0.00582244154 would be right."},
+       "w3.scale[2] is 0.5; expected 0.00582244154."},
       {FindingsAfter([](auto& a) { a[kW1].scale[59] = -0.25f; }),
-       "w1.scale[59] is -0.25; scales are finite and not negative."},
-      {FindingsAfter([](auto& a) { a[kW6].scale[0] = NAN; }), "w6.scale[0] is nan; scales"},
+       "w1.scale[59] is -0.25; expected finite and not negative."},
+      {FindingsAfter([](auto& a) { a[kW6].scale[0] = NAN; }), "w6.scale[0] is nan; expected"},
       {FindingsAfter([](auto& a) {
          std::fill(a[kW18].weight.begin(), a[kW18].weight.end(), 1);
          a[kW18].bias[4] = INT32_MAX;
        }),
        "w18.bias[4] is 2147483647, with the input's zero point folded in 2147491839; that must"},
       {FindingsAfter([](auto& a) { a[kW17].scale.push_back(1); }),
-       "w17.scale has 1 values; 0 would be right."},
+       "w17.scale has 1 values; expected 0."},
       {FindingsAfter([](auto& a) { a[kW0].weight.pop_back(); }),
-       "w0.weight has 143 values; 144 would be right."}};
+       "w0.weight has 143 values; expected 144."}};
   for (const auto& [findings, start] : cases) {
     EXPECT_THAT(findings, ElementsAre(StartsWith(start)));
   }
@@ -193,8 +193,8 @@ TEST_F(ArrayFiles, HoldAModelToTheByte) {
   EXPECT_EQ(arrays.size(), 34u);
   EXPECT_THAT(arrays.at("w0.weight").shape, ElementsAre(3, 48));
   EXPECT_THAT(arrays.at("w4.weight").shape, ElementsAre(60, 60));
-  EXPECT_THAT(arrays.at("w15.weight").shape, ElementsAre(3, 60, 60));
-  EXPECT_THAT(arrays.at("w18.bias").shape, ElementsAre(5));
+  EXPECT_THAT(arrays.at("w15.weight").shape, ElementsAre(kTables[9].taps, 60, 60));
+  EXPECT_THAT(arrays.at("w18.bias").shape, ElementsAre(config::kClasses));
 }
 
 TEST_F(ArrayFiles, WithWrongArraysAreRefused) {

@@ -67,7 +67,7 @@ TEST(Layers, DepthwiseGradientsAreItsSlopes) {
     DepthwiseForward(x, view, &y);
     return Dot(y, dy);
   };
-  Matrix dw = Matrix::Ones(3, 5);  // gradients are added to what stands there
+  Matrix dw = Matrix::Ones(3, 5);  // gradients are added to what is there
   Batch dx;
   DepthwiseBackward(x, view, dy, MatrixView(dw.data(), 3, 5), &dx);
   ExpectNear(Slopes(x.values.size(), x.values.data(), value), dx.values, 1e-4, "input");
@@ -139,13 +139,14 @@ TEST(Layers, NormalisationGradientsAreItsSlopes) {
 
 TEST(Loss, GradientIsItsSlope) {
   base::NumberGenerator random(4);
-  Batch logits = RandomBatch(&random, 2, 3, 5);
+  Batch logits = RandomBatch(&random, 2, 3, model::kClasses);
   logits.values *= 3;
-  Matrix targets = Matrix::Zero(2, 5);
+  Matrix targets = Matrix::Zero(2, model::kClasses);
   targets(0, 1) = targets(1, 4) = 1;
   LossShape shape;
   shape.smoothing = 0.05f;
-  shape.positive_weight << 1, 2, 1, 1, 3;
+  shape.positive_weight(1) = 2;
+  shape.positive_weight(4) = 3;
   Batch gradient, unused;
   ClipLoss(logits, targets, shape, 2, &gradient);
   ExpectNear(Slopes(logits.values.size(), logits.values.data(),
@@ -153,7 +154,7 @@ TEST(Loss, GradientIsItsSlope) {
              gradient.values, 1e-3, "logit");
 }
 
-TEST(Loss, TeachersAreFollowedWindowByWindow) {
+TEST(Loss, DistillationTargetsAreFollowedWindowByWindow) {
   base::NumberGenerator random(5);
   Batch logits = RandomBatch(&random, 2, 3, 5);
   const Batch distilled = RandomBatch(&random, 2, 3, 5);
@@ -168,10 +169,11 @@ TEST(Loss, TeachersAreFollowedWindowByWindow) {
 
 TEST(Loss, SurvivesFarLogits) {
   Batch logits, gradient;
-  logits.Resize(1, 2, 5);
-  logits.values << 900, -900, 900, -900, 0, 900, -900, -900, 900, 0;
-  Matrix targets(1, 5);
-  targets << 0, 1, 0, 1, 0;
+  logits.Resize(1, 2, model::kClasses);
+  logits.values.setZero();
+  logits.values.leftCols(4) << 900, -900, 900, -900, 900, -900, -900, 900;
+  Matrix targets = Matrix::Zero(1, model::kClasses);
+  targets(1) = targets(3) = 1;
   const double loss = ClipLoss(logits, targets, LossShape(), 1, &gradient);
   EXPECT_GT(loss, 2600);
   EXPECT_LT(loss, 4000);

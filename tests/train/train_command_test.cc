@@ -102,7 +102,7 @@ TEST_F(Commands, RefuseBeforeTheWorkBegins) {
   EXPECT_FALSE(std::filesystem::exists(folder_.Path("model")));
   std::ofstream(folder_.Path("model")) << "four";
   EXPECT_THAT([&] { ProveModelCommand(folder_.Path("model"), options_.manifest); },
-              ThrowsMessage<std::runtime_error>(HasSubstr("has 4 bytes; 86000 would be right")));
+              ThrowsMessage<std::runtime_error>(HasSubstr("has 4 bytes; expected 86000")));
 }
 
 }  // namespace
