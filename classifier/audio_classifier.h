@@ -2,15 +2,15 @@
 
 #include <cstdint>
 
-#include "classifier/circular_buffer_lite.h"
 #include "classifier/types/confidence_event.h"
 #include "classifier/types/sound_detection_event_listener_interface.h"
+#include "detector/scores.h"
 
 namespace tarn::contexthub::sound {
 
-// Turns the microphone stream into category confidences: frames of 25 ms every 10 ms through the
-// audio front end, the newest 382 frames through the network every 64 frames, two of its five
-// scores smoothed over the runs, and at the end of every pass detections and the periodic report.
+// Turns the microphone stream into category confidences, and at the end of every pass into
+// detections and the periodic report. The steps are those of detector/; this class connects them
+// with the runtime: log, clocks and listener.
 //
 // The frame being assembled, the feature window, the front end and the network are static: there
 // must be at most one classifier, and framing continues across pauses of the audio.
@@ -18,7 +18,7 @@ class AudioClassifier {
  public:
   AudioClassifier();
 
-  // Who hears of detections; not owned. A later call replaces it.
+  // Is called with detections; not owned. A later call replaces it.
   void RegisterListener(SoundDetectionEventListenerInterface* listener) { listener_ = listener; }
 
   // Forgets the smoothed scores.
@@ -31,21 +31,20 @@ class AudioClassifier {
                 uint32_t* model_version);
 
  private:
-  // Folds the five scores of a network run into the maxima of the pass.
+  // Folds the scores of a network run into the maxima of the pass.
   void ProcessModelOutput(float* pass_confidences);
-  // Decides what the pass detected, tells the listener, and fills the periodic report.
+  // Decides what the pass detected, calls the listener, and fills the periodic report.
   // `timestamp_ns` is the start of the pass in the host's clock.
   void GenerateDetectionEvent(float* pass_confidences, uint32_t confidence_size,
                               ConfidenceEvent* confidences, uint64_t timestamp_ns);
 
   // Runs the front end on the assembled frame, and the network when the window is full.
   void ProcessFrame(float* pass_confidences);
-  float Smooth(uint32_t output, float score);
 
   // By network output, in the hub's clock; 0 means never.
   uint64_t last_detection_time_ns_[kSoundCategoryCount] = {};
-  circular_buffer_lite<5, float> short_confidence_buffer_;
-  circular_buffer_lite<16, float> long_confidence_buffer_;
+  qz::detector::ShortScores short_confidence_buffer_;
+  qz::detector::LongScores long_confidence_buffer_;
   SoundDetectionEventListenerInterface* listener_ = nullptr;
   // False once a score of the pass was above 1.0.
   bool is_confidence_valid_ = false;

@@ -11,6 +11,10 @@ if(CMAKE_SYSTEM_PROCESSOR MATCHES "^arm")
   # Nothing built here meets what compilers of ten years ago have built.
   target_compile_options(qz_flags INTERFACE -Wno-psabi)
 endif()
+if(CMAKE_CROSSCOMPILING)
+  # The device's build goes without the checks of preconditions.
+  target_compile_definitions(qz_flags INTERFACE QZ_WITHOUT_CHECKS)
+endif()
 if(QZ_SANITIZE)
   # vptr checks need RTTI, which the module does without.
   set(sanitizers -fsanitize=address,undefined -fno-sanitize=vptr -fno-sanitize-recover=all)

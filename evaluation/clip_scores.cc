@@ -9,21 +9,22 @@
 
 #include "base/digest.h"
 #include "dataset/clip_features.h"
+#include "detector/window.h"
 #include "network/network.h"
 
 namespace qz::evaluation {
 namespace {
 
-constexpr size_t kBufferSamples = 32000;
-constexpr size_t kFramesBetweenRuns = 64;
 constexpr size_t kRunsBehindTheEnd = 2;
 
-using config::kWindow;
+using config::kBufferSamples;
+using config::kFramesBetweenRuns;
+using config::kWindowFrames;
 static_assert(config::kScores.Bytes() == sizeof(Scores));
 
-// How many frames hold all of the samples, the last ones filled up with others.
+// The frames that hold all of the samples, the last ones filled up with others.
 size_t FramesAround(size_t samples) {
-  return dataset::FramesOf(samples + dataset::kHopSamples - 1);
+  return detector::FramesOf(samples + config::kHopSamples - 1);
 }
 
 void RunOperators(network::Arena* arena, const network::Weights& weights, uint64_t* digest) {
@@ -37,10 +38,10 @@ void RunOperators(network::Arena* arena, const network::Weights& weights, uint64
 }  // namespace
 
 size_t SamplesToPlay(size_t clip_samples) {
-  const size_t seen = std::max<size_t>(FramesAround(clip_samples), kWindow.rows);
-  const size_t first_run = (seen - kWindow.rows + kFramesBetweenRuns - 1) / kFramesBetweenRuns;
-  const size_t frames = kWindow.rows + (first_run + kRunsBehindTheEnd - 1) * kFramesBetweenRuns;
-  const size_t samples = std::max(dataset::SamplesOf(frames), clip_samples);
+  const size_t seen = std::max(FramesAround(clip_samples), kWindowFrames);
+  const size_t first_run = (seen - kWindowFrames + kFramesBetweenRuns - 1) / kFramesBetweenRuns;
+  const size_t frames = kWindowFrames + (first_run + kRunsBehindTheEnd - 1) * kFramesBetweenRuns;
+  const size_t samples = std::max(detector::SamplesOf(frames), clip_samples);
   return (samples + kBufferSamples - 1) / kBufferSamples * kBufferSamples;
 }
 
@@ -52,20 +53,23 @@ std::vector<uint16_t> FeaturesToPlay(std::vector<int16_t> clip) {
 ClipScores ScoreFeatures(const model::PackedModel& model, const std::vector<uint16_t>& features) {
   if (model.size() != model::kModelBytes) {
     throw std::invalid_argument("the model has " + std::to_string(model.size()) +
-                                " bytes, should be " + std::to_string(model::kModelBytes));
+                                " bytes, expected " + std::to_string(model::kModelBytes));
   }
-  const auto arena = std::make_unique<network::Arena>();
   const network::Weights weights = network::WeightsOf(model.data());
+  const auto arena = std::make_unique<network::Arena>();
+  std::vector<int8_t> window(detector::kWindowBytes);
+  size_t frames = 0;
   ClipScores scores;
   scores.digest = base::kEmptyDigest;
-  for (size_t first = 0; first + kWindow.Bytes() <= features.size();
-       first += kFramesBetweenRuns * kWindow.channels) {
-    std::transform(features.data() + first, features.data() + first + kWindow.Bytes(),
-                   network::InputOf(*arena), dataset::NetworkInput);
+  const auto run = [&] {
+    std::copy(window.begin(), window.end(), network::InputOf(*arena));
     RunOperators(arena.get(), weights, &scores.digest);
-    Scores& run = scores.runs.emplace_back();
-    std::memcpy(run.data(), network::ScoresOf(*arena), sizeof run);
-    for (size_t i = 0; i < run.size(); ++i) scores.max[i] = std::max(scores.max[i], run[i]);
+  };
+  for (size_t first = 0; first < features.size(); first += config::kFeatureChannels) {
+    if (!detector::TakeFrame(features.data() + first, window.data(), &frames, run)) continue;
+    Scores& newest = scores.runs.emplace_back();
+    std::memcpy(newest.data(), network::ScoresOf(*arena), sizeof newest);
+    for (size_t i = 0; i < newest.size(); ++i) scores.max[i] = std::max(scores.max[i], newest[i]);
   }
   return scores;
 }

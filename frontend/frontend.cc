@@ -35,9 +35,9 @@ constexpr size_t kFeatures = kOutputOffset;  //    96  features, uint16
 // last reader has run, so that no byte is ever read as another type than was written. This costs no
 // instruction.
 template <typename T, size_t kCount>
-T* Begin(unsigned char* arena, size_t offset) {
+T* Begin(Arena& arena, size_t offset) {
   // This form of new, of a reserved name, keeps no count before the elements.
-  return ::new (arena + offset) T[kCount];  // NOLINT(clang-analyzer-cplusplus.PlacementNew)
+  return ::new (arena.bytes + offset) T[kCount];  // NOLINT(clang-analyzer-cplusplus.PlacementNew)
 }
 
 // Left shift that brings a non-zero peak into 16384 to 32767, where it is not there or above
@@ -49,11 +49,10 @@ uint32_t NormalisingShift(uint16_t peak) {
 
 }  // namespace
 
-void Run(unsigned char* arena, uint32_t* noise) {
-  const auto* input = reinterpret_cast<const int16_t*>(arena + kInput);
+void Run(Arena& arena, State& state) {
   constexpr size_t kFrameBytes = kFrameSamples * sizeof(int16_t);
   int16_t* windowed = Begin<int16_t, kFrameSamples>(arena, kWindowed);
-  orra_s16_window_shift12_ukernel__neon_x32(1, kFrameBytes, input, w1, windowed, 12);
+  orra_s16_window_shift12_ukernel__neon_x32(1, kFrameBytes, InputOf(arena), w1, windowed, 12);
 
   uint16_t peak;
   orra_s16_rmaxabs_ukernel__neon_x32(kFrameBytes, windowed, &peak);
@@ -86,7 +85,7 @@ void Run(unsigned char* arena, uint32_t* noise) {
   uint32_t* suppressed = Begin<uint32_t, kFeatureChannels>(arena, kSuppressed);
   orra_u32_filterbank_subtract_ukernel__scalar_x2(kFeatureChannels, amplitude, kSmoothing,
                                                   kSmoothing, kRetain, kRetain, kFloor, 0, 14,
-                                                  noise, suppressed);
+                                                  state.noise, suppressed);
 
   uint16_t* features = Begin<uint16_t, kFeatureChannels>(arena, kFeatures);
   orra_u32_vlog_ukernel__scalar_x1(kFeatureChannels, suppressed, 3, 16, features);

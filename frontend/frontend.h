@@ -14,19 +14,33 @@ namespace qz::frontend {
 using config::kFeatureChannels;
 using config::kFrameSamples;
 
-// The memory of a run. Nothing in it carries over to the next.
-constexpr size_t kArenaBytes = 2896;
-constexpr size_t kArenaAlignment = 16;
-// The frame: 400 int16 in time order, full scale +-32768. The caller writes all of them before
-// every run: a run overwrites them.
+// The memory of a run; nothing in it carries over to the next.
+struct alignas(16) Arena {
+  unsigned char bytes[2896];
+};
 constexpr size_t kInputOffset = 1856;
-// 48 uint16 features, the lowest frequency first, valid until the next run. A feature is 0 or about
-// 16 ln(8 a), where a is the channel's amplitude after noise suppression: 33 to 299.
 constexpr size_t kOutputOffset = 400;
 
-// One frame from input to output. `noise` are the noise estimates of the 48 channels, in the unit
-// of the amplitudes, zero at the start of a stream; each moves by 655/16384 of its distance from
-// the frame's amplitude. `arena` has kArenaBytes, aligned to kArenaAlignment.
-void Run(unsigned char* arena, uint32_t* noise);
+// What a stream remembers from frame to frame: the noise estimate of every channel, in the unit of
+// the amplitudes. Zero at the start of a stream.
+struct State {
+  uint32_t noise[kFeatureChannels];
+};
+
+// Input: the frame's 400 samples in time order, full scale +-32768. The caller writes all of them
+// before every run: a run overwrites them.
+inline int16_t* InputOf(Arena& arena) {
+  return reinterpret_cast<int16_t*>(arena.bytes + kInputOffset);
+}
+
+// Output: 48 features, the lowest frequency first, valid until the next run. A feature is 0 or
+// about 16 ln(8 a), where a is the channel's amplitude after noise suppression: 33 to 299.
+inline const uint16_t* FeaturesOf(const Arena& arena) {
+  return reinterpret_cast<const uint16_t*>(arena.bytes + kOutputOffset);
+}
+
+// One frame from input to output. Moves the noise estimate of every channel by 655/16384 of its
+// distance from the frame's amplitude.
+void Run(Arena& arena, State& state);
 
 }  // namespace qz::frontend

@@ -4,6 +4,7 @@
 #include <cstdint>
 
 #include "chre/fixed_size_vector.h"
+#include "config/detector.h"
 
 namespace tarn::contexthub::sound {
 
@@ -14,12 +15,12 @@ struct ConfidenceEvent {
 };
 
 // Outputs of the network.
-constexpr size_t kSoundCategoryCount = 5;
+constexpr size_t kSoundCategoryCount = qz::config::kClasses;
 
 // The detections of a pass, or its periodic report.
 using ConfidenceEvents = chre::FixedSizeVector<ConfidenceEvent, kSoundCategoryCount>;
 
 // Category code of each network output. What the codes mean is the host's.
-constexpr uint8_t kSoundCategoryIndexMap[kSoundCategoryCount] = {0, 6, 17, 15, 18};
+static constexpr auto& kSoundCategoryIndexMap = qz::config::kCategories;
 
 }  // namespace tarn::contexthub::sound
