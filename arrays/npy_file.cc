@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <string_view>
 
+#include "base/error.h"
+
 namespace qz::arrays {
 namespace {
 
@@ -40,7 +42,7 @@ class HeaderParser {
     SkipSpace();
     if (location_ != text_.size()) Fail("nothing more");
     if (descr_.empty() || order_.empty() || !has_shape_) {
-      throw NpyError(name_ + ": the header should give descr, fortran_order and shape");
+      throw base::InputError(name_ + ": the header should give descr, fortran_order and shape");
     }
   }
 
@@ -50,8 +52,8 @@ class HeaderParser {
 
  private:
   [[noreturn]] void Fail(const char* right) const {
-    throw NpyError(name_ + ": byte " + std::to_string(kHeaderOffset + location_) +
-                   " of the header should be " + right);
+    throw base::InputError(name_ + ": byte " + std::to_string(kHeaderOffset + location_) +
+                           " of the header should be " + right);
   }
 
   void SkipSpace() {
@@ -149,9 +151,10 @@ ElementType ParseType(const std::string& descr, const std::string& name) {
   for (const Type& each : kTypes) {
     if (descr == each.descr) return each.type;
   }
-  throw NpyError(name + ": its values are of type '" + descr.substr(0, 16) +
-                 "', should be '|i1', '<u2', '<i4' or '<f4': int8, uint16, int32 or float32, " +
-                 "little-endian");
+  throw base::InputError(
+      name + ": its values are of type '" + descr.substr(0, 16) +
+      "', should be '|i1', '<u2', '<i4' or '<f4': int8, uint16, int32 or float32, " +
+      "little-endian");
 }
 
 void CheckSize(const NpyArray& array, const std::string& name) {
@@ -161,9 +164,10 @@ void CheckSize(const NpyArray& array, const std::string& name) {
     overflow = __builtin_mul_overflow(size, extent, &size) || overflow;
   }
   if (!overflow && size == array.bytes.size()) return;
-  throw NpyError(name + ": its shape " + ShapeText(array.shape) + " of " + NameOf(array.type) +
-                 " takes " + (overflow ? "more than memory has" : std::to_string(size) + " bytes") +
-                 ", there are " + std::to_string(array.bytes.size()));
+  throw base::InputError(name + ": its shape " + ShapeText(array.shape) + " of " +
+                         NameOf(array.type) + " takes " +
+                         (overflow ? "more than memory has" : std::to_string(size) + " bytes") +
+                         ", there are " + std::to_string(array.bytes.size()));
 }
 
 }  // namespace
@@ -193,22 +197,22 @@ std::string NpyBytes(const NpyArray& array) {
 
 NpyArray ParseNpy(const std::string& bytes, const std::string& name) {
   if (bytes.compare(0, kMagic.size(), kMagic) != 0 || bytes.size() < kHeaderOffset) {
-    throw NpyError(name + ": not an array in NumPy's format");
+    throw base::InputError(name + ": not an array in NumPy's format");
   }
   const auto byte = [&bytes](size_t i) { return static_cast<uint8_t>(bytes[i]); };
   if (byte(6) != 1 || byte(7) != 0) {
-    throw NpyError(name + ": of version " + std::to_string(byte(6)) + "." +
-                   std::to_string(byte(7)) + " of NumPy's format, should be 1.0");
+    throw base::InputError(name + ": of version " + std::to_string(byte(6)) + "." +
+                           std::to_string(byte(7)) + " of NumPy's format, should be 1.0");
   }
   const size_t length = byte(8) + size_t{256} * byte(9);
   if (bytes.size() - kHeaderOffset < length) {
-    throw NpyError(name + ": cut off: its header has " + std::to_string(length) +
-                   " bytes, there are " + std::to_string(bytes.size() - kHeaderOffset));
+    throw base::InputError(name + ": cut off: its header has " + std::to_string(length) +
+                           " bytes, there are " + std::to_string(bytes.size() - kHeaderOffset));
   }
   HeaderParser header(std::string_view(bytes).substr(kHeaderOffset, length), name);
   header.Run();
   if (header.fortran_order()) {
-    throw NpyError(name + ": its values are in Fortran order, should be in C order");
+    throw base::InputError(name + ": its values are in Fortran order, should be in C order");
   }
   NpyArray array{ParseType(header.descr(), name), header.shape(),
                  bytes.substr(kHeaderOffset + length)};

@@ -4,7 +4,6 @@
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
-#include <stdexcept>
 #include <string>
 #include <type_traits>
 #include <utility>
@@ -51,18 +50,11 @@ std::vector<T> ValuesOf(const NpyArray& array) {
   return values;
 }
 
-// An array or an archive of arrays that can't be read or written: one line that names the file, the
-// array, what is wrong and what would be right.
-class NpyError : public std::runtime_error {
- public:
-  using std::runtime_error::runtime_error;
-};
-
 // The bytes of a .npy file.
 std::string NpyBytes(const NpyArray& array);
 
-// The array of a whole .npy file, whose sizes must be those of its bytes. Throws NpyError, which
-// begins with `name`.
+// The array of a whole .npy file, whose sizes must be those of its bytes. Throws
+// base::InputError, which begins with `name`.
 NpyArray ParseNpy(const std::string& bytes, const std::string& name);
 
 }  // namespace qz::arrays

@@ -17,11 +17,11 @@ struct NpzLimits {
   size_t file_bytes;  // of one .npy file, its header included
 };
 
-// All arrays by name, as NumPy names them: without ".npy". Stored or deflated. Throws NpyError.
+// All arrays by name, as NumPy names them: without ".npy". Stored or deflated. Throws
+// base::InputError.
 std::map<std::string, NpyArray> ReadNpz(const std::string& path, const NpzLimits& limits);
 
-// Writes an archive, not compressed, of the same bytes whenever it is written; into a temporary
-// file beside `path` that then takes its name. Throws NpyError; `path` is then as it was.
-void WriteNpz(const std::string& path, const std::vector<std::pair<std::string, NpyArray>>& arrays);
+// The bytes of an archive, not compressed: the same whenever it is made.
+std::string NpzBytes(const std::vector<std::pair<std::string, NpyArray>>& arrays);
 
 }  // namespace qz::arrays

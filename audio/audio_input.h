@@ -3,8 +3,9 @@
 #include <cstddef>
 #include <cstdint>
 #include <memory>
-#include <stdexcept>
 #include <string>
+
+#include "base/error.h"
 
 namespace qz::audio {
 
@@ -12,9 +13,9 @@ namespace qz::audio {
 constexpr uint32_t kSampleRateHz = 16000;
 
 // Audio that can't be used: one line that names the file, the place and what is wrong.
-class AudioError : public std::runtime_error {
+class AudioError : public base::InputError {
  public:
-  using std::runtime_error::runtime_error;
+  using base::InputError::InputError;
 };
 
 // A stream of 16-bit samples, mono at 16 kHz, in full scale ±32768. Memory does not grow with its

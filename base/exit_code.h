@@ -2,14 +2,18 @@
 
 namespace qz::base {
 
+// Exit codes of all programs of this project.
 enum ExitCode {
   kSuccess = 0,
-  kFaultFound = 1,  // or a difference, or output that can't be written
+  kFaultFound = 1,  // the run found a fault, a difference or an invalid model
   kUsage = 2,
-  kUnreadableInput = 3,  // or input that was skipped
-  // A module that can't be loaded; a program that can't be started, broke off or didn't play all;
-  // an interrupt of what is worth nothing unless it is whole. A run that is interrupted just ends.
-  kNotRunnable = 4,
+  kUnreadableInput = 3,  // or read in part
+  kNotRunnable = 4,      // a module that can't be loaded, a program that can't be started
+  kUnwritableOutput = 5,
+  // 128 and the number of the signal that interrupted the run, as shells count.
+  kHungUp = 129,
+  kInterrupted = 130,
+  kTerminated = 143,
 };
 
 }  // namespace qz::base

@@ -10,13 +10,13 @@
 namespace qz::base {
 namespace {
 
-volatile sig_atomic_t interrupted = 0;
+volatile sig_atomic_t first_signal = 0;  // 0: none yet
 // The handler writes a byte here, so that an interrupt just before poll() is not slept through.
 int wake_pipe[2] = {-1, -1};
 
-void OnInterrupt(int) {
+void OnInterrupt(int signal_number) {
   const int saved_errno = errno;
-  interrupted = 1;
+  if (first_signal == 0) first_signal = signal_number;
   [[maybe_unused]] const ssize_t written = write(wake_pipe[1], "", 1);
   errno = saved_errno;
 }
@@ -36,7 +36,12 @@ void CatchInterrupt() {
   if (before.sa_handler != SIG_IGN) sigaction(SIGHUP, &action, nullptr);
 }
 
-bool Interrupted() { return interrupted != 0; }
+bool Interrupted() { return first_signal != 0; }
+
+ExitCode ExitCodeAfterInterrupt(ExitCode result) {
+  if (!Interrupted() || result == kFaultFound || result == kUnwritableOutput) return result;
+  return static_cast<ExitCode>(128 + first_signal);
+}
 
 bool WaitReadable(int fd) {
   while (!Interrupted()) {

@@ -6,6 +6,8 @@
 #include <fstream>
 #include <map>
 
+#include "base/error.h"
+
 namespace qz::dataset {
 namespace {
 
@@ -32,16 +34,16 @@ Recording ParseLine(const std::string& line, const std::filesystem::path& folder
                     const std::string& location) {
   const std::vector<std::string> fields = Fields(line);
   if (fields.size() != 3) {
-    throw ManifestError(location + std::to_string(fields.size()) +
-                        " fields, should be 3 between tabs: file, class, fold");
+    throw base::InputError(location + std::to_string(fields.size()) +
+                           " fields, should be 3 between tabs: file, class, fold");
   }
-  if (fields[0] == "-") throw ManifestError(location + "the file is -, should be a file's name");
-  if (fields[0].empty()) throw ManifestError(location + "no file name before the first tab");
-  if (fields[1].empty()) throw ManifestError(location + "no class between the tabs");
+  if (fields[0] == "-") throw base::InputError(location + "the file is -, should be a file's name");
+  if (fields[0].empty()) throw base::InputError(location + "no file name before the first tab");
+  if (fields[1].empty()) throw base::InputError(location + "no class between the tabs");
   const int fold = FoldOf(fields[2]);
   if (fold < 0) {
-    throw ManifestError(location + "the fold is '" + fields[2] + "', should be 0 to " +
-                        std::to_string(kMaxFold));
+    throw base::InputError(location + "the fold is '" + fields[2] + "', should be 0 to " +
+                           std::to_string(kMaxFold));
   }
   return {(folder / fields[0]).string(), fields[1], fold};
 }
@@ -50,7 +52,7 @@ Recording ParseLine(const std::string& line, const std::filesystem::path& folder
 
 std::vector<Recording> ReadManifest(const std::string& path) {
   std::ifstream file(path);
-  if (!file) throw ManifestError(path + ": can't be opened: " + std::strerror(errno));
+  if (!file) throw base::InputError(path + ": can't be opened: " + std::strerror(errno));
   const std::filesystem::path folder = std::filesystem::path(path).parent_path();
   std::vector<Recording> recordings;
   std::map<std::string, int> lines;  // by file
@@ -65,17 +67,17 @@ std::vector<Recording> ReadManifest(const std::string& path) {
       // In two folds it would be learnt from and measured.
       const auto [before, is_new] = lines.emplace(recordings.back().file, number);
       if (!is_new) {
-        throw ManifestError(location + recordings.back().file + " stands in line " +
-                            std::to_string(before->second) + " already");
+        throw base::InputError(location + recordings.back().file + " stands in line " +
+                               std::to_string(before->second) + " already");
       }
     } else if (line != kHeader) {
-      throw ManifestError(location +
-                          "the first line should be: file, class, fold, with tabs between");
+      throw base::InputError(location +
+                             "the first line should be: file, class, fold, with tabs between");
     }
     headed = true;
   }
-  if (file.bad()) throw ManifestError(path + ": can't be read: " + std::strerror(errno));
-  if (recordings.empty()) throw ManifestError(path + ": lists no recording");
+  if (file.bad()) throw base::InputError(path + ": can't be read: " + std::strerror(errno));
+  if (recordings.empty()) throw base::InputError(path + ": lists no recording");
   return recordings;
 }
 

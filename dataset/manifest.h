@@ -1,7 +1,6 @@
 // Lists of labelled recordings: text, tab-separated, headed by the line "file class fold".
 #pragma once
 
-#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -13,17 +12,11 @@ struct Recording {
   int fold = 0;            // 1 and up; 0 belongs to no fold: always for training, never measured
 };
 
-// A manifest that can't be used: one line that names the file, the line, the value and what would
-// be right.
-class ManifestError : public std::runtime_error {
- public:
-  using std::runtime_error::runtime_error;
-};
-
 constexpr int kMaxFold = 99;
 
 // The recordings in the order of their lines. Empty lines and lines that begin with # say nothing;
-// names of files that are not absolute start from the manifest's own folder. Throws ManifestError.
+// names of files that are not absolute start from the manifest's own folder. Throws
+// base::InputError.
 std::vector<Recording> ReadManifest(const std::string& path);
 
 }  // namespace qz::dataset

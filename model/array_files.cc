@@ -5,14 +5,15 @@
 #include <vector>
 
 #include "arrays/npz_file.h"
+#include "base/output_file.h"
 
 namespace qz::model {
 namespace {
 
 using arrays::NpyArray;
 
-// Room for more than a model's 34 arrays, and for the largest of them in a type of eight bytes, so
-// that what is wrong can be said.
+// More than a model's 34 arrays, and the largest of them in a type of eight bytes, so that an error
+// can name what differs.
 constexpr arrays::NpzLimits kLimits = {128, 1 << 18};
 
 std::string ArrayName(const TableLayout& table, const char* array) {
@@ -52,16 +53,16 @@ class ArrayTaker {
   template <typename T>
   void Take(const std::string& name, const std::vector<size_t>& shape, std::vector<T>* values) {
     constexpr arrays::ElementType kType = arrays::ElementTypeOf<T>();
-    const std::string right = std::string(NameOf(kType)) + " " + arrays::ShapeText(shape);
+    const std::string expected = std::string(NameOf(kType)) + " " + arrays::ShapeText(shape);
     const auto found = found_.find(name);
     if (found == found_.end()) {
-      findings_.push_back(name + " is missing; " + right + " would be right.");
+      findings_.push_back(name + " is missing; expected " + expected + ".");
       return;
     }
     const NpyArray& array = found->second;
     if (array.type != kType || array.shape != shape) {
       findings_.push_back(name + " is " + NameOf(array.type) + " " +
-                          arrays::ShapeText(array.shape) + "; " + right + " would be right.");
+                          arrays::ShapeText(array.shape) + "; expected " + expected + ".");
     } else {
       *values = arrays::ValuesOf<T>(array);
     }
@@ -89,7 +90,7 @@ void WriteModelArrays(const std::string& path, const ModelArrays& arrays) {
     if (!table.HasScales()) continue;
     files.emplace_back(ArrayName(table, "scale"), arrays::MakeArray(outputs, arrays[i].scale));
   }
-  arrays::WriteNpz(path, files);
+  base::WriteOutputFile(path, arrays::NpzBytes(files));
 }
 
 }  // namespace qz::model

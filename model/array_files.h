@@ -12,12 +12,12 @@ namespace qz::model {
 //              [taps][channels]
 //   w6.bias    int32 [outputs], as in LayerArrays
 //   w6.scale   float32 [outputs]; not of w17 and w18
-// Throws arrays::NpyError if the archive can't be read, and PackingError about arrays that are
-// missing, unknown, or of a wrong type or shape.
+// Throws base::InputError if the archive can't be read, and PackingError about arrays that are
+// missing, unknown, or of another type or shape than expected.
 ModelArrays ReadModelArrays(const std::string& path);
 
-// Writes all or nothing, the same bytes for the same arrays. Throws arrays::NpyError. The sizes
-// are right, as of arrays that come from Unpack.
+// Writes the same bytes for the same arrays, as base::WriteOutputFile does. Throws
+// base::OutputError. The sizes are valid, as of arrays that come from Unpack.
 void WriteModelArrays(const std::string& path, const ModelArrays& arrays);
 
 }  // namespace qz::model

@@ -2,9 +2,10 @@
 
 #include <cstdint>
 #include <cstdio>
-#include <exception>
 #include <string>
 
+#include "base/output_file.h"
+#include "base/program.h"
 #include "model/check_weights.h"
 #include "model/describe.h"
 #include "model/labels.h"
@@ -14,17 +15,18 @@
 namespace qz::model {
 namespace {
 
-constexpr char kUsage[] =
+constexpr char kHelp[] =
     "usage: qz-model-tool synthetic --seed N -o FILE  write a synthetic model\n"
-    "       qz-model-tool check FILE                check a packed model\n"
-    "       qz-model-tool labels FILE               check the labels of a model's outputs\n"
-    "       qz-model-tool embed FILE -o HEADER      turn a valid packed model into a C++ header\n"
-    "       qz-model-tool describe -o FILE          write the detector's description as JSON\n"
-    "exit codes: 0 fine, 1 findings, 2 wrong usage, 3 a file that cannot be read or written\n";
+    "       qz-model-tool check FILE                 check a packed model\n"
+    "       qz-model-tool labels FILE                check the labels of a model's outputs\n"
+    "       qz-model-tool embed FILE -o HEADER       write a packed model as a C++ header\n"
+    "       qz-model-tool describe -o FILE           write the detector's description as JSON\n"
+    "       qz-model-tool --help | --version\n"
+    "exit codes: 0 fine, 1 not valid, 2 usage, 3 unreadable input, 5 unwritable output\n";
 
-int Usage(const std::string& error) {
-  std::fprintf(stderr, "qz-model-tool: %s\n%s", error.c_str(), kUsage);
-  return kWrongUsage;
+base::ExitCode UsageError(const std::string& message) {
+  std::fprintf(stderr, "qz-model-tool: %s\n%s", message.c_str(), kHelp);
+  return base::kUsage;
 }
 
 struct Arguments {
@@ -71,80 +73,81 @@ bool ParseSeed(const std::string& text, uint64_t& seed) {
   return !text.empty();
 }
 
-int Synthetic(const Arguments& arguments) {
+base::ExitCode Synthetic(const Arguments& arguments) {
   uint64_t seed;
   if (arguments.output.empty() || !arguments.file.empty()) {
-    return Usage("synthetic needs --seed N and -o FILE");
+    return UsageError("synthetic needs --seed N and -o FILE");
   }
   if (!ParseSeed(arguments.seed, seed)) {
-    return Usage("--seed needs an integer from 0 to 18446744073709551615, not '" + arguments.seed +
-                 "'");
+    return UsageError("--seed needs an integer from 0 to 18446744073709551615, not '" +
+                      arguments.seed + "'");
   }
   const PackedModel model = MakeSyntheticModel(seed);
-  WriteWholeFile(arguments.output, std::string(model.begin(), model.end()));
-  return kSuccess;
+  base::WriteOutputFile(arguments.output, std::string(model.begin(), model.end()));
+  return base::kSuccess;
 }
 
 // Reads and checks; prints the findings.
-int LoadValidModel(const std::string& file, PackedModel& model) {
+base::ExitCode LoadValidModel(const std::string& file, PackedModel& model) {
   model = ReadModelFile(file);
   const std::vector<std::string> findings = CheckWeights(model);
   std::fputs(FormatFindings(file, findings).c_str(), stderr);
-  return findings.empty() ? kSuccess : kFindings;
+  return findings.empty() ? base::kSuccess : base::kFaultFound;
 }
 
 bool IsOneFile(const Arguments& arguments) {
   return !arguments.file.empty() && arguments.output.empty() && arguments.seed.empty();
 }
 
-int CheckLabels(const Arguments& arguments) {
-  if (!IsOneFile(arguments)) return Usage("labels needs one FILE");
+base::ExitCode CheckLabels(const Arguments& arguments) {
+  if (!IsOneFile(arguments)) return UsageError("labels needs one FILE");
   ReadLabels(arguments.file);
-  return kSuccess;
+  return base::kSuccess;
 }
 
-int Check(const Arguments& arguments) {
-  if (!IsOneFile(arguments)) return Usage("check needs one FILE");
+base::ExitCode Check(const Arguments& arguments) {
+  if (!IsOneFile(arguments)) return UsageError("check needs one FILE");
   PackedModel model;
   return LoadValidModel(arguments.file, model);
 }
 
-int Embed(const Arguments& arguments) {
+base::ExitCode Embed(const Arguments& arguments) {
   if (arguments.file.empty() || arguments.output.empty() || !arguments.seed.empty()) {
-    return Usage("embed needs one FILE and -o HEADER");
+    return UsageError("embed needs one FILE and -o HEADER");
   }
+  base::CheckOutputFile(arguments.output, {arguments.file});
   PackedModel model;
-  const int result = LoadValidModel(arguments.file, model);
-  if (result != kSuccess) return result;
-  WriteWholeFile(arguments.output, TablesHeader(model));
-  return kSuccess;
+  const base::ExitCode result = LoadValidModel(arguments.file, model);
+  if (result != base::kSuccess) return result;
+  base::WriteOutputFile(arguments.output, TablesHeader(model));
+  return base::kSuccess;
 }
 
-int Describe(const Arguments& arguments) {
+base::ExitCode Describe(const Arguments& arguments) {
   if (arguments.output.empty() || !arguments.file.empty() || !arguments.seed.empty()) {
-    return Usage("describe needs -o FILE");
+    return UsageError("describe needs -o FILE");
   }
-  WriteWholeFile(arguments.output, DescriptionJson());
-  return kSuccess;
+  base::WriteOutputFile(arguments.output, DescriptionJson());
+  return base::kSuccess;
 }
 
 }  // namespace
 
-int RunModelCommand(const std::vector<std::string>& words) {
+base::ExitCode RunModelCommand(const std::vector<std::string>& words) {
   const std::string command = words.empty() ? "" : words[0];
-  const Arguments arguments = Parse(words);
-  try {
-    if (!arguments.error.empty()) return Usage(arguments.error);
-    if (command == "synthetic") return Synthetic(arguments);
-    if (command == "check") return Check(arguments);
-    if (command == "labels") return CheckLabels(arguments);
-    if (command == "embed") return Embed(arguments);
-    if (command == "describe") return Describe(arguments);
-    return Usage(command.empty() ? "no subcommand" : "unknown subcommand '" + command + "'");
-  } catch (const std::exception& error) {
-    std::fprintf(stderr, "qz-model-tool: %s\n", error.what());
-    return kFileTrouble;
+  if (command == "--help" || command == "--version") {
+    std::printf("%s\n%s", base::VersionLine("qz-model-tool").c_str(),
+                command == "--help" ? kHelp : "");
+    return base::kSuccess;
   }
+  const Arguments arguments = Parse(words);
+  if (!arguments.error.empty()) return UsageError(arguments.error);
+  if (command == "synthetic") return Synthetic(arguments);
+  if (command == "check") return Check(arguments);
+  if (command == "labels") return CheckLabels(arguments);
+  if (command == "embed") return Embed(arguments);
+  if (command == "describe") return Describe(arguments);
+  return UsageError(command.empty() ? "no subcommand" : "unknown subcommand '" + command + "'");
 }
 
 }  // namespace qz::model

@@ -1,43 +1,11 @@
 #include "model/model_files.h"
 
-#include <cerrno>
-#include <cstdio>
-#include <cstring>
-#include <filesystem>
-#include <memory>
-#include <stdexcept>
+#include <vector>
 
+#include "base/error.h"
 #include "model/check_weights.h"
 
 namespace qz::model {
-namespace {
-
-struct Closer {
-  void operator()(std::FILE* file) const { std::fclose(file); }
-};
-using File = std::unique_ptr<std::FILE, Closer>;
-
-[[noreturn]] void Fail(const std::string& path, const char* what, int error) {
-  throw std::runtime_error(path + ": " + what + ": " + std::strerror(error));
-}
-
-}  // namespace
-
-std::vector<uint8_t> ReadWholeFile(const std::string& path, size_t most) {
-  File file(std::fopen(path.c_str(), "rb"));
-  if (!file) Fail(path, "cannot open", errno);
-  std::vector<uint8_t> bytes;
-  uint8_t buffer[4096];
-  size_t got;
-  while ((got = std::fread(buffer, 1, sizeof(buffer), file.get())) > 0) {
-    bytes.insert(bytes.end(), buffer, buffer + got);
-    if (bytes.size() > most) {
-      throw std::runtime_error(path + ": has more than " + std::to_string(most) + " bytes");
-    }
-  }
-  if (std::ferror(file.get())) Fail(path, "cannot read", errno);
-  return bytes;
-}
 
 PackedModel ReadValidModel(const std::string& path) {
   PackedModel model = ReadModelFile(path);
@@ -45,33 +13,7 @@ PackedModel ReadValidModel(const std::string& path) {
   if (findings.empty()) return model;
   std::string line = path + ": " + findings[0];
   if (findings.size() > 1) line += " (and " + std::to_string(findings.size() - 1) + " more)";
-  throw std::runtime_error(line);
-}
-
-void CheckWritable(const std::string& path) {
-  const std::filesystem::file_status status = std::filesystem::status(path);
-  if (std::filesystem::exists(status) && !std::filesystem::is_regular_file(status)) {
-    throw std::runtime_error(path + ": can't be written: it is no regular file");
-  }
-  const std::string temporary = path + ".part";
-  File file(std::fopen(temporary.c_str(), "wb"));
-  if (!file) Fail(path, "can't be written", errno);
-  std::remove(temporary.c_str());
-}
-
-void WriteWholeFile(const std::string& path, const std::string& bytes) {
-  CheckWritable(path);
-  const std::string temporary = path + ".part";
-  File file(std::fopen(temporary.c_str(), "wb"));
-  if (!file) Fail(path, "can't be written", errno);
-  const bool written = std::fwrite(bytes.data(), 1, bytes.size(), file.get()) == bytes.size();
-  // Closing writes out what is still buffered, so it can fail as a write does.
-  const bool closed = std::fclose(file.release()) == 0;
-  if (!written || !closed || std::rename(temporary.c_str(), path.c_str()) != 0) {
-    const int error = errno;
-    std::remove(temporary.c_str());
-    Fail(path, "can't be written", error);
-  }
+  throw base::InputError(line);
 }
 
 std::string TablesHeader(const PackedModel& model) {

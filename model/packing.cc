@@ -147,7 +147,7 @@ LayerArrays UnpackTable(const PackedModel& model, const TableLayout& table,
 }  // namespace
 
 PackingError::PackingError(std::vector<std::string> findings)
-    : std::runtime_error(Headline(findings)), findings_(std::move(findings)) {}
+    : base::ModelError(Headline(findings)), findings_(std::move(findings)) {}
 
 PackedModel Pack(const ModelArrays& arrays) {
   PackedModel model(kModelBytes, 0);

@@ -3,10 +3,10 @@
 
 #include <array>
 #include <cstdint>
-#include <stdexcept>
 #include <string>
 #include <vector>
 
+#include "base/error.h"
 #include "model/weight_layout.h"
 
 namespace qz::model {
@@ -30,7 +30,7 @@ constexpr size_t WeightCount(const TableLayout& table) {
 
 // Arrays that make no valid model. Every finding is one sentence that names the array, the index,
 // the value and what was expected, in the order of the tables; there is at least one.
-class PackingError : public std::runtime_error {
+class PackingError : public base::ModelError {
  public:
   explicit PackingError(std::vector<std::string> findings);
   const std::vector<std::string>& findings() const { return findings_; }

@@ -1,30 +1,21 @@
 // qz: runs the sound event detector on a PC.
 
-#include <fcntl.h>
-
 #include <CLI/CLI.hpp>
 #include <cstdio>
-#include <exception>
 #include <string>
 #include <vector>
 
+#include "base/program.h"
 #include "tools/commands.h"
 #include "tools/kernel_versions.h"
 
 namespace {
 
-// A standard stream that is closed stays an error: nothing opened later may take its number.
-void OccupyStandardStreams() {
-  for (int fd = 0; fd <= 2; ++fd) {
-    if (fcntl(fd, F_GETFD) == -1) open("/dev/null", fd == 0 ? O_WRONLY : O_RDONLY);
-  }
-}
-
 std::vector<const CLI::App*> CommandsOf(const CLI::App& app) {
   return app.get_subcommands([](const CLI::App*) { return true; });
 }
 
-int NoCommand(const CLI::App& app) {
+qz::base::ExitCode NoCommand(const CLI::App& app) {
   std::string names;
   for (const CLI::App* command : CommandsOf(app)) {
     names += (names.empty() ? "" : ", ") + command->get_name();
@@ -35,12 +26,12 @@ int NoCommand(const CLI::App& app) {
   return qz::base::kUsage;
 }
 
-int Main(int argc, char** argv) {
-  CLI::App app("Sound event detector, run on a PC", "qz");
+qz::base::ExitCode Main(int argc, char** argv) {
+  CLI::App app(qz::base::VersionLine("qz") + ": runs the sound event detector on a PC", "qz");
   bool verbose = false;
   app.add_flag("--verbose", verbose, "with --version: the kernels' symbols too");
   app.set_version_flag("--version", [&verbose] {
-    return "qz " QZ_VERSION " (build " QZ_BUILD_NUMBER ")\n" + qz::tools::KernelVersions(verbose);
+    return qz::base::VersionLine("qz") + "\n" + qz::tools::KernelVersions(verbose);
   });
   app.failure_message([](const CLI::App* parsed, const CLI::Error& error) {
     const auto commands = parsed->get_subcommands();
@@ -66,11 +57,5 @@ int Main(int argc, char** argv) {
 }  // namespace
 
 int main(int argc, char** argv) {
-  OccupyStandardStreams();
-  try {
-    return Main(argc, argv);
-  } catch (const std::exception& error) {
-    std::fprintf(stderr, "qz: %s\n", error.what());
-    return qz::base::kFaultFound;
-  }
+  return qz::base::RunProgram("qz", [argc, argv] { return Main(argc, argv); });
 }

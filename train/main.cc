@@ -5,9 +5,9 @@
 
 #include <CLI/CLI.hpp>
 #include <cstdio>
-#include <exception>
 #include <filesystem>
 
+#include "base/program.h"
 #include "train/arithmetic.h"
 #include "train/prove_model_command.h"
 #include "train/train_command.h"
@@ -57,8 +57,9 @@ CLI::App* AddFit(CLI::App* app, TrainOptions* options) {
   return train;
 }
 
-int Main(int argc, char** argv) {
-  CLI::App app("Trains the sound event detector", "qz-train");
+qz::base::ExitCode Main(int argc, char** argv) {
+  CLI::App app(qz::base::VersionLine("qz-train") + ": trains the sound event detector", "qz-train");
+  app.set_version_flag("--version", [] { return qz::base::VersionLine("qz-train"); });
   app.require_subcommand(1);
   TrainOptions options;
   options.labels_file = DefaultLabels();
@@ -88,10 +89,5 @@ int Main(int argc, char** argv) {
 }  // namespace
 
 int main(int argc, char** argv) {
-  try {
-    return Main(argc, argv);
-  } catch (const std::exception& error) {
-    std::fprintf(stderr, "qz-train: %s\n", error.what());
-    return qz::base::kUnreadableInput;
-  }
+  return qz::base::RunProgram("qz-train", [argc, argv] { return Main(argc, argv); });
 }

@@ -2,8 +2,9 @@
 
 #include <algorithm>
 #include <cmath>
-#include <stdexcept>
 #include <string>
+
+#include "base/error.h"
 
 namespace qz::train {
 namespace {
@@ -97,10 +98,10 @@ QuantisedParameters ParametersOf(const model::ModelArrays& arrays) {
     if (kPlan[i].depthwise()) continue;
     for (const int32_t bias : layer.bias) {
       if (std::abs(static_cast<float>(bias)) > kMaxBias) {
-        throw std::runtime_error(std::string(kPlan[i].layout().name) + ": a bias is " +
-                                 std::to_string(bias) +
-                                 ", expected at most 8,000,000: beyond, the trainer's sums are "
-                                 "not exact");
+        throw base::InputError(std::string(kPlan[i].layout().name) + ": a bias is " +
+                               std::to_string(bias) +
+                               ", expected at most 8,000,000: beyond, the trainer's sums are "
+                               "not exact");
       }
     }
     std::copy(layer.bias.begin(), layer.bias.end(),

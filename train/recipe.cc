@@ -9,6 +9,7 @@
 #include <sstream>
 #include <stdexcept>
 
+#include "base/error.h"
 #include "config/detector.h"
 
 namespace qz::train {
@@ -70,11 +71,11 @@ std::string Number(double value) {
 // What no single value tells.
 void CheckRanges(const Recipe& recipe, const std::string& path) {
   if (recipe.batch % 2 != 0) {
-    throw std::runtime_error(path + ": batch is " + std::to_string(recipe.batch) +
-                             ", should be even: two threads share it");
+    throw base::InputError(path + ": batch is " + std::to_string(recipe.batch) +
+                           ", should be even: two threads share it");
   }
   if (recipe.min_gain > recipe.max_gain || recipe.min_snr > recipe.max_snr) {
-    throw std::runtime_error(path + ": a lowest gain or SNR is above the highest");
+    throw base::InputError(path + ": a lowest gain or SNR is above the highest");
   }
 }
 
@@ -91,7 +92,7 @@ void SetInRecipe(const std::string& name, const std::string& value, Recipe* reci
       line += " is '" + value + "', should be a ";
       line += entry.whole != nullptr ? "whole number from " : "number from ";
       line += Number(entry.low) + " to " + Number(entry.high);
-      throw std::runtime_error(line);
+      throw base::InputError(line);
     }
     if (entry.whole != nullptr) {
       recipe->*entry.whole = static_cast<int>(number);
@@ -100,12 +101,12 @@ void SetInRecipe(const std::string& name, const std::string& value, Recipe* reci
     }
     return;
   }
-  throw std::runtime_error("a recipe knows no '" + name + "'");
+  throw base::InputError("a recipe knows no '" + name + "'");
 }
 
 Recipe ReadRecipe(const std::string& path) {
   std::ifstream file(path);
-  if (!file) throw std::runtime_error(path + ": can't be opened: " + std::strerror(errno));
+  if (!file) throw base::InputError(path + ": can't be opened: " + std::strerror(errno));
   Recipe recipe;
   std::string line;
   for (int number = 1; std::getline(file, line); ++number) {
@@ -114,15 +115,15 @@ Recipe ReadRecipe(const std::string& path) {
     if (!(words >> name)) continue;
     const std::string location = path + ": line " + std::to_string(number) + ": ";
     if (!(words >> value) || words >> more) {
-      throw std::runtime_error(location + "should be a name and a value");
+      throw base::InputError(location + "should be a name and a value");
     }
     try {
       SetInRecipe(name, value, &recipe);
     } catch (const std::runtime_error& error) {
-      throw std::runtime_error(location + error.what());
+      throw base::InputError(location + error.what());
     }
   }
-  if (file.bad()) throw std::runtime_error(path + ": can't be read: " + std::strerror(errno));
+  if (file.bad()) throw base::InputError(path + ": can't be read: " + std::strerror(errno));
   CheckRanges(recipe, path);
   return recipe;
 }

@@ -2,10 +2,12 @@
 
 #include <cstring>
 #include <filesystem>
-#include <stdexcept>
 
 #include "base/digest.h"
-#include "model/model_files.h"
+#include "base/error.h"
+#include "base/input_file.h"
+#include "base/output_file.h"
+#include "model/weight_layout.h"
 
 namespace qz::train {
 namespace {
@@ -67,25 +69,25 @@ void WriteState(const std::string& path, const std::string& fingerprint,
     digest = base::Digest(field, size, digest);
   });
   bytes.append(reinterpret_cast<const char*>(&digest), sizeof(digest));
-  model::WriteWholeFile(path, bytes);
+  base::WriteOutputFile(path, bytes);
 }
 
 std::optional<TrainingState> ReadState(const std::string& path, const std::string& fingerprint) {
   if (!std::filesystem::exists(path)) return std::nullopt;
-  const std::vector<uint8_t> bytes = model::ReadWholeFile(path, kMaxBytes);
+  const std::vector<uint8_t> bytes = base::ReadWholeFile(path, kMaxBytes);
   if (bytes.size() < fingerprint.size() + sizeof(uint64_t) ||
       std::memcmp(bytes.data(), fingerprint.data(), fingerprint.size()) != 0) {
-    throw std::runtime_error(path +
-                             ": is of another run (recipe, seed or clips differ); remove it "
-                             "or name another file");
+    throw base::InputError(path +
+                           ": is of another run (recipe, seed or clips differ); remove it "
+                           "or name another file");
   }
   // As many teachers as the size tells.
   TrainingState state;
   const size_t fields = SizeOf(state), teacher = kParameters.all * sizeof(float);
   const size_t held = bytes.size() - fingerprint.size() - sizeof(uint64_t);
   if (held < fields || (held - fields) % teacher != 0) {
-    throw std::runtime_error(path + ": has " + std::to_string(bytes.size()) +
-                             " bytes, which is not whole; remove it to begin anew");
+    throw base::InputError(path + ": has " + std::to_string(bytes.size()) +
+                           " bytes, which is not whole; remove it to begin anew");
   }
   state.teachers.assign((held - fields) / teacher, Values(kParameters.all));
   size_t next = fingerprint.size();
@@ -94,7 +96,7 @@ std::optional<TrainingState> ReadState(const std::string& path, const std::strin
     next += size;
   });
   if (base::Digest(bytes.data() + fingerprint.size(), held) != model::Load<uint64_t>(bytes, next)) {
-    throw std::runtime_error(path + ": is damaged; remove it to begin anew");
+    throw base::InputError(path + ": is damaged; remove it to begin anew");
   }
   return state;
 }

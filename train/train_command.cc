@@ -3,10 +3,10 @@
 #include <cstdio>
 #include <filesystem>
 #include <optional>
-#include <stdexcept>
 
+#include "base/error.h"
 #include "base/interrupt.h"
-#include "model/model_files.h"
+#include "base/output_file.h"
 #include "model/packing.h"
 #include "train/equivalence.h"
 #include "train/state_file.h"
@@ -77,7 +77,7 @@ base::ExitCode Run::Execute() {
   if (!options_.state_file.empty()) {
     if (auto stopped = ReadState(options_.state_file, fingerprint_)) {
       if (!trainer.Accepts(*stopped)) {
-        throw std::runtime_error(options_.state_file + ": is no state of this run; remove it");
+        throw base::InputError(options_.state_file + ": is no state of this run; remove it");
       }
       state = std::move(*stopped);
       std::fprintf(stderr, "%s: going on after epoch %d\n", options_.state_file.c_str(),
@@ -89,7 +89,7 @@ base::ExitCode Run::Execute() {
     std::fprintf(stderr, "qz-train: stopped after epoch %d; %s\n", state.epoch,
                  options_.state_file.empty() ? "nothing is kept without --state"
                                              : "the same command goes on");
-    return base::kNotRunnable;
+    return base::ExitCodeAfterInterrupt(base::kNotRunnable);
   }
   if (!Finish(state)) return base::kFaultFound;
   return skipped_ == 0 ? base::kSuccess : base::kUnreadableInput;
@@ -97,11 +97,15 @@ base::ExitCode Run::Execute() {
 
 // Now, not after an hour.
 void Run::CheckOffsets() const {
-  if (options_.output == options_.state_file) {
-    throw std::runtime_error(options_.output + ": can't be the model and the state at once");
+  const std::string& state = options_.state_file;
+  const std::vector<std::string> inputs = {options_.manifest, options_.recipe_file,
+                                           options_.labels_file};
+  base::CheckOutputFile(options_.output, inputs);
+  if (state.empty()) return;
+  if (base::IsSameFile(options_.output, state)) {
+    throw base::OutputError(options_.output + ": can't be the model and the state at once");
   }
-  model::CheckWritable(options_.output);
-  if (!options_.state_file.empty()) model::CheckWritable(options_.state_file);
+  base::CheckOutputFile(state, inputs);
 }
 
 void Run::Load() {
@@ -129,8 +133,8 @@ void Run::CheckClasses() const {
       bool found = false;
       for (const Clip& clip : clips) found |= clip.output == output;
       if (found) continue;
-      throw std::runtime_error(options_.manifest + ": no clip of the class '" +
-                               labels_[static_cast<size_t>(output)].class_name + "' " + purpose);
+      throw base::InputError(options_.manifest + ": no clip of the class '" +
+                             labels_[static_cast<size_t>(output)].class_name + "' " + purpose);
     }
   };
   check(trained_, "to learn from");
@@ -196,7 +200,7 @@ bool Run::Finish(const TrainingState& state) const {
   const EquivalenceCheck check = Prove(quantised, packed, features);
   std::printf("%s\n", Message(check).c_str());
   if (!check.difference.empty()) return false;
-  model::WriteWholeFile(options_.output, std::string(packed.begin(), packed.end()));
+  base::WriteOutputFile(options_.output, std::string(packed.begin(), packed.end()));
   if (!options_.state_file.empty()) std::filesystem::remove(options_.state_file);
   return true;
 }

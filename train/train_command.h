@@ -19,7 +19,7 @@ struct TrainOptions {
   int threads = 2;
 };
 
-// Learns from a list of recordings and writes a packed model. Says what went wrong itself.
+// Learns from a list of recordings and writes a packed model. Throws base::Error.
 base::ExitCode TrainCommand(const TrainOptions& options);
 
 }  // namespace qz::train

@@ -3,10 +3,8 @@
 
 #include <gmock/gmock.h>
 
-#include <fstream>
-#include <iterator>
-
 #include "arrays/npz_file.h"
+#include "base/error.h"
 #include "tests/support/temporary_folder.h"
 
 namespace qz::arrays {
@@ -29,7 +27,7 @@ std::string Header(const std::string& descr, const std::string& shape) {
 std::string ErrorOf(const std::string& bytes) {
   try {
     ParseNpy(bytes, "x");
-  } catch (const NpyError& error) {
+  } catch (const base::InputError& error) {
     return error.what();
   }
   return "none";
@@ -102,7 +100,7 @@ class Npz : public testing::Test {
   std::string ErrorOf(const std::string& bytes, const NpzLimits& limits = {2, 256}) {
     try {
       ReadNpz(folder_.WriteBytes("a.npz", bytes), limits);
-    } catch (const NpyError& error) {
+    } catch (const base::InputError& error) {
       return std::string(error.what()).substr(folder_.Path("a.npz").size());
     }
     return {};
@@ -117,20 +115,12 @@ TEST_F(Npz, HoldsWhatWasPutIn) {
   EXPECT_THAT(ValuesOf<int8_t>(arrays.at("x")), ElementsAre(7, -8, 9));
   EXPECT_THAT(ValuesOf<int32_t>(arrays.at("w0.bias")), ElementsAre(70000));
 
-  const std::string path = folder_.Path("b.npz");
-  WriteNpz(path, {arrays.begin(), arrays.end()});
-  const auto again = ReadNpz(path, {2, 256});
+  const std::string bytes = NpzBytes({arrays.begin(), arrays.end()});
+  const auto again = ReadNpz(folder_.WriteBytes("b.npz", bytes), {2, 256});
   ASSERT_EQ(again.size(), 2u);
   EXPECT_EQ(again.at("w0.bias").shape, arrays.at("w0.bias").shape);
   EXPECT_EQ(again.at("x").bytes, arrays.at("x").bytes);
-  std::ifstream file(path, std::ios::binary);
-  const std::string bytes(std::istreambuf_iterator<char>(file), {});
   EXPECT_EQ(bytes.substr(8, 6), std::string("\0\0\0\0\x21\0", 6)) << "stored, midnight, 1980-01-01";
-
-  EXPECT_THROW(WriteNpz(folder_.Path("none/b.npz"), {}), NpyError);
-  std::filesystem::create_directories(folder_.Path("way/inner"));
-  EXPECT_THROW(WriteNpz(folder_.Path("way"), {}), NpyError);
-  EXPECT_FALSE(std::filesystem::exists(folder_.Path("way.part")));
 }
 
 TEST_F(Npz, RefusesWhatIsTooLargeOrDamaged) {
@@ -150,7 +140,7 @@ TEST_F(Npz, RefusesWhatIsTooLargeOrDamaged) {
   other_method[other_method.find("PK\1\2") + 10] = 12;
   EXPECT_THAT(ErrorOf(other_method), HasSubstr(": x: is encrypted or packed by another method"));
   EXPECT_EQ(ErrorOf("no archive"), ": not an archive of arrays (.npz)");
-  EXPECT_THROW(ReadNpz(folder_.Path("absent"), {2, 256}), NpyError);
+  EXPECT_THROW(ReadNpz(folder_.Path("absent"), {2, 256}), base::InputError);
   // The last two bytes only say how long a comment is.
   for (size_t size = 0; size < archive_.size() - 2; size += 3) {
     EXPECT_NE(ErrorOf(archive_.substr(0, size)), "") << size;

@@ -6,6 +6,7 @@
 
 #include <string>
 
+#include "base/error.h"
 #include "tests/support/temporary_folder.h"
 
 namespace qz::dataset {
@@ -20,7 +21,7 @@ class Manifest : public testing::Test, protected test::TemporaryFolder {
   std::string ErrorOf(const std::string& text) const {
     try {
       ReadManifest(WriteBytes("list.tsv", text));
-    } catch (const ManifestError& error) {
+    } catch (const base::InputError& error) {
       return error.what();
     }
     return "none";
@@ -55,8 +56,8 @@ TEST_F(Manifest, NamesTheLineThatIsWrong) {
       {kHeader + "a.wav\train\t-1\n", "line 2: the fold is '-1', should be 0 to 99"},
       {kHeader + "a.wav\train\t 1\n", "line 2: the fold is ' 1', should be 0 to 99"}};
   for (const auto& [text, message] : cases) EXPECT_THAT(ErrorOf(text), StartsWith(list + message));
-  EXPECT_THROW(ReadManifest(Path("absent.tsv")), ManifestError);
-  EXPECT_THROW(ReadManifest(Path("")), ManifestError) << "a folder";
+  EXPECT_THROW(ReadManifest(Path("absent.tsv")), base::InputError);
+  EXPECT_THROW(ReadManifest(Path("")), base::InputError) << "a folder";
 }
 
 }  // namespace

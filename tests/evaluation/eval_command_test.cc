@@ -144,7 +144,7 @@ TEST_F(EvalCommand, SaysInOneLineWhyItMeasuresNothing) {
     EXPECT_EQ(std::count(err_.begin(), err_.end(), '\n'), 1) << err_;
     EXPECT_FALSE(std::filesystem::exists(Path("s")));
   }
-  EXPECT_EQ(Eval("list.tsv --scores-out absent/s"), 1);
+  EXPECT_EQ(Eval("list.tsv --scores-out absent/s"), 5);
   EXPECT_THAT(err_, HasSubstr("qz: absent/s"));
 }
 

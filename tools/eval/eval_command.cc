@@ -1,11 +1,11 @@
 #include "tools/eval/eval_command.h"
 
 #include <cstdio>
-#include <stdexcept>
 #include <utility>
 
-#include "audio/audio_input.h"
+#include "base/error.h"
 #include "base/interrupt.h"
+#include "base/output_file.h"
 #include "dataset/clip.h"
 #include "dataset/manifest.h"
 #include "evaluation/clip_scores.h"
@@ -38,8 +38,8 @@ void RequireAllClasses(const Job& job, const model::Labels& labels, const std::s
   if (missing.empty()) return;
   const std::string fold =
       job.part.fold > 0 ? ": fold " + std::to_string(job.part.fold) : std::string();
-  throw std::runtime_error(manifest + fold + ": no clip of " + missing + condition +
-                           ", should be one or more of each");
+  throw base::InputError(manifest + fold + ": no clip of " + missing + condition +
+                         ", should be one or more of each");
 }
 
 class Eval {
@@ -50,6 +50,8 @@ class Eval {
 
  private:
   void Prepare();
+  // Now, not after the work.
+  void CheckScoresOut(const std::vector<dataset::Recording>& recordings) const;
   void ScoreAll();
   // False, and said, if the clip can't be read.
   bool Score(const PackedModel& packed, ScoredClip* clip);
@@ -78,16 +80,26 @@ void Eval::Prepare() {
     }
     RequireAllClasses(job, labels_, options_.manifest, "");
   }
+  CheckScoresOut(recordings);
+}
+
+void Eval::CheckScoresOut(const std::vector<dataset::Recording>& recordings) const {
+  if (options_.scores_out.empty()) return;
+  std::vector<std::string> inputs = {options_.manifest, options_.labels};
+  inputs.reserve(inputs.size() + options_.parts.size() + recordings.size());
+  for (const EvalOptions::Part& part : options_.parts) inputs.push_back(part.model);
+  for (const dataset::Recording& recording : recordings) inputs.push_back(recording.file);
+  base::CheckOutputFile(options_.scores_out, inputs);
 }
 
 bool Eval::Score(const PackedModel& packed, ScoredClip* clip) {
   try {
     std::vector<int16_t> samples = dataset::ReadClip(clip->file);
-    if (samples.empty()) throw audio::AudioError(clip->file + ": holds no sound");
+    if (samples.empty()) throw base::InputError(clip->file + ": holds no sound");
     clip->samples = samples.size();
     clip->max = evaluation::ScoreClip(packed, std::move(samples)).max;
     return true;
-  } catch (const audio::AudioError& error) {
+  } catch (const base::InputError& error) {
     console_.Message("qz: skipped: " + std::string(error.what()));
     return false;
   }
@@ -150,28 +162,16 @@ void Eval::Print() {
 
 base::ExitCode Eval::Execute() {
   base::CatchInterrupt();
-  try {
-    Prepare();
-    ScoreAll();
-    if (base::Interrupted()) {
-      console_.Message("qz: interrupted; figures of some clips would mislead");
-      return base::kNotRunnable;
-    }
-  } catch (const std::runtime_error& error) {
-    console_.Message(std::string("qz: ") + error.what());
-    return base::kUnreadableInput;
+  Prepare();
+  ScoreAll();
+  if (base::Interrupted()) {
+    console_.Message("qz: interrupted; metrics of some clips only would mislead");
+    return base::kNotRunnable;
   }
   Print();
-  std::string fault = console_.OutputFault();
-  try {
-    if (!options_.scores_out.empty()) model::WriteWholeFile(options_.scores_out, ScoresTable());
-  } catch (const std::runtime_error& error) {
-    fault = error.what();
-  }
-  if (!fault.empty()) {
-    console_.Message("qz: " + fault);
-    return base::kFaultFound;
-  }
+  if (!options_.scores_out.empty()) base::WriteOutputFile(options_.scores_out, ScoresTable());
+  const std::string fault = console_.OutputFault();
+  if (!fault.empty()) throw base::OutputError(fault);
   return skipped_ > 0 ? base::kUnreadableInput : base::kSuccess;
 }
 

@@ -19,9 +19,9 @@ struct EvalOptions {
   bool json = false;
 };
 
-// Scores the clips of a manifest, each from a fresh start, and prints how well they were told
-// apart: the figures of each part and the means over the parts. Clips that can't be read are named,
-// left out and counted, and make the exit code kUnreadableInput. Says what went wrong itself.
+// Scores the clips of a manifest, each from a fresh start, and prints the metrics of each part and
+// their means over the parts. Clips that can't be read are named, left out and counted, and make
+// the exit code kUnreadableInput. Throws base::InputError and base::OutputError.
 base::ExitCode EvalCommand(const EvalOptions& options);
 
 }  // namespace qz::tools

@@ -3,16 +3,15 @@
 #include <cctype>
 #include <filesystem>
 #include <set>
-#include <stdexcept>
 #include <utility>
 
 #include "arrays/npy_file.h"
-#include "audio/audio_input.h"
+#include "base/error.h"
 #include "base/interrupt.h"
+#include "base/output_file.h"
 #include "dataset/clip.h"
 #include "dataset/clip_features.h"
 #include "dataset/manifest.h"
-#include "model/model_files.h"
 #include "tools/console.h"
 
 namespace qz::tools {
@@ -49,6 +48,7 @@ class Features {
   void AddJob(dataset::Recording sound, const fs::path& folder);
   // Says so if the sound can't be read.
   void Write(const Job& job);
+  void RemoveEarlierList() const;
   base::ExitCode WriteAll();
   base::ExitCode Conclude();
 
@@ -92,15 +92,16 @@ void Features::Write(const Job& job) {
   std::vector<int16_t> samples;
   try {
     samples = dataset::ReadClip(job.sound.file);
-  } catch (const audio::AudioError& error) {
+  } catch (const base::InputError& error) {
     console_.Message("qz: skipped: " + std::string(error.what()));
     return;
   }
   if (base::Interrupted()) return;  // in the midst of a sound, perhaps
   const size_t frames = dataset::FramesOf(samples.size());
   const fs::path path = folder_ / job.output;
-  if (path.has_parent_path()) fs::create_directories(path.parent_path());
-  model::WriteWholeFile(path.string(), arrays::NpyBytes(arrays::MakeArray(
+  if (path.has_parent_path()) base::MakeOutputFolder(path.parent_path().string());
+  base::CheckOutputFile(path.string(), {job.sound.file, options_.manifest});
+  base::WriteOutputFile(path.string(), arrays::NpyBytes(arrays::MakeArray(
                                            {frames, dataset::kFeatureChannels},
                                            dataset::FeaturesOf(samples.data(), samples.size()))));
   list_ += job.output + '\t' + job.sound.class_name + '\t' + std::to_string(job.sound.fold) + '\n';
@@ -108,9 +109,18 @@ void Features::Write(const Job& job) {
   ++written_;
 }
 
+// So that no list of an earlier run lies beside arrays of this one.
+void Features::RemoveEarlierList() const {
+  const std::string list = (folder_ / kList).string();
+  if (!fs::exists(list)) return;
+  base::CheckOutputFile(list, {options_.manifest});
+  std::error_code error;
+  if (!fs::is_symlink(list)) fs::remove(list, error);
+  if (error) throw base::OutputError(list + ": can't be removed: " + error.message());
+}
+
 base::ExitCode Features::WriteAll() {
-  // No list of an earlier run beside arrays of this one.
-  if (!options_.manifest.empty()) fs::remove(folder_ / kList);
+  if (!options_.manifest.empty()) RemoveEarlierList();
   size_t done = 0;
   for (const Job& job : jobs_) {
     Write(job);
@@ -122,7 +132,7 @@ base::ExitCode Features::WriteAll() {
     console_.ClipProgress(++done, jobs_.size());
   }
   if (!options_.manifest.empty() && written_ > 0) {
-    model::WriteWholeFile((folder_ / kList).string(), list_);
+    base::WriteOutputFile((folder_ / kList).string(), list_);
   }
   return Conclude();
 }
@@ -141,20 +151,12 @@ base::ExitCode Features::Conclude() {
 
 base::ExitCode Features::Execute() {
   base::CatchInterrupt();
-  try {
-    if (options_.manifest.empty()) {
-      ListFiles();
-    } else {
-      ListManifest();
-    }
-    return WriteAll();
-  } catch (const dataset::ManifestError& error) {
-    console_.Message(std::string("qz: ") + error.what());
-    return base::kUnreadableInput;
-  } catch (const std::runtime_error& error) {  // of writing
-    console_.Message(std::string("qz: ") + error.what());
-    return base::kFaultFound;
+  if (options_.manifest.empty()) {
+    ListFiles();
+  } else {
+    ListManifest();
   }
+  return WriteAll();
 }
 
 }  // namespace

@@ -17,8 +17,8 @@ struct FeaturesOptions {
 // uint16 [frames][48], as NumPy arrays: FOLDER/NAME.npy; of a manifest FOLDER/CLASS/NAME.npy, and
 // the list of them with their classes and folds, in the form of a manifest, FOLDER/features.tsv.
 // Where a name is taken by an earlier sound, a number follows it: NAME-2.npy. Sounds that can't be
-// read are named, left out and counted, and make the exit code kUnreadableInput. Says what went
-// wrong itself.
+// read are named, left out and counted, and make the exit code kUnreadableInput. Throws
+// base::InputError and base::OutputError.
 base::ExitCode FeaturesCommand(const FeaturesOptions& options);
 
 }  // namespace qz::tools

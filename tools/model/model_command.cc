@@ -1,11 +1,9 @@
 #include "tools/model/model_command.h"
 
 #include <cstdio>
-#include <stdexcept>
 #include <vector>
 
-#include "arrays/npy_file.h"
-#include "audio/audio_input.h"
+#include "base/output_file.h"
 #include "dataset/clip.h"
 #include "evaluation/clip_scores.h"
 #include "model/array_files.h"
@@ -31,30 +29,16 @@ void PrintFindings(const std::string& file, const std::vector<std::string>& find
   console->Message(WithoutLastLineEnd(model::FormatFindings(file, findings)));
 }
 
-base::ExitCode Fail(const std::exception& error, base::ExitCode exit_code, Console* console) {
-  console->Message(std::string("qz: ") + error.what());
-  return exit_code;
-}
-
 base::ExitCode OutputResult(base::ExitCode result, Console* console) {
   const std::string fault = console->OutputFault();
   if (fault.empty()) return result;
   console->Message("qz: " + fault);
-  return base::kFaultFound;
+  return base::kUnwritableOutput;
 }
 
-base::ExitCode ReadModel(const std::string& file, PackedModel* packed, Console* console) {
-  try {
-    *packed = model::ReadModelFile(file);
-    return base::kSuccess;
-  } catch (const std::runtime_error& error) {
-    return Fail(error, base::kUnreadableInput, console);
-  }
-}
-
+// Prints the findings about a model that is not valid.
 base::ExitCode ReadValidModel(const std::string& file, PackedModel* packed, Console* console) {
-  const base::ExitCode result = ReadModel(file, packed, console);
-  if (result != base::kSuccess) return result;
+  *packed = model::ReadModelFile(file);
   const std::vector<std::string> findings = model::CheckWeights(*packed);
   if (findings.empty()) return base::kSuccess;
   PrintFindings(file, findings, console);
@@ -84,9 +68,7 @@ size_t CheckOneTable(const std::string& file, const PackedModel& packed,
 
 base::ExitCode ModelCheckCommand(const std::string& file) {
   Console console;
-  PackedModel packed;
-  const base::ExitCode result = ReadModel(file, &packed, &console);
-  if (result != base::kSuccess) return result;
+  const PackedModel packed = model::ReadModelFile(file);
   if (packed.size() != model::kModelBytes) {
     console.Data(WithoutLastLineEnd(model::FormatFindings(file, model::CheckWeights(packed))));
     return OutputResult(base::kFaultFound, &console);
@@ -114,30 +96,26 @@ base::ExitCode ModelInfoCommand(const std::string& file, const std::string& clip
     return OutputResult(base::kSuccess, &console);
   } catch (const model::PackingError& error) {
     PrintFindings(file, error.findings(), &console);
-    return base::kFaultFound;
-  } catch (const audio::AudioError& error) {
-    return Fail(error, base::kUnreadableInput, &console);
+    return error.exit_code();
   }
 }
 
 base::ExitCode ModelImportCommand(const std::string& arrays, const std::string& output) {
   Console console;
+  base::CheckOutputFile(output, {arrays});
   try {
     const PackedModel packed = model::Pack(model::ReadModelArrays(arrays));
-    model::WriteWholeFile(output, std::string(packed.begin(), packed.end()));
+    base::WriteOutputFile(output, std::string(packed.begin(), packed.end()));
     return base::kSuccess;
   } catch (const model::PackingError& error) {
     PrintFindings(arrays, error.findings(), &console);
-    return base::kFaultFound;
-  } catch (const arrays::NpyError& error) {
-    return Fail(error, base::kUnreadableInput, &console);
-  } catch (const std::runtime_error& error) {  // of writing
-    return Fail(error, base::kFaultFound, &console);
+    return error.exit_code();
   }
 }
 
 base::ExitCode ModelExportCommand(const std::string& file, const std::string& output) {
   Console console;
+  base::CheckOutputFile(output, {file});
   PackedModel packed;
   const base::ExitCode result = ReadValidModel(file, &packed, &console);
   if (result != base::kSuccess) return result;
@@ -146,9 +124,7 @@ base::ExitCode ModelExportCommand(const std::string& file, const std::string& ou
     return base::kSuccess;
   } catch (const model::PackingError& error) {
     PrintFindings(file, error.findings(), &console);
-    return base::kFaultFound;
-  } catch (const arrays::NpyError& error) {
-    return Fail(error, base::kFaultFound, &console);
+    return error.exit_code();
   }
 }
 

@@ -1,6 +1,5 @@
-// The subcommands of qz model. All say what went wrong themselves: kUnreadableInput for a file that
-// can't be read, kFaultFound for a model that is not sound and for a file that can't be written,
-// which then stays as it was.
+// The subcommands of qz model. All return kFaultFound for a model that is not valid, whose findings
+// they print, and throw base::InputError and base::OutputError.
 #pragma once
 
 #include <string>
@@ -9,11 +8,11 @@
 
 namespace qz::tools {
 
-// Prints table by table whether a packed model is sound, or else what is wrong and where.
+// Prints table by table whether a packed model is valid, or else what is wrong and where.
 base::ExitCode ModelCheckCommand(const std::string& file);
 
-// Prints what is in the tables of a sound packed model, and, unless `clip` is empty, what the
-// network's tensors hold while it hears that sound file and the silence behind it.
+// Prints what is in the tables of a valid packed model, and, unless `clip` is empty, the values of
+// the network's tensors over that sound file and the silence behind it.
 base::ExitCode ModelInfoCommand(const std::string& file, const std::string& clip);
 
 // Packs the arrays of an .npz file.

@@ -5,6 +5,7 @@
 
 #include "audio/audio_input.h"
 #include "audio/temporary_file.h"
+#include "base/error.h"
 #include "base/interrupt.h"
 #include "tools/console.h"
 #include "tools/prove/traced_build.h"
@@ -29,7 +30,7 @@ void Decode(audio::AudioInput* input, RawAudio* audio) {
     ++audio->buffers;
   });
   while (const size_t got = input->Read(chunker.space(), chunker.space_samples())) {
-    if (base::Interrupted()) throw BuildError("interrupted");
+    if (base::Interrupted()) throw base::LaunchError("interrupted");
     chunker.Commit(got);
   }
   chunker.Finish();
@@ -128,7 +129,7 @@ base::ExitCode Compare(const ProveOptions& options, const RawAudio& audio, Conso
 base::ExitCode ProveCommand(const ProveOptions& options) {
   base::CatchInterrupt();
   Console console;
-  std::error_code missing;  // which is told later
+  std::error_code missing;  // a folder, which is reported later
   if (std::filesystem::equivalent(options.builds[0], options.builds[1], missing)) {
     console.Message("qz: " + options.builds[0] + " and " + options.builds[1] +
                     " are one folder, should be two builds (see qz prove --help)");
@@ -141,16 +142,11 @@ base::ExitCode ProveCommand(const ProveOptions& options) {
     Decode(input.get(), &audio);
     const base::ExitCode result = Compare(options, audio, &console);
     const std::string output_fault = console.OutputFault();
-    if (output_fault.empty()) return result;
-    console.Message("qz: " + output_fault);
-    return base::kFaultFound;
-  } catch (const audio::AudioError& error) {
-    console.Message(std::string("qz: ") + error.what());
-    return base::kUnreadableInput;
-  } catch (const BuildError& error) {
-    console.Message(base::Interrupted() ? "qz: interrupted before both traces were compared"
-                                        : std::string("qz: ") + error.what());
-    return base::kNotRunnable;
+    if (!output_fault.empty()) throw base::OutputError(output_fault);
+    return result;
+  } catch (const base::LaunchError&) {
+    if (!base::Interrupted()) throw;
+    throw base::LaunchError("interrupted before both traces were compared");
   }
 }
 

@@ -11,6 +11,7 @@
 #include <cstring>
 #include <fstream>
 
+#include "base/error.h"
 #include "base/interrupt.h"
 
 namespace qz::tools {
@@ -34,7 +35,8 @@ TracedBuild::TracedBuild(const std::string& folder, const std::string& raw_audio
     : program_(folder + "/bin/qz-trace"),
       reader_([this](uint8_t* bytes, size_t size) { return Read(bytes, size); }) {
   if (access(program_.c_str(), R_OK) != 0) {
-    throw BuildError(program_ + ": " + std::strerror(errno) + ", should be a build's program");
+    throw base::LaunchError(program_ + ": " + std::strerror(errno) +
+                            ", should be a build's program");
   }
   std::vector<std::string> command = LauncherWords(folder);
   for (const std::string& word : {program_, raw_audio, folder + "/lib/qz.so",
@@ -46,7 +48,7 @@ TracedBuild::TracedBuild(const std::string& folder, const std::string& raw_audio
 
 void TracedBuild::Start(const std::vector<std::string>& command) {
   int ends[2];
-  if (pipe2(ends, O_CLOEXEC) != 0) throw BuildError(program_ + ": " + std::strerror(errno));
+  if (pipe2(ends, O_CLOEXEC) != 0) throw base::LaunchError(program_ + ": " + std::strerror(errno));
   pipe_ = base::FileDescriptor(ends[0]);
   const base::FileDescriptor write_end(ends[1]);
 
@@ -78,7 +80,8 @@ void TracedBuild::Start(const std::vector<std::string>& command) {
     return;
   }
   process_ = -1;
-  throw BuildError(program_ + ": can't be started by " + command[0] + ": " + std::strerror(error));
+  throw base::LaunchError(program_ + ": can't be started by " + command[0] + ": " +
+                          std::strerror(error));
 }
 
 TracedBuild::~TracedBuild() {
@@ -93,11 +96,11 @@ void TracedBuild::Next(trace::Record* record) {
   } catch (const trace::TraceError& error) {
     // One that writes nonsense need not end; its exit status would say nothing more either.
     const std::string end = at_end_ && process_ >= 0 ? AwaitEnd() : "";
-    throw BuildError(program_ + ": " + error.what() + (end.empty() ? "" : "; it " + end));
+    throw base::LaunchError(program_ + ": " + error.what() + (end.empty() ? "" : "; it " + end));
   }
   if (record->kind != trace::Kind::kEnd) return;
   const std::string end = AwaitEnd();
-  if (!end.empty()) throw BuildError(program_ + ": its trace is whole, but it " + end);
+  if (!end.empty()) throw base::LaunchError(program_ + ": its trace is whole, but it " + end);
 }
 
 size_t TracedBuild::Read(uint8_t* bytes, size_t size) {
@@ -105,7 +108,7 @@ size_t TracedBuild::Read(uint8_t* bytes, size_t size) {
     if (at_end_ || !base::WaitReadable(pipe_.get())) return 0;
     block_.resize(kBlockBytes);
     const ssize_t got = read(pipe_.get(), block_.data(), block_.size());
-    if (got < 0 && errno != EINTR) throw BuildError(program_ + ": " + std::strerror(errno));
+    if (got < 0 && errno != EINTR) throw base::LaunchError(program_ + ": " + std::strerror(errno));
     block_.resize(got > 0 ? static_cast<size_t>(got) : 0);
     block_read_ = 0;
     at_end_ = got == 0;

@@ -3,7 +3,6 @@
 #include <sys/types.h>
 
 #include <cstdint>
-#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -12,19 +11,13 @@
 
 namespace qz::tools {
 
-// A build that gives no whole trace: one line that names the program and what is wrong.
-class BuildError : public std::runtime_error {
- public:
-  using std::runtime_error::runtime_error;
-};
-
 // A build's bin/qz-trace at work on its lib/qz.so, as a child process. Words that run its programs
 // on this machine stand in the build folder's file `launcher`, one a line; often there are none.
 // Where they run the program somewhere else, the paths that follow must be reachable there, and its
 // standard output must come back; it has no standard input.
 class TracedBuild {
  public:
-  // `raw_audio` is the path of a file as qz-trace reads it. Throws BuildError.
+  // `raw_audio` is the path of a file as qz-trace reads it. Throws base::LaunchError.
   TracedBuild(const std::string& folder, const std::string& raw_audio, uint32_t host_clients,
               uint32_t client_nanoapps);
   TracedBuild(const TracedBuild&) = delete;
@@ -32,7 +25,7 @@ class TracedBuild {
   // Kills the program, and all that it has started, if it still runs.
   ~TracedBuild();
 
-  // The next record; the end record once the program has ended well. Throws BuildError.
+  // The next record; the end record once the program has ended well. Throws base::LaunchError.
   void Next(trace::Record* record);
 
  private:

@@ -5,7 +5,8 @@
 #include <cmath>
 #include <cstring>
 #include <fstream>
-#include <stdexcept>
+
+#include "base/error.h"
 
 namespace qz::tools {
 namespace {
@@ -33,30 +34,29 @@ void ParseLine(const std::string& line, const model::Labels& labels, const std::
   const size_t tab = line.find('\t');
   const size_t second = tab == std::string::npos ? tab : line.find('\t', tab + 1);
   if (second == std::string::npos) {
-    throw std::runtime_error(location +
-                             "should be: class, threshold, cooling_s, with tabs between");
+    throw base::InputError(location + "should be: class, threshold, cooling_s, with tabs between");
   }
   const std::string name = line.substr(0, tab);
   const int output = model::OutputOf(labels, name);
   if (output < 0) {
-    throw std::runtime_error(location + "the class is '" + name + "', should be one of " +
-                             ClassNames(labels));
+    throw base::InputError(location + "the class is '" + name + "', should be one of " +
+                           ClassNames(labels));
   }
   const auto index = static_cast<size_t>(output);
   if ((*given)[index]) {
-    throw std::runtime_error(location + "the class '" + name + "' has a line already");
+    throw base::InputError(location + "the class '" + name + "' has a line already");
   }
   (*given)[index] = true;
   DetectionRule& rule = (*rules)[index];
   const std::string threshold = line.substr(tab + 1, second - tab - 1);
   if (!ParseNumber(threshold, 1.0f, &rule.threshold)) {
-    throw std::runtime_error(location + "the threshold is '" + threshold + "', should be 0 to 1");
+    throw base::InputError(location + "the threshold is '" + threshold + "', should be 0 to 1");
   }
   const std::string cooling = line.substr(second + 1);
   double cooling_s = 0;
   if (!ParseNumber(cooling, kMaxCoolingS, &cooling_s)) {
-    throw std::runtime_error(location + "the cooling time is '" + cooling +
-                             "', should be 0 to 1000000 seconds");
+    throw base::InputError(location + "the cooling time is '" + cooling +
+                           "', should be 0 to 1000000 seconds");
   }
   rule.cooling_ns = static_cast<uint64_t>(std::llround(cooling_s * 1e9));
 }
@@ -65,7 +65,7 @@ void ParseLine(const std::string& line, const model::Labels& labels, const std::
 
 DetectionRules ReadDetectionRules(const std::string& path, const model::Labels& labels) {
   std::ifstream file(path);
-  if (!file) throw std::runtime_error(path + ": can't be opened: " + std::strerror(errno));
+  if (!file) throw base::InputError(path + ": can't be opened: " + std::strerror(errno));
   DetectionRules rules;
   std::array<bool, model::kClasses> given{};
   bool headed = false;
@@ -77,15 +77,15 @@ DetectionRules ReadDetectionRules(const std::string& path, const model::Labels& 
     if (headed) {
       ParseLine(line, labels, location, &rules, &given);
     } else if (line != kHeader) {
-      throw std::runtime_error(
+      throw base::InputError(
           location + "the first line should be: class, threshold, cooling_s, with tabs between");
     }
     headed = true;
   }
-  if (file.bad()) throw std::runtime_error(path + ": can't be read: " + std::strerror(errno));
+  if (file.bad()) throw base::InputError(path + ": can't be read: " + std::strerror(errno));
   for (size_t i = 0; i < given.size(); ++i) {
     if (given[i]) continue;
-    throw std::runtime_error(path + ": no line for the class '" + labels[i].class_name + "'");
+    throw base::InputError(path + ": no line for the class '" + labels[i].class_name + "'");
   }
   return rules;
 }

@@ -231,21 +231,15 @@ base::ExitCode Run::Conclude() {
 
   for (const std::string& fault : faults) console_.Message("qz: fault: " + fault);
   const std::string output_fault = console_.OutputFault();
-  if (!output_fault.empty()) console_.Message("qz: " + output_fault);
-  return faults.empty() && output_fault.empty() ? base::kSuccess : base::kFaultFound;
+  if (!output_fault.empty()) {
+    console_.Message("qz: " + output_fault);
+    return base::kUnwritableOutput;
+  }
+  return faults.empty() ? base::kSuccess : base::kFaultFound;
 }
 
 }  // namespace
 
-base::ExitCode RunCommand(const RunOptions& options) {
-  std::optional<Run> run;
-  try {
-    run.emplace(options);
-  } catch (const std::runtime_error& error) {
-    std::fprintf(stderr, "qz: %s\n", error.what());
-    return base::kUnreadableInput;
-  }
-  return run->Execute();
-}
+base::ExitCode RunCommand(const RunOptions& options) { return Run(options).Execute(); }
 
 }  // namespace qz::tools
