@@ -1,80 +1,55 @@
 #include "model/labels.h"
 
-#include <cerrno>
-#include <cstring>
-#include <fstream>
+#include <vector>
 
 #include "base/error.h"
+#include "base/tab_table.h"
 
 namespace qz::model {
 namespace {
-
-constexpr char kHeader[] = "output\tcategory\tclass\tname";
-
-// Takes off what stands before the first tab, or all.
-std::string TakeField(std::string* line) {
-  const size_t tab = line->find('\t');
-  std::string field = line->substr(0, tab);
-  line->erase(0, tab == std::string::npos ? tab : tab + 1);
-  return field;
-}
 
 bool IsCategory(const std::string& text) {
   return !text.empty() && text.size() <= 3 &&
          text.find_first_not_of("0123456789") == std::string::npos && std::stoi(text) <= 255;
 }
 
-Label ParseLine(std::string line, int output, const std::string& location) {
-  const std::string number = TakeField(&line);
+Label ParseRow(const base::TabRow& row, size_t output) {
+  const std::string& number = row.fields[0];
+  const std::string& category = row.fields[1];
   if (number != std::to_string(output)) {
-    throw base::InputError(location + "the output is '" + number + "', should be " +
+    throw base::InputError(row.location + "the output is '" + number + "', should be " +
                            std::to_string(output));
   }
-  const std::string category = TakeField(&line);
   if (!IsCategory(category)) {
-    throw base::InputError(location + "the category is '" + category + "', should be 0 to 255");
+    throw base::InputError(row.location + "the category is '" + category + "', should be 0 to 255");
   }
-  Label label;
-  label.category = std::stoi(category);
-  label.class_name = TakeField(&line);
-  label.name = line;
-  if (label.class_name.empty() || label.name.empty()) {
-    throw base::InputError(location +
-                           "should be: output, category, class, name, with tabs between");
+  if (row.fields[2].empty() || row.fields[3].empty()) {
+    throw base::InputError(row.location + "the class or the name is empty");
   }
-  return label;
+  return {std::stoi(category), row.fields[2], row.fields[3]};
 }
 
 }  // namespace
 
 Labels ReadLabels(const std::string& path) {
-  std::ifstream file(path);
-  if (!file) throw base::InputError(path + ": can't be opened: " + std::strerror(errno));
+  const std::vector<base::TabRow> rows =
+      base::ReadTabTable(path, {"output", "category", "class", "name"});
   Labels labels;
-  int lines = 0;
-  for (std::string line; std::getline(file, line); ++lines) {
-    if (!line.empty() && line.back() == '\r') line.pop_back();
-    const std::string location = path + ": line " + std::to_string(lines + 1) + ": ";
-    if (lines == 0 && line != kHeader) {
-      throw base::InputError(location +
-                             "should be: output, category, class, name, with tabs between");
-    }
-    if (lines > kClasses) throw base::InputError(location + "should not be: there are 5 outputs");
-    if (lines == 0) continue;
-    const Label label = ParseLine(line, lines - 1, location);
-    for (int i = 0; i < lines - 1; ++i) {
-      const Label& before = labels[static_cast<size_t>(i)];
-      if (before.class_name == label.class_name || before.category == label.category) {
-        throw base::InputError(location + "class or category stands in the line of output " +
-                               std::to_string(i) + " already");
-      }
-    }
-    labels[static_cast<size_t>(lines - 1)] = label;
+  if (rows.size() != labels.size()) {
+    throw base::InputError(path + ": labels of " + std::to_string(rows.size()) +
+                           " outputs, should be " + std::to_string(labels.size()));
   }
-  if (file.bad()) throw base::InputError(path + ": can't be read: " + std::strerror(errno));
-  if (lines <= kClasses) {
-    throw base::InputError(path + ": " + std::to_string(lines) +
-                           " lines, should be 6: a header and the outputs 0 to 4");
+  for (size_t output = 0; output < labels.size(); ++output) {
+    const base::TabRow& row = rows[output];
+    labels[output] = ParseRow(row, output);
+    for (size_t i = 0; i < output; ++i) {
+      if (labels[i].class_name != labels[output].class_name &&
+          labels[i].category != labels[output].category) {
+        continue;
+      }
+      throw base::InputError(row.location + "class or category is that of output " +
+                             std::to_string(i) + " too");
+    }
   }
   return labels;
 }

@@ -18,9 +18,8 @@ struct Label {
 // By output.
 using Labels = std::array<Label, kClasses>;
 
-// Reads text, tab-separated, headed by the line "output category class name": a line for each of
-// the outputs 0 to 4, in order. Throws std::runtime_error: one line that names the file, the line,
-// the value and what would be right.
+// Reads a table of the columns output, category, class, name (see base/tab_table.h): a row for each
+// of the outputs, in order. Throws base::InputError.
 Labels ReadLabels(const std::string& path);
 
 // The output that answers to a class; -1 if none does.

@@ -133,7 +133,8 @@ TEST_F(EvalCommand, SaysInOneLineWhyItMeasuresNothing) {
       {"absent.tsv", 3, "absent.tsv: can't be opened"},
       {"list.tsv --model list.tsv", 3, "list.tsv: The packed model has "},
       {"list.tsv --fold-model 1=unsound", 3, "unsound: w6, block 0: the weight of column 0"},
-      {"list.tsv --labels list.tsv", 3, "list.tsv: line 1: should be: output, category"},
+      {"list.tsv --labels list.tsv", 3,
+       "list.tsv: line 1: the first line should be: output, category"},
       {"list.tsv --fold-model 1", 2, "--fold-model: 1 should be FOLD=FILE"},
       {"list.tsv --fold-model 08=a --fold-model 8=b", 2, "--fold-model: 8=b is a second model"},
       {"list.tsv --fold 1 --fold-model 1=a", 2, "--fold"}};

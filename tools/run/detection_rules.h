@@ -17,9 +17,8 @@ struct DetectionRule {
 // By output.
 using DetectionRules = std::array<DetectionRule, model::kClasses>;
 
-// Reads text, tab-separated, headed by the line "class threshold cooling_s": one line for each of
-// the labels' classes, in any order. Empty lines and lines that begin with # say nothing. Throws
-// std::runtime_error: one line that names the file, the line, the value and what would be right.
+// Reads a table of the columns class, threshold, cooling_s (see base/tab_table.h): a row for each
+// of the labels' classes, in any order. Throws base::InputError.
 DetectionRules ReadDetectionRules(const std::string& path, const model::Labels& labels);
 
 // The rules by which the classifier detects: a confidence is detected when it is greater than its
