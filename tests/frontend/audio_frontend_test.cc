@@ -1,5 +1,5 @@
 // The front end's features against the same analysis in double precision and against recorded ones,
-// and its noise memory.
+// its steps against a reference, and its noise estimates.
 
 #include "frontend/audio_frontend.h"
 
@@ -8,8 +8,10 @@
 #include <algorithm>
 #include <cmath>
 #include <complex>
+#include <cstring>
 #include <vector>
 
+#include "tests/frontend/reference_front_end.h"
 #include "tests/support/random.h"
 
 namespace {
@@ -89,6 +91,46 @@ TEST(AudioFrontend, KeepsEveryBitOfItsFeatures) {
   }
   // 64-bit FNV-1a of the values; recorded from a separate computation of the same steps.
   EXPECT_EQ(digest, 0xF8AB0AC2F017634Fu);
+}
+
+// Values [first, end) of a region of the arena.
+template <typename T>
+std::vector<T> Region(const Arena& arena, size_t offset, size_t first, size_t end) {
+  std::vector<T> values(end - first);
+  std::memcpy(values.data(), arena.bytes + offset + first * sizeof(T), values.size() * sizeof(T));
+  return values;
+}
+
+template <typename T>
+std::vector<T> Part(const std::vector<T>& values, size_t first, size_t end) {
+  return {values.begin() + static_cast<long>(first), values.begin() + static_cast<long>(end)};
+}
+
+// Of every step what later ones leave of it in the arena: enough that the first to differ names
+// itself.
+TEST(AudioFrontend, EveryStepIsThatOfTheReference) {
+  Arena arena{};
+  State state{};
+  std::vector<uint32_t> noise(kFeatureChannels);
+  for (uint32_t n = 0; n < 160; ++n) {
+    SCOPED_TRACE(n);
+    const Samples frame = Frame(n);
+    const qz::test::FrontEndSteps steps = qz::test::ReferenceFrontEnd(frame, &noise);
+    std::copy(frame.begin(), frame.end(), InputOf(arena));
+    qz::frontend::Run(arena, state);
+    ASSERT_EQ(Region<int16_t>(arena, 816, 0, 8), Part(steps.windowed, 0, 8)) << "window";
+    ASSERT_EQ(Region<uint32_t>(arena, 0, 0, 1)[0], steps.shift) << "normalising shift";
+    ASSERT_EQ(Region<int16_t>(arena, 16, 240, 400), Part(steps.normalised, 240, 400))
+        << "normalised frame";
+    ASSERT_EQ(Region<int16_t>(arena, 1856, 192, 514), Part(steps.spectrum, 192, 514))
+        << "FFT, bins 96 to 256";
+    ASSERT_EQ(Region<uint32_t>(arena, 832, 0, 237), steps.power) << "power";
+    ASSERT_EQ(Region<uint64_t>(arena, 1856, 0, 48), steps.energy) << "filterbank";
+    ASSERT_EQ(Region<uint32_t>(arena, 16, 0, 48), steps.amplitude) << "square root";
+    ASSERT_EQ(std::vector<uint32_t>(state.noise, state.noise + 48), noise) << "noise estimate";
+    ASSERT_EQ(Region<uint32_t>(arena, 208, 0, 48), steps.suppressed) << "noise subtraction";
+    ASSERT_EQ(Region<uint16_t>(arena, 400, 0, 48), steps.features) << "logarithm";
+  }
 }
 
 TEST(AudioFrontend, FadesSteadySoundToItsFloorAndForgetsItWhenReset) {
