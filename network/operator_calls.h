@@ -1,7 +1,6 @@
 // One operator of the network as calls of a kernel, and the lists by which kernels find their rows.
 #pragma once
 
-#include <algorithm>
 #include <array>
 #include <cstddef>
 #include <cstdint>
@@ -90,28 +89,19 @@ void Pointwise(Arena& own, const void* w) {
   constexpr const Operator& kEach = kOperators[kOp];
   constexpr size_t kInputs = kEach.input.channels;
   const orra_fp32_requant_params params{kEach.zero_point, kMin, kMax};
-  const int8_t* const in = BytesOf(own, kEach.input);
-  int8_t* const out = BytesOf(own, kEach.output);
-  for (size_t row = 0; row < kEach.output.rows; row += kMaxRows) {
-    orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
-        std::min(kEach.output.rows - row, kMaxRows), kEach.channels, kInputs, in + row * kInputs,
-        kInputs, w, out + row * kEach.channels, kEach.channels, kBlockStride, &params);
-  }
+  orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
+      kEach.output.rows, kEach.channels, kInputs, BytesOf(own, kEach.input), kInputs, w,
+      BytesOf(own, kEach.output), kEach.channels, kBlockStride, &params);
 }
 
 template <size_t kOp>
 void Convolution(Arena& own, const void* w) {
   constexpr const Operator& kEach = kOperators[kOp];
   const orra_fp32_requant_params params{kEach.zero_point, kMin, kMax};
-  int8_t* const out = BytesOf(own, kEach.output);
-  for (size_t row = 0; row < kEach.output.rows; row += kMaxRows) {
-    orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
-        std::min(kEach.output.rows - row, kMaxRows), kEach.channels, kEach.input.channels,
-        kEach.TileEntries() * sizeof(const int8_t*),
-        ind<kOp>.data() + row / config::kRowsPerTile * kEach.TileEntries(), w,
-        out + row * kEach.channels, kEach.channels, kBlockStride, ListOffset(own), nullptr,
-        &params);
-  }
+  orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
+      kEach.output.rows, kEach.channels, kEach.input.channels,
+      kEach.TileEntries() * sizeof(const int8_t*), ind<kOp>.data(), w, BytesOf(own, kEach.output),
+      kEach.channels, kBlockStride, ListOffset(own), nullptr, &params);
 }
 
 template <size_t kOp>

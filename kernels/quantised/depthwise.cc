@@ -37,7 +37,7 @@ QZ_KERNEL(orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cor
 (size_t channels, size_t width, const int8_t* const* in_ptrs, const void* w, int8_t* out,
  size_t in_ptrs_step, size_t out_gap, size_t in_offset, const int8_t* zero,
  const orra_fp32_requant_params* params) {
-  const qz::OutputRange range = qz::RangeOf(*params);
+  const qz::OutputRange range = qz::RangeOf(qz::DepthwiseParams(*params));
   for (size_t position = 0; position < width; ++position) {
     const int8_t* rows[kTaps];
     for (size_t t = 0; t < kTaps; ++t) rows[t] = qz::ListedRow(in_ptrs, t, in_offset, zero);

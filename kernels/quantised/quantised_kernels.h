@@ -1,43 +1,37 @@
 // The seven kernels of the int8 network. Every kernel is a pure function of its arguments and of
-// the memory they point to; none allocates, fails or checks. Results are exact to the byte: the
-// plain texts behind these names define them, and a version for one processor has to equal them.
+// the memory they point to; none allocates or fails. Results are exact to the byte: the reference
+// implementations define them, and a variant for one processor has to equal them.
 //
 // Quantisation. Activations are int8 with real value = scale * (q - zero point). Weights are
 // symmetric int8, -127 to 127, never -128. No kernel subtracts an input zero point: a packed bias
 // is the layer's bias in accumulator units minus input zero point * (sum of the column's weights).
 // Accumulators are int32 and wrap around (two's complement); requantisation saturates.
 //
-// Packed weights are little-endian and need no alignment. Places beyond the last real column of the
-// last block (or channel of the last group) are zero.
+// Packed weights are little-endian and need no alignment. What is beyond the last real column of
+// the last block (or channel of the last group) is zero.
 //   GEMM block, 8 columns:      int32 bias[8]; int8 weight[k][8]; float scale[8]   64 + 8k bytes
 //   indirect GEMM block:        int32 bias[8]; int8 weight[taps][k][8]; float scale[8]
 //   GEMM block without scales:  int32 bias[8]; int8 weight[k][8]                   32 + 8k bytes
 //   depthwise group, 16 ch.:    int32 bias[16]; int8 weight[3][16]; float scale[16]    176 bytes
 // A scale is input scale * weight scale of the column / output scale, non-negative and finite.
 //
-// Preconditions of all: counts of at least 1, output minimum <= maximum, records aligned as the
-// compiler does it, outputs apart from inputs (lookup excepted). Rows may be read by a version for
-// one processor up to 7 bytes past their last channel or element (max pool: 15): the caller keeps
-// those bytes readable. No byte outside the stated outputs is written. Sums have up to 65,536
-// products: versions for PCs keep some columns' weights on the stack.
+// Preconditions of all: counts of at least 1, records aligned as the compiler does it, outputs
+// apart from inputs (lookup excepted). Rows may be read by a variant up to 7 bytes past their last
+// channel or element (max pool: 15): the caller keeps those bytes readable. No byte outside the
+// stated outputs is written. Sums have up to 65,536 products: variants for PCs keep some columns'
+// weights on the stack. Preconditions that can be checked are (preconditions.h), but not on the
+// device.
 #pragma once
 
 #include <cstddef>
 #include <cstdint>
 
-// Rows that one call of the matrix kernels with float scales may have. On a hub's processor that is
-// one tile; a PC's texts take any number, so that they unpack the weights once for all rows.
-#ifdef QZ_KERNELS_X86_64
-constexpr size_t kMaxRows = SIZE_MAX;
-#else
-constexpr size_t kMaxRows = 4;
-#endif
-
 extern "C" {
 
 // Requantisation by a float scale per column: round(float(acc) * scale), ties to even, then + zero
-// point, saturated to int8 and clamped. Both float steps are single precision, so a large
-// accumulator is rounded to 24 bits first.
+// point, saturated to int8 and clamped: min(max(q, output_min), output_max), so that output_max
+// results where it is the smaller. Both float steps are single precision, so a large accumulator is
+// rounded to 24 bits first.
 struct orra_fp32_requant_params {
   int16_t output_zero_point;
   int8_t output_min;
@@ -63,7 +57,7 @@ struct orra_s8_clamp_params {
   int8_t output_max;
 };
 
-// Both halves hold the negated zero point, for versions that read them as one word.
+// Both halves hold the negated zero point, for variants that read them as one word.
 struct orra_dequant_params {
   int16_t negated_zero_point[2];
   float scale;
@@ -73,11 +67,10 @@ static_assert(sizeof(orra_fp32_requant_params) == 4 && sizeof(orra_rndnu_requant
                   sizeof(orra_s8_clamp_params) == 2 && sizeof(orra_dequant_params) == 8,
               "records have no gaps");
 
-// Matrix product of a few rows: for r < m and j < n,
+// Matrix product: for r < m and j < n,
 //   c[r][j] = requantise_j(bias[j] + sum over i < k of a[r][i] * weight[i][j]).
 // a: [m][k] int8, rows a_stride bytes apart; w: GEMM blocks; c: [m][n] int8, rows c_stride bytes
-// apart, each block of 8 columns c_block_stride bytes after the one before (8: dense). m: 1 to
-// kMostRows.
+// apart, each block of 8 columns c_block_stride bytes after the one before (8: dense). Any m.
 void orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
     size_t m, size_t n, size_t k, const int8_t* a, size_t a_stride, const void* w, int8_t* c,
     size_t c_stride, size_t c_block_stride, const orra_fp32_requant_params* params);
@@ -86,7 +79,7 @@ void orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_
 //   c[r][j] = requantise_j(bias[j] + sum over t and i < k of row(t, r)[i] * weight[t][i][j])
 // a_ptrs: [(m + 3) / 4][taps][4] row addresses, a list for each tile of 4 rows. The last one is
 // full too (the rows that it names in excess readable, their results not written); tap_bytes: size
-// of one list, taps * 4 * sizeof(pointer). An entry equal to `zero` is used as it stands (k bytes
+// of one list, taps * 4 * sizeof(pointer). An entry equal to `zero` is used as it is (k bytes
 // of the input zero point); a_offset bytes are added to every other. w: indirect GEMM blocks; c,
 // c_stride, c_block_stride, m: as above.
 void orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
@@ -105,8 +98,8 @@ void orra_qs8_gemm_minmax_rndnu_ukernel_1x8__asm_aarch32_neon_mlal_lane_cortex_a
 //   out[p][c] = requantise_c(bias[c] + sum over t < 3 of row(p, t)[c] * weight[t][c]).
 // row(p, t) is entry t of the list after p advances of in_ptrs_step bytes, with in_offset bytes
 // added unless the entry equals `zero`. out_gap bytes follow the `channels` bytes of each position.
-// w: depthwise groups; weights of -128 would overflow the 16-bit sums of versions for some
-// processors.
+// Clamped in the other order, max(min(q, output_max), output_min): output_min results where it is
+// the larger. w: depthwise groups; weights of -128 would overflow the 16-bit sums of variants.
 void orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35(
     size_t channels, size_t width, const int8_t* const* in_ptrs, const void* w, int8_t* out,
     size_t in_ptrs_step, size_t out_gap, size_t in_offset, const int8_t* zero,

@@ -1,5 +1,5 @@
 // From an int32 accumulator to an int8 output, in the two ways of the kernels. Internal linkage
-// throughout these helper headers: a kernel's text may be compiled again for another processor.
+// throughout these helper headers: a kernel's source may be compiled again for another processor.
 #pragma once
 
 #include <algorithm>
@@ -26,12 +26,22 @@ struct OutputRange {
 // rounded value q to int16 and then to [min - Z, max - Z], and add Z. Two clamps in a row make one,
 // whose bounds are those of the first put through the second. All bounds are integers, and rounding
 // is monotone and leaves integers alone, so that clamping before rounding gives the same.
+//
+// The matrix kernels' clamp is min(max(q, output_min), output_max), which is a clamp to output_max
+// alone where output_min is larger.
 static inline OutputRange RangeOf(const orra_fp32_requant_params& params) {
   const int32_t zero_point = params.output_zero_point;
-  const int32_t low = params.output_min - zero_point;
+  const int32_t low = std::min(params.output_min, params.output_max) - zero_point;
   const int32_t high = params.output_max - zero_point;
   return {static_cast<float>(std::clamp<int32_t>(INT16_MIN, low, high)),
           static_cast<float>(std::clamp<int32_t>(INT16_MAX, low, high)), zero_point};
+}
+
+// The depthwise kernel's is max(min(q, output_max), output_min): to output_min alone where that is
+// larger.
+static inline orra_fp32_requant_params DepthwiseParams(const orra_fp32_requant_params& params) {
+  return {params.output_zero_point, params.output_min,
+          std::max(params.output_min, params.output_max)};
 }
 
 constexpr float kRoundingTerm = 12582912.0f;  // 1.5 * 2^23
@@ -77,7 +87,8 @@ static inline int8_t RequantiseRndnu(int32_t accumulator, const orra_rndnu_requa
 
   const int64_t zero_point = params.output_zero_point;
   value = std::clamp<int64_t>(value, INT16_MIN, INT16_MAX) + zero_point;
-  return static_cast<int8_t>(std::clamp<int64_t>(value, params.output_min, params.output_max));
+  value = std::max<int64_t>(value, params.output_min);
+  return static_cast<int8_t>(std::min<int64_t>(value, params.output_max));
 }
 
 }  // namespace qz

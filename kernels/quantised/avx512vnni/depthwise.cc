@@ -4,6 +4,7 @@
 #include "kernels/quantised/avx2/requantise.h"
 #include "kernels/quantised/indirection.h"
 #include "kernels/quantised/quantised_kernels.h"
+#include "kernels/quantised/requantisation.h"
 #include "kernels/variant.h"
 
 namespace {
@@ -75,7 +76,7 @@ QZ_KERNEL(orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cor
 (size_t channels, size_t width, const int8_t* const* in_ptrs, const void* w, int8_t* out,
  size_t in_ptrs_step, size_t out_gap, size_t in_offset, const int8_t* zero,
  const orra_fp32_requant_params* params) {
-  const qz::OutputRange256 range = qz::Range256Of(*params);
+  const qz::OutputRange256 range = qz::Range256Of(qz::DepthwiseParams(*params));
   const uint8_t* packed = static_cast<const uint8_t*>(w);
   for (size_t c = 0; c < channels; c += 2 * kGroup, packed += 2 * kGroupBytes) {
     const size_t left = channels - c;

@@ -33,7 +33,7 @@ const uint8_t* OffsetLayer(Random& random, size_t inputs, size_t columns, size_t
 struct MatrixShape {
   explicit MatrixShape(CaseRandom& random, size_t taps = 1)
       : large(random.Next() % 16),
-        m(random.Pick("m", 1, std::min<size_t>(kMaxRows, large == 0 ? 150 : 13))),
+        m(random.Pick("m", 1, large == 0 ? 150 : 13)),
         n(random.Pick("n", 1, large == 1 ? 70 : 25)),
         k(random.Pick("k", 1,
                       (large == 1   ? 700
@@ -149,8 +149,8 @@ std::string CompareMaxPool(CaseRandom& random) {
 
 // The shapes of the network. What the bytes hold changes no instruction count.
 constexpr size_t kChannels = 60;
-constexpr size_t kGemmRows = std::min<size_t>(kMaxRows, 380);
-constexpr size_t kIndirectGemmRows = std::min<size_t>(kMaxRows, 92);
+constexpr size_t kGemmRows = 380;
+constexpr size_t kIndirectGemmRows = 92;
 constexpr orra_fp32_requant_params kParams{-128, -128, 127};
 constexpr orra_rndnu_requant_params kFixedParams{0, 1427340160, -5, -128, -128, 127};
 constexpr orra_s8_clamp_params kClamp{-128, 127};

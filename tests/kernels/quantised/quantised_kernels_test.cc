@@ -19,17 +19,23 @@ int64_t Saturate(int64_t value, int bits) {
   return std::clamp(value, -limit, limit - 1);
 }
 
+enum ClampOrder { kMinFirst, kMaxFirst };  // which bound is applied first
+
 template <typename Params>
-int8_t AddZeroPointAndClamp(int64_t value, const Params& params) {
+int8_t AddZeroPointAndClamp(int64_t value, const Params& params, ClampOrder order) {
+  const int64_t min = params.output_min, max = params.output_max;
   value = Saturate(Saturate(Saturate(value, 16) + params.output_zero_point, 16), 8);
-  return static_cast<int8_t>(std::clamp<int64_t>(value, params.output_min, params.output_max));
+  value = order == kMinFirst ? std::min(std::max(value, min), max)
+                             : std::max(std::min(value, max), min);
+  return static_cast<int8_t>(value);
 }
 
 // In doubles: a product of two floats is exact there, and is rounded once, to a float.
-int8_t Requantise(int32_t sum, float scale, const orra_fp32_requant_params& params) {
+int8_t Requantise(int32_t sum, float scale, const orra_fp32_requant_params& params,
+                  ClampOrder order = kMinFirst) {
   const float product = static_cast<float>(double{static_cast<float>(sum)} * double{scale});
   const double rounded = std::nearbyint(std::clamp(double{product}, -0x1p31, 0x1p31 - 1));
-  return AddZeroPointAndClamp(static_cast<int64_t>(rounded), params);
+  return AddZeroPointAndClamp(static_cast<int64_t>(rounded), params, order);
 }
 
 int8_t Requantise(int32_t sum, const orra_rndnu_requant_params& params) {
@@ -39,7 +45,7 @@ int8_t Requantise(int32_t sum, const orra_rndnu_requant_params& params) {
   const int64_t product = Saturate((Saturate(shifted, 32) * params.multiplier) >> 31, 32);
   // One bit more than is kept, whose half goes upwards.
   return AddZeroPointAndClamp(((product >> (std::min(-params.post_shift, 60) - 1)) + 1) >> 1,
-                              params);
+                              params, kMinFirst);
 }
 
 int32_t Sum(const Layer& layer, size_t column, const int8_t* x) {
@@ -52,7 +58,7 @@ int32_t Sum(const Layer& layer, size_t column, const int8_t* x) {
 constexpr size_t kReadAhead = 16;
 constexpr int8_t kGuard = 0x5A;
 
-// Rows that hold all taps of a position one after the other give the plain kernels what the listed
+// Rows that hold all taps of a position one after the other give the direct kernels what the listed
 // rows of the taps give the indirect one.
 void CheckMatrixKernels(Random& random, size_t m, size_t n, size_t k) {
   const size_t taps = random.Pick(1, 4), inputs = taps * k, a_stride = inputs + random.Pick(0, 9);
@@ -65,12 +71,15 @@ void CheckMatrixKernels(Random& random, size_t m, size_t n, size_t k) {
   const size_t offset = 40000 * random.Pick(0, 1);
   const int8_t* const zero = &a[random.Pick(0, taps - 1) * k];
   std::vector<const int8_t*> list;
-  for (size_t i = 0; i < 4 * taps; ++i) {
-    list.push_back(ListEntry(&a[std::min(i % 4, m - 1) * a_stride + i / 4 * k], zero, offset));
+  for (size_t first = 0; first < m; first += 4) {
+    for (size_t i = 0; i < 4 * taps; ++i) {
+      const size_t row = std::min(first + i % 4, m - 1);
+      list.push_back(ListEntry(&a[row * a_stride + i / 4 * k], zero, offset));
+    }
   }
 
   const size_t block = 8 + random.Pick(0, 3), stride = (n + 7) / 8 * block + random.Pick(0, 5);
-  std::vector<int8_t> expected(4 * stride + 16, kGuard);
+  std::vector<int8_t> expected(m * stride + 16, kGuard);
   std::vector<int8_t> direct = expected, indirect = expected, fixed = expected;
   std::vector<int8_t> expected_fixed = expected;
   for (size_t j = 0; j < n; ++j) {
@@ -84,7 +93,7 @@ void CheckMatrixKernels(Random& random, size_t m, size_t n, size_t k) {
   orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
       m, n, inputs, a.data(), a_stride, packed.data(), direct.data(), stride, block, &params);
   orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
-      m, n, k, list.size() * sizeof list[0], list.data(), packed.data(), indirect.data(), stride,
+      m, n, k, 4 * taps * sizeof list[0], list.data(), packed.data(), indirect.data(), stride,
       block, offset, zero, &params);
   orra_qs8_gemm_minmax_rndnu_ukernel_1x8__asm_aarch32_neon_mlal_lane_cortex_a7(
       1, n, inputs, a.data(), a_stride, layer.Packed(false).data(), fixed.data(), stride, block,
@@ -94,16 +103,16 @@ void CheckMatrixKernels(Random& random, size_t m, size_t n, size_t k) {
   EXPECT_EQ(fixed, expected_fixed);
 }
 
-TEST(MatrixKernels, EqualPlainSums) {
+TEST(MatrixKernels, EqualSums) {
   Random random(1);
   for (size_t i = 0; i < 800 && !HasFailure(); ++i) {
-    const size_t m = 1 + i % 4, n = 1 + i / 4 % 20, k = random.Pick(1, 132);
+    const size_t m = 1 + i % 9, n = 1 + i / 9 % 20, k = random.Pick(1, 132);
     SCOPED_TRACE(testing::Message() << "m " << m << " n " << n << " k " << k);
     CheckMatrixKernels(random, m, n, k);
   }
 }
 
-TEST(Depthwise, EqualsPlainSums) {
+TEST(Depthwise, EqualsSums) {
   Random random(4);
   for (size_t i = 0; i < 300; ++i) {
     const size_t channels = 1 + i % 60, stride = channels + random.Pick(0, 5);
@@ -121,7 +130,8 @@ TEST(Depthwise, EqualsPlainSums) {
     for (size_t p = 0; p < width; ++p) {
       for (size_t c = 0, first = p * step; c < channels; ++c) {
         const std::vector<int8_t> x = {rows[first][c], rows[first + 1][c], rows[first + 2][c]};
-        expected[p * stride + c] = Requantise(Sum(layer, c, x.data()), layer.scales[c], params);
+        expected[p * stride + c] =
+            Requantise(Sum(layer, c, x.data()), layer.scales[c], params, kMaxFirst);
       }
     }
     orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35(
@@ -133,24 +143,28 @@ TEST(Depthwise, EqualsPlainSums) {
 
 // Entries are offsets from a base. The entry that an odd pool skips and those of the gap would
 // fault.
-TEST(MaxPool, EqualsPlainMaximum) {
+TEST(MaxPool, EqualsMaximum) {
   Random random(7);
   for (size_t i = 0; i < 4 * 40; ++i) {
     const size_t pool_size = 1 + i % 4, channels = 1 + i / 4, positions = random.Pick(1, 3);
     const size_t gap = random.Pick(0, 2), stride = channels + random.Pick(0, 5);
-    const auto low = static_cast<int8_t>(random.Between(-128, 0));
-    const orra_s8_clamp_params params{low, static_cast<int8_t>(random.Between(low, 127))};
+    const auto [unused, low, high] = RandomParams(random);
+    const orra_s8_clamp_params params{low, high};
     const auto in = random.Fill<int8_t>(20 * channels + kReadAhead, -128, 127);
     std::vector<uintptr_t> entries;
     std::vector<int8_t> out(positions * stride + 16, kGuard), expected = out;
     for (size_t p = 0; p < positions; ++p) {
-      std::fill_n(&expected[p * stride], channels, low);
+      std::fill_n(&expected[p * stride], channels, INT8_MIN);
       for (size_t e = 0; e < pool_size; ++e) {
         entries.push_back(channels * random.Pick(0, 19));
         for (size_t c = 0; c < channels; ++c) {
           int8_t& max = expected[p * stride + c];
-          max = std::clamp(in[entries.back() + c], max, params.output_max);
+          max = std::max(in[entries.back() + c], max);
         }
+      }
+      for (size_t c = 0; c < channels; ++c) {
+        int8_t& max = expected[p * stride + c];
+        max = std::min(std::max(max, params.output_min), params.output_max);
       }
       entries.insert(entries.end(), pool_size % 2 + gap, UINTPTR_MAX / 2);
     }
