@@ -5,15 +5,7 @@
 #include <cstdint>
 #include <vector>
 
-#include "detector/window.h"
-
 namespace qz::dataset {
-
-using config::kFeatureChannels;
-using config::kHopSamples;
-using detector::FramesOf;
-using detector::NetworkInput;
-using detector::SamplesOf;
 
 // Features of all frames of a recording from a fresh start, FramesOf(count) x 48, row-major; each 0
 // or 33 to 299, the lowest frequency first.

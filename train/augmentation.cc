@@ -5,6 +5,7 @@
 #include <cstdlib>
 
 #include "dataset/clip_features.h"
+#include "detector/framing.h"
 
 namespace qz::train {
 namespace {
@@ -85,7 +86,7 @@ std::vector<int16_t> Rounded(const std::vector<float>& sound) {
 Augmentation::Augmentation(const Recipe& recipe, const std::vector<Clip>& clips)
     : recipe_(recipe),
       clips_(clips),
-      samples_(dataset::SamplesOf(static_cast<size_t>(FramesFor(recipe.windows)))),
+      samples_(detector::SamplesOf(static_cast<size_t>(FramesFor(recipe.windows)))),
       noises_{MakeNoise(0, 0, 1), MakeNoise(0.95, 2, 2), MakeNoise(0.98, 0, 3)} {}
 
 void Augmentation::Make(size_t first, uint64_t seed, Eigen::Index sequence, Batch* features,

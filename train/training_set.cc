@@ -5,6 +5,7 @@
 #include "audio/audio_input.h"
 #include "dataset/clip.h"
 #include "dataset/clip_features.h"
+#include "detector/window.h"
 #include "evaluation/clip_scores.h"
 
 namespace qz::train {
@@ -25,11 +26,11 @@ ClipList LoadClips(const std::vector<dataset::Recording>& recordings, const mode
 
 Batch ValidationFeatures(const std::vector<int16_t>& samples) {
   const std::vector<uint16_t> features = evaluation::FeaturesToPlay(samples);
-  const auto frames = static_cast<int>(features.size() / dataset::kFeatureChannels);
+  const auto frames = static_cast<int>(features.size() / config::kFeatureChannels);
   Batch batch;
   batch.Resize(
       1, FramesFor(1 + (frames - FramesFor(1)) / static_cast<int>(config::kFramesBetweenRuns)),
-      static_cast<Eigen::Index>(dataset::kFeatureChannels));
+      static_cast<Eigen::Index>(config::kFeatureChannels));
   CopyFeatures(features, 0, &batch);
   return batch;
 }
@@ -38,7 +39,7 @@ void CopyFeatures(const std::vector<uint16_t>& features, Eigen::Index sequence, 
   const Eigen::Index count = batch->steps() * batch->channels();
   std::transform(
       features.begin(), features.begin() + count, batch->values.data() + sequence * count,
-      [](uint16_t feature) { return static_cast<float>(dataset::NetworkInput(feature) + 128); });
+      [](uint16_t feature) { return static_cast<float>(detector::NetworkInput(feature) + 128); });
 }
 
 }  // namespace qz::train

@@ -1,33 +1,33 @@
-// What parameters are worth on clips that they did not learn from.
+// Metrics of parameters on clips that they were not trained on.
 #pragma once
 
-#include <array>
 #include <vector>
 
+#include "detector/scores.h"
 #include "train/parameters.h"
 #include "train/quantised_network.h"
 #include "train/training_set.h"
 
 namespace qz::train {
 
-using Scores = std::array<float, model::kClasses>;
+using detector::Scores;
 
-// The highest score of each output over the network's runs, a clip each. `folded`: in float.
+// The maximum score of each output over the network's runs, a clip each. `folded`: in float.
 std::vector<Scores> ScoresOf(const Values& folded, const std::vector<Batch>& validated);
 // By the device's arithmetic: multiples of 1/256.
 std::vector<Scores> ScoresOf(const QuantisedParameters& parameters,
                              const std::vector<Batch>& validated);
 
-// What networks say together: the logistic of their mean logits, of float scores.
+// The ensemble of networks: the logistic of their mean logits, of float scores.
 std::vector<Scores> MeanLogits(const std::vector<std::vector<Scores>>& networks);
 
 // The device's score for a logit in steps of 0.256.
 float DeviceScore(float logit_steps);
 
 struct Metrics {
-  double average_precision = 0;  // means over the outputs that some clip answers to
+  double average_precision = 0;  // means over the outputs that some clip is labelled with
   double roc_auc = 0;
-  int outputs = 0;  // that were judged
+  int outputs = 0;  // that were evaluated
 };
 
 Metrics MetricsOf(const std::vector<Scores>& scores, const std::vector<Clip>& clips);

@@ -71,7 +71,7 @@ class Detection : public testing::Test, public SoundDetectionEventListenerInterf
   qz::test::TestHub runtime_{kHostOffsetNs};
   AudioClassifier classifier_;
   ConfidenceEvent report_[3] = {};
-  // The detections that the listener was told.
+  // The detections that the listener received.
   std::vector<std::string> calls_;
 };
 

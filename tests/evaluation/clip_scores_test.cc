@@ -1,4 +1,4 @@
-// Scores of clips against the model evaluated plainly over windows of the clip's features.
+// Scores of clips against the reference network over windows of the clip's features.
 
 #include "evaluation/clip_scores.h"
 
@@ -9,6 +9,7 @@
 #include <set>
 
 #include "dataset/clip_features.h"
+#include "detector/window.h"
 #include "model/synthetic_model.h"
 #include "tests/support/random.h"
 
@@ -33,7 +34,7 @@ std::vector<int16_t> Sound(size_t samples) {
 Scores ReferenceRun(const PackedModel& packed, const uint16_t* features, uint64_t* digest) {
   model::Tensor window(model::kInputRows, model::kInputChannels);
   std::transform(features, features + window.values.size(), window.values.begin(),
-                 dataset::NetworkInput);
+                 detector::NetworkInput);
   const model::NetworkRun run = model::RunNetwork(packed, window);
   const auto add = [digest](const void* bytes, size_t count) {
     const auto* values = static_cast<const unsigned char*>(bytes);
@@ -44,7 +45,7 @@ Scores ReferenceRun(const PackedModel& packed, const uint16_t* features, uint64_
   return run.scores;
 }
 
-TEST(ClipScores, EqualThePlainEvaluationOfEachWindow) {
+TEST(ClipScores, EqualTheReferenceOfEachWindow) {
   const PackedModel synthetic = model::MakeSyntheticModel(1);
   const PackedModel other = model::MakeSyntheticModel(2);
   for (const PackedModel* packed : {&synthetic, &other}) {
@@ -57,19 +58,19 @@ TEST(ClipScores, EqualThePlainEvaluationOfEachWindow) {
     ASSERT_EQ(scores.runs.size(), 4u);
     for (size_t run = 0; run < 4; ++run) {
       const Scores expected =
-          ReferenceRun(*packed, features.data() + run * 64 * dataset::kFeatureChannels, &digest);
+          ReferenceRun(*packed, features.data() + run * 64 * config::kFeatureChannels, &digest);
       EXPECT_EQ(scores.runs[run], expected) << "run " << run;
       for (size_t i = 0; i < max.size(); ++i) max[i] = std::max(max[i], expected[i]);
     }
     EXPECT_EQ(scores.max, max);
     EXPECT_EQ(scores.digest, digest);
     EXPECT_GT(std::set<Scores>(scores.runs.begin(), scores.runs.end()).size(), 1u)
-        << "too dull a sound to tell anything";
+        << "the sound gives the same scores in every run";
   }
   EXPECT_NE(ScoreClip(synthetic, Sound(80000)).digest, ScoreClip(other, Sound(80000)).digest);
 }
 
-TEST(ClipScores, DoNotDependOnWhatWasHeardBefore) {
+TEST(ClipScores, DoNotDependOnEarlierClips) {
   const PackedModel packed = model::MakeSyntheticModel(1);
   const uint64_t fresh = ScoreClip(packed, Sound(50000)).digest;
   ScoreClip(packed, std::vector<int16_t>(200000, 30000));
@@ -84,10 +85,10 @@ TEST(ClipScores, TwoRunsOrMoreSeeTheLastSample) {
     ASSERT_GE(played, samples);
     size_t seeing = 0;
     size_t before_last_buffer = 0;
-    for (size_t frames = 382; dataset::SamplesOf(frames) <= played; frames += 64) {
-      seeing += dataset::SamplesOf(frames) >= samples;
+    for (size_t frames = 382; detector::SamplesOf(frames) <= played; frames += 64) {
+      seeing += detector::SamplesOf(frames) >= samples;
       before_last_buffer +=
-          dataset::SamplesOf(frames) >= samples && dataset::SamplesOf(frames) <= played - 32000;
+          detector::SamplesOf(frames) >= samples && detector::SamplesOf(frames) <= played - 32000;
     }
     EXPECT_GE(seeing, 2u) << samples;
     EXPECT_TRUE(before_last_buffer < 2 || played - 32000 < samples) << samples << ": too long";

@@ -7,6 +7,7 @@
 
 #include "base/digest.h"
 #include "dataset/clip_features.h"
+#include "detector/window.h"
 #include "model/synthetic_features.h"
 #include "model/synthetic_model.h"
 #include "tests/tools/qz_program.h"
@@ -110,7 +111,7 @@ TEST(ModelInfo, SummarisesTensorsAsTheyAre) {
   for (const size_t first : {size_t{0}, kStep}) {
     model::Tensor window(model::kInputRows, model::kInputChannels);
     std::transform(features.data() + first, features.data() + first + config::kWindow.Values(),
-                   window.values.begin(), dataset::NetworkInput);
+                   window.values.begin(), detector::NetworkInput);
     const model::NetworkRun run = model::RunNetwork(Good(), window);
     for (size_t op = 0; op < std::size(values); ++op) {
       const std::vector<int8_t>& out = run.outputs[op].values;

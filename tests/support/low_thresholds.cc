@@ -1,5 +1,5 @@
-// Detection tables with which things are detected; linked into a suite, they take the place of the
-// default.
+// Detection tables with which things are detected; a suite that links them uses them instead of
+// the default.
 
 #include "classifier/detection_tables.h"
 

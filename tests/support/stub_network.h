@@ -1,5 +1,5 @@
-// Stands in for the network: keeps the windows it was given and answers with chosen scores. Linked
-// into a suite, it takes the place of the real one.
+// A stub of the network: keeps the windows that it was given and returns chosen scores. A suite
+// that links it runs it instead of the real one.
 #pragma once
 
 #include <array>

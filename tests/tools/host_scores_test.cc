@@ -1,4 +1,4 @@
-// What qz itself makes of the scores: tables of thresholds, the rules of detection, how it looks.
+// Host-side scores: tables of thresholds, the detection rules, the output.
 
 #include <gmock/gmock.h>
 
@@ -24,28 +24,28 @@ const model::Labels kLabels = {{{0, "dog_bark", "dog bark"},
 
 constexpr uint64_t kSecondNs = 1'000'000'000;
 
-TEST(ToolDetector, DetectsAboveTheThresholdAndAfterTheCoolingTime) {
-  DetectionRules rules;
-  rules[0] = {0.5f, 4 * kSecondNs};
-  rules[2] = {0.0f, 0};
-  ToolDetector detector(rules);
+TEST(DetectionRules, DetectsAboveTheThresholdAndAfterTheCoolingTime) {
+  DetectionTable table;
+  table[0] = {0.5f, 4 * kSecondNs};
+  table[2] = {0.0f, 0};
+  DetectionRules rules(table);
   const float above = std::nextafter(0.5f, 1.0f);
-  EXPECT_THAT(detector.Detect({0.5f, 1, 0, 1, 1}, 2 * kSecondNs), IsEmpty());
-  EXPECT_THAT(detector.Detect({above, 0, 0.1f, 0, 0}, 4 * kSecondNs), ElementsAre(0, 2));
+  EXPECT_THAT(rules.Detect({0.5f, 1, 0, 1, 1}, 2 * kSecondNs), IsEmpty());
+  EXPECT_THAT(rules.Detect({above, 0, 0.1f, 0, 0}, 4 * kSecondNs), ElementsAre(0, 2));
   // Rests up to and with the moment at which the cooling time has passed.
-  EXPECT_THAT(detector.Detect({1, 0, 0.1f, 0, 0}, 6 * kSecondNs), ElementsAre(2));
-  EXPECT_THAT(detector.Detect({1, 0, 0, 0, 0}, 8 * kSecondNs), IsEmpty());
-  EXPECT_THAT(detector.Detect({1, 0, 0, 0, 0}, 8 * kSecondNs + 1), ElementsAre(0));
-  EXPECT_THAT(detector.Detect({1, 0, 0, 0, 0}, 12 * kSecondNs + 1), IsEmpty());
+  EXPECT_THAT(rules.Detect({1, 0, 0.1f, 0, 0}, 6 * kSecondNs), ElementsAre(2));
+  EXPECT_THAT(rules.Detect({1, 0, 0, 0, 0}, 8 * kSecondNs), IsEmpty());
+  EXPECT_THAT(rules.Detect({1, 0, 0, 0, 0}, 8 * kSecondNs + 1), ElementsAre(0));
+  EXPECT_THAT(rules.Detect({1, 0, 0, 0, 0}, 12 * kSecondNs + 1), IsEmpty());
   // A cooling time of 0 rests no longer than its own moment.
-  EXPECT_THAT(detector.Detect({0, 0, 1, 0, 0}, 6 * kSecondNs), IsEmpty());
-  EXPECT_THAT(detector.Detect({0, 0, 1, 0, 0}, 6 * kSecondNs + 1), ElementsAre(2));
+  EXPECT_THAT(rules.Detect({0, 0, 1, 0, 0}, 6 * kSecondNs), IsEmpty());
+  EXPECT_THAT(rules.Detect({0, 0, 1, 0, 0}, 6 * kSecondNs + 1), ElementsAre(2));
 }
 
 class RulesFile : public testing::Test, protected test::TemporaryFolder {
  protected:
-  DetectionRules Read(const std::string& text) const {
-    return ReadDetectionRules(WriteBytes("t", text), kLabels);
+  DetectionTable Read(const std::string& text) const {
+    return ReadDetectionTable(WriteBytes("t", text), kLabels);
   }
   std::string Refusal(const std::string& text) const {
     try {
@@ -62,7 +62,7 @@ const std::string kFour =
     "baby_cry\t0\t0\nrooster\t1\t1e6\nclock_tick\t0.3\t0\nperson_sneeze\t0\t0\n";
 
 TEST_F(RulesFile, GivesEachClassItsLineInAnyOrder) {
-  const DetectionRules rules =
+  const DetectionTable rules =
       Read("# mine\n\n" + kHeader + "person_sneeze\t1.0\t2.5\r\nclock_tick\t0.1\t1e-9\n" +
            "rooster\t0\t0\nbaby_cry\t0.25\t1000000\ndog_bark\t.5\t3");
   const float thresholds[] = {0.5f, 0.25f, 0, 0.1f, 1};
@@ -79,22 +79,22 @@ TEST_F(RulesFile, WhatIsWrongIsOneLineWithItsPlace) {
       {"class threshold cooling_s\n", "t: line 1: the first line should be: class, threshold"},
       {kHeader + kFour, "t: no line for the class 'dog_bark'"},
       {kHeader + kFour + "cat\t1\t0\n",
-       "t: line 6: the class is 'cat', should be one of dog_bark, "},
+       "t: line 6: the class is 'cat', expected one of dog_bark, "},
       {kHeader + kFour + "rooster\t1\t0\n", "t: line 6: the class 'rooster' has a line already"},
       {kHeader + "dog_bark\t1\n",
        "t: line 2: 2 fields, should be 3 between tabs: class, threshold, co"},
       {kHeader + "dog_bark\t1\t0\t0\n",
        "t: line 2: 4 fields, should be 3 between tabs: class, threshold, cooling_s"},
       {kHeader + "dog_bark\t1\t-1\n",
-       "t: line 2: the cooling time is '-1', should be 0 to 1000000 s"},
-      {kHeader + "dog_bark\t1\tinf\n", "t: line 2: the cooling time is 'inf', should be"},
-      {kHeader + "dog_bark\t1.01\t0\n", "t: line 2: the threshold is '1.01', should be 0 to 1"},
-      {kHeader + "dog_bark\tnan\t0\n", "t: line 2: the threshold is 'nan', should be 0 to 1"},
-      {kHeader + "dog_bark\t\t0\n", "t: line 2: the threshold is '', should be 0 to 1"},
-      {kHeader + "dog_bark\t0,5\t0\n", "t: line 2: the threshold is '0,5', should be 0 to 1"},
+       "t: line 2: the cooling time is '-1', expected 0 to 1000000 s"},
+      {kHeader + "dog_bark\t1\tinf\n", "t: line 2: the cooling time is 'inf', expected"},
+      {kHeader + "dog_bark\t1.01\t0\n", "t: line 2: the threshold is '1.01', expected 0 to 1"},
+      {kHeader + "dog_bark\tnan\t0\n", "t: line 2: the threshold is 'nan', expected 0 to 1"},
+      {kHeader + "dog_bark\t\t0\n", "t: line 2: the threshold is '', expected 0 to 1"},
+      {kHeader + "dog_bark\t0,5\t0\n", "t: line 2: the threshold is '0,5', expected 0 to 1"},
   };
   for (const auto& [text, expected] : cases) EXPECT_THAT(Refusal(text), HasSubstr(expected));
-  EXPECT_THROW(ReadDetectionRules(Path(""), kLabels), std::runtime_error);
+  EXPECT_THROW(ReadDetectionTable(Path(""), kLabels), std::runtime_error);
 }
 
 TEST(HostScoresFormat, MarksScoresAsTheToolsAndPaintsThemOnTerminals) {
@@ -108,7 +108,7 @@ TEST(HostScoresFormat, MarksScoresAsTheToolsAndPaintsThemOnTerminals) {
             "[   4.000 s] tool's view: dog bark 0.2500, baby cry 0.3750 (one run 0.5000), "
             "rooster 0.7500, clock tick 0.1250, person sneeze 0.0000");
   EXPECT_THAT(plain->Scores(2 * kSecondNs, {}), EndsWith("tool's view: no network run yet"));
-  EXPECT_EQ(plain->ToolDetection(4 * kSecondNs, scores, {1, 2}),
+  EXPECT_EQ(plain->HostDetection(4 * kSecondNs, scores, {1, 2}),
             "[   4.000 s] tool's view: would detect baby cry 0.3750, rooster 0.7500; no event of "
             "the module");
 

@@ -12,6 +12,7 @@
 #include "dataset/clip.h"
 #include "dataset/clip_features.h"
 #include "dataset/manifest.h"
+#include "detector/framing.h"
 #include "tools/console.h"
 
 namespace qz::tools {
@@ -97,12 +98,12 @@ void Features::Write(const Job& job) {
     return;
   }
   if (base::Interrupted()) return;  // in the midst of a sound, perhaps
-  const size_t frames = dataset::FramesOf(samples.size());
+  const size_t frames = detector::FramesOf(samples.size());
   const fs::path path = folder_ / job.output;
   if (path.has_parent_path()) base::MakeOutputFolder(path.parent_path().string());
   base::CheckOutputFile(path.string(), {job.sound.file, options_.manifest});
   base::WriteOutputFile(path.string(), arrays::NpyBytes(arrays::MakeArray(
-                                           {frames, dataset::kFeatureChannels},
+                                           {frames, config::kFeatureChannels},
                                            dataset::FeaturesOf(samples.data(), samples.size()))));
   list_ += job.output + '\t' + job.sound.class_name + '\t' + std::to_string(job.sound.fold) + '\n';
   frames_ += frames;

@@ -4,13 +4,12 @@
 #include <cstdio>
 #include <memory>
 
-#include "dataset/clip_features.h"
+#include "detector/window.h"
 #include "network/network.h"
 
 namespace qz::tools {
 namespace {
 
-using config::kFramesBetweenRuns;
 using config::kOperators;
 using config::kWindow;
 using config::Tensor;
@@ -109,11 +108,11 @@ TensorSummaries TensorsOf(const model::PackedModel& packed, const std::vector<ui
   const network::Weights weights = network::WeightsOf(packed.data());
   TensorSummaries tensors;
   tensors.frames = features.size() / kWindow.channels;
-  for (size_t first = 0; first + kWindow.rows <= tensors.frames; first += kFramesBetweenRuns) {
-    const uint16_t* window = features.data() + first * kWindow.channels;
-    std::transform(window, window + kWindow.Bytes(), network::InputOf(*arena),
-                   dataset::NetworkInput);
-    Add(network::InputOf(*arena), kWindow, &tensors.input);
+  std::vector<int8_t> window(detector::kWindowBytes);
+  size_t held = 0;
+  const auto run = [&] {
+    std::copy(window.begin(), window.end(), network::InputOf(*arena));
+    Add(window.data(), kWindow, &tensors.input);
     for (size_t op = 0; op < kOperators.size(); ++op) {
       network::RunOperator(op, *arena, weights);
       if (op >= tensors.outputs.size()) continue;
@@ -125,6 +124,9 @@ TensorSummaries TensorsOf(const model::PackedModel& packed, const std::vector<ui
       max = std::max(max, network::ScoresOf(*arena)[i]);
     }
     ++tensors.runs;
+  };
+  for (size_t frame = 0; frame < tensors.frames; ++frame) {
+    detector::TakeFrame(features.data() + frame * kWindow.channels, window.data(), &held, run);
   }
   return tensors;
 }

@@ -26,12 +26,12 @@ std::string ClassNames(const model::Labels& labels) {
 }
 
 // The row's rule goes to its class's index, where none has been.
-void ParseRow(const base::TabRow& row, const model::Labels& labels, DetectionRules* rules,
+void ParseRow(const base::TabRow& row, const model::Labels& labels, DetectionTable* table,
               std::array<bool, model::kClasses>* given) {
   const std::string& name = row.fields[0];
   const int output = model::OutputOf(labels, name);
   if (output < 0) {
-    throw base::InputError(row.location + "the class is '" + name + "', should be one of " +
+    throw base::InputError(row.location + "the class is '" + name + "', expected one of " +
                            ClassNames(labels));
   }
   const auto index = static_cast<size_t>(output);
@@ -39,41 +39,42 @@ void ParseRow(const base::TabRow& row, const model::Labels& labels, DetectionRul
     throw base::InputError(row.location + "the class '" + name + "' has a line already");
   }
   (*given)[index] = true;
-  DetectionRule& rule = (*rules)[index];
+  DetectionRule& rule = (*table)[index];
   if (!ParseNumber(row.fields[1], 1.0f, &rule.threshold)) {
     throw base::InputError(row.location + "the threshold is '" + row.fields[1] +
-                           "', should be 0 to 1");
+                           "', expected 0 to 1");
   }
   double cooling_s = 0;
   if (!ParseNumber(row.fields[2], kMaxCoolingS, &cooling_s)) {
     throw base::InputError(row.location + "the cooling time is '" + row.fields[2] +
-                           "', should be 0 to 1000000 seconds");
+                           "', expected 0 to 1000000 seconds");
   }
   rule.cooling_ns = static_cast<uint64_t>(std::llround(cooling_s * 1e9));
 }
 
 }  // namespace
 
-DetectionRules ReadDetectionRules(const std::string& path, const model::Labels& labels) {
-  DetectionRules rules;
+DetectionTable ReadDetectionTable(const std::string& path, const model::Labels& labels) {
+  DetectionTable table;
   std::array<bool, model::kClasses> given{};
   for (const base::TabRow& row : base::ReadTabTable(path, {"class", "threshold", "cooling_s"})) {
-    ParseRow(row, labels, &rules, &given);
+    ParseRow(row, labels, &table, &given);
   }
   for (size_t i = 0; i < given.size(); ++i) {
     if (given[i]) continue;
     throw base::InputError(path + ": no line for the class '" + labels[i].class_name + "'");
   }
-  return rules;
+  return table;
 }
 
-std::vector<int> ToolDetector::Detect(const Scores& confidences, uint64_t now_ns) {
+std::vector<int> DetectionRules::Detect(const Scores& confidences, uint64_t now_ns) {
   std::vector<int> detected;
+  detected.reserve(confidences.size());
   for (size_t i = 0; i < confidences.size(); ++i) {
-    if (!(confidences[i] > rules_[i].threshold)) continue;
-    if (last_ns_[i] != 0 && last_ns_[i] + rules_[i].cooling_ns >= now_ns) continue;
-    last_ns_[i] = now_ns;
-    detected.push_back(static_cast<int>(i));
+    const DetectionRule& rule = table_[i];
+    if (detector::Detect(confidences[i], rule.threshold, rule.cooling_ns, now_ns, &last_ns_[i])) {
+      detected.push_back(static_cast<int>(i));
+    }
   }
   return detected;
 }

@@ -1,6 +1,8 @@
-// Thresholds and cooling times of a table of one's own, applied by this program.
+// Detections on the host's side, by thresholds and cooling times of a user's table.
 #pragma once
 
+#include <array>
+#include <cstdint>
 #include <string>
 #include <vector>
 
@@ -15,23 +17,22 @@ struct DetectionRule {
 };
 
 // By output.
-using DetectionRules = std::array<DetectionRule, model::kClasses>;
+using DetectionTable = std::array<DetectionRule, model::kClasses>;
 
 // Reads a table of the columns class, threshold, cooling_s (see base/tab_table.h): a row for each
 // of the labels' classes, in any order. Throws base::InputError.
-DetectionRules ReadDetectionRules(const std::string& path, const model::Labels& labels);
+DetectionTable ReadDetectionTable(const std::string& path, const model::Labels& labels);
 
-// The rules by which the classifier detects: a confidence is detected when it is greater than its
-// threshold and its output's last detection is longer ago than the cooling time.
-class ToolDetector {
+// The classifier's rules over another table.
+class DetectionRules {
  public:
-  explicit ToolDetector(const DetectionRules& rules) : rules_(rules) {}
+  explicit DetectionRules(const DetectionTable& table) : table_(table) {}
 
   // The outputs detected by a pass that ends at `now_ns`, in the hub's clock and not 0.
   std::vector<int> Detect(const Scores& confidences, uint64_t now_ns);
 
  private:
-  DetectionRules rules_;
+  DetectionTable table_;
   std::array<uint64_t, model::kClasses> last_ns_{};  // 0: never
 };
 

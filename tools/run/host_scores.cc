@@ -8,20 +8,20 @@
 namespace qz::tools {
 namespace {
 
-// The outputs that a report tells, in its order.
-constexpr size_t kReportedOutputs[] = {1, 3};
+// The outputs in a report, in its order.
+constexpr size_t kReportedOutputs[] = {config::kShortSmoothedOutput, config::kLongSmoothedOutput};
 
 }  // namespace
 
 HostScores::HostScores(const std::string& model_path, bool show_scores,
-                       const std::optional<DetectionRules>& rules, const ReportFormat* format,
+                       const std::optional<DetectionTable>& table, const ReportFormat* format,
                        Console* console)
     : model_path_(model_path),
       show_scores_(show_scores),
       format_(*format),
       console_(*console),
       score_stream_(model::ReadValidModel(model_path)) {
-  if (rules) detector_.emplace(*rules);
+  if (table) rules_.emplace(*table);
 }
 
 void HostScores::Pass(const int16_t* samples, size_t count, uint64_t now_ns,
@@ -31,9 +31,9 @@ void HostScores::Pass(const int16_t* samples, size_t count, uint64_t now_ns,
   if (report) Compare(scores, *report);
   if (!faults_.empty()) return;
   if (show_scores_) console_.Data(format_.Scores(now_ns, scores));
-  if (!detector_) return;
-  const std::vector<int> detected = detector_->Detect(scores.confidences, now_ns);
-  if (!detected.empty()) console_.Data(format_.ToolDetection(now_ns, scores, detected));
+  if (!rules_) return;
+  const std::vector<int> detected = rules_->Detect(scores.confidences, now_ns);
+  if (!detected.empty()) console_.Data(format_.HostDetection(now_ns, scores, detected));
 }
 
 void HostScores::Compare(const PassScores& scores, const hub::SoundReport& report) {

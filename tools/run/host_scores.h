@@ -1,5 +1,5 @@
-// What qz itself hears beside the module: all five scores and, by a table of one's own, detections.
-// Never messages of the module, and marked so wherever they are printed.
+// Host-side scores: what qz computes itself beside the module, all scores and, by a user's table,
+// detections. Never messages of the module, and marked so wherever they are printed.
 #pragma once
 
 #include <optional>
@@ -20,7 +20,7 @@ class HostScores {
   // Throws std::runtime_error if the model can't be read or is not sound. Prints the scores of each
   // pass if `show_scores`, and the detections by `rules` if there are.
   HostScores(const std::string& model_path, bool show_scores,
-             const std::optional<DetectionRules>& rules, const ReportFormat* format,
+             const std::optional<DetectionTable>& table, const ReportFormat* format,
              Console* console);
 
   // A pass that ended at `now_ns`: the samples that the module got, and its report of them if
@@ -37,7 +37,7 @@ class HostScores {
 
   std::string model_path_;
   bool show_scores_;
-  std::optional<ToolDetector> detector_;
+  std::optional<DetectionRules> rules_;
   const ReportFormat& format_;
   Console& console_;
   ScoreStream score_stream_;

@@ -40,7 +40,7 @@ Json ToolObject(const char* type, uint64_t time_ns) {
           {"timestamp_ns", time_ns}};
 }
 
-Json ToolResult(int output, const PassScores& scores, const Names& names) {
+Json HostResult(int output, const PassScores& scores, const Names& names) {
   const auto index = static_cast<size_t>(output);
   const model::Label& label = names.value()[index];
   return {{"output", output},
@@ -71,16 +71,16 @@ class JsonFormat final : public ReportFormat {
     Json object = ToolObject("scores", time_ns);
     object["runs"] = scores.runs;
     for (int i = 0; i < model::kClasses; ++i) {
-      object["results"].push_back(ToolResult(i, scores, names_));
+      object["results"].push_back(HostResult(i, scores, names_));
     }
     return Line(object);
   }
 
-  std::string ToolDetection(uint64_t time_ns, const PassScores& scores,
+  std::string HostDetection(uint64_t time_ns, const PassScores& scores,
                             const std::vector<int>& outputs) const override {
     Json object = ToolObject("tool_detection", time_ns);
     for (const int output : outputs) {
-      object["results"].push_back(ToolResult(output, scores, names_));
+      object["results"].push_back(HostResult(output, scores, names_));
     }
     return Line(object);
   }

@@ -44,7 +44,7 @@ class ReportFormat {
   // What the tool itself made of the pass that ended at `time_ns`, in the hub's clock.
   virtual std::string Scores(uint64_t time_ns, const PassScores& scores) const = 0;
   // Of that pass, the outputs that the tool's own table detects; at least one.
-  virtual std::string ToolDetection(uint64_t time_ns, const PassScores& scores,
+  virtual std::string HostDetection(uint64_t time_ns, const PassScores& scores,
                                     const std::vector<int>& outputs) const = 0;
   virtual std::string Summary(const RunSummary& summary) const = 0;
 };

@@ -9,6 +9,7 @@
 
 #include "audio/audio_input.h"
 #include "base/interrupt.h"
+#include "detector/framing.h"
 #include "hub/hub.h"
 #include "tools/console.h"
 #include "tools/run/chunker.h"
@@ -19,14 +20,8 @@
 namespace qz::tools {
 namespace {
 
-// How the nanoapp cuts audio into frames, and how many frames its network looks at.
-constexpr uint64_t kFrameSamples = 400;
-constexpr uint64_t kHopSamples = 160;
-constexpr uint64_t kWindowFrames = 382;
-
-uint64_t FramesOf(uint64_t samples) {
-  return samples < kFrameSamples ? 0 : 1 + (samples - kFrameSamples) / kHopSamples;
-}
+using config::kWindowFrames;
+using detector::FramesOf;
 
 std::string LogLine(chreLogLevel level, uint64_t time_ns, const std::string& line) {
   const char* const names[] = {"error", "warning", "info", "debug"};
@@ -82,9 +77,9 @@ Run::Run(const RunOptions& options)
                            : MakeTextFormat(
                                  {console_.data_on_terminal(), console_.data_in_colour()}, names_)),
       printer_(format_.get(), &console_) {
-  std::optional<DetectionRules> rules;
+  std::optional<DetectionTable> rules;
   if (!options.thresholds_path.empty()) {
-    rules = ReadDetectionRules(options.thresholds_path, names_.value());
+    rules = ReadDetectionTable(options.thresholds_path, names_.value());
   }
   if (options.scores || rules) {
     view_.emplace(options.model_path, options.scores, rules, format_.get(), &console_);

@@ -75,7 +75,7 @@ class TextFormat final : public ReportFormat {
     return Time(time_ns) + kToolsView + (style_.bars ? ScoreRows(scores) : ScoreList(scores));
   }
 
-  std::string ToolDetection(uint64_t time_ns, const PassScores& scores,
+  std::string HostDetection(uint64_t time_ns, const PassScores& scores,
                             const std::vector<int>& outputs) const override {
     std::string text = Time(time_ns) + kToolsView + "would detect";
     const char* separator = " ";
