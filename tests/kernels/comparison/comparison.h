@@ -22,8 +22,9 @@ namespace qz::test {
 // The implementations of a kernel that are beside each other in this build, named as
 // kernels/kernel_table.h names them.
 #ifdef QZ_KERNELS_X86_64
-enum Side { kReference, kReferenceForAvx2, kAvx2, kAvx512Vnni, kSides };
-constexpr const char* kSideNames[kSides] = {"reference", "reference_avx2", "avx2", "avx512vnni"};
+enum Side { kReference, kReferenceForAvx2, kAvx2, kAvx512Vnni, kReferenceUserFlags, kSides };
+constexpr const char* kSideNames[kSides] = {"reference", "reference_avx2", "avx2", "avx512vnni",
+                                            "reference_user_flags"};
 #else
 enum Side { kReference, kRunning, kSides };
 constexpr const char* kSideNames[kSides] = {"reference", QZ_KERNELS};
@@ -40,10 +41,11 @@ struct Implementations {
 // NOLINTBEGIN(bugprone-macro-parentheses): names can't be in parentheses.
 #ifdef QZ_KERNELS_X86_64
 #define QZ_IMPLEMENTATIONS(variable, component, kernel)                         \
+  extern "C" decltype(kernel) kernel##__reference_user_flags;                   \
   constexpr Implementations<decltype(kernel)> variable {                        \
 #kernel, {                                                                  \
       kernel##__reference, kernel##__reference_avx2, k##component##Avx2.kernel, \
-          k##component##Avx512Vnni.kernel                                       \
+          k##component##Avx512Vnni.kernel, kernel##__reference_user_flags       \
     }                                                                           \
   }
 #else

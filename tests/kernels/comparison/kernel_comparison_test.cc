@@ -1,6 +1,7 @@
 // Compares every variant of a kernel for some instruction set with the kernel's reference.
 //
 //   kernel_comparison_test [--seed N]   compares; N is the seed of the first comparison
+//   kernel_comparison_test --user-flags compares the references as a user's flags compile them
 //   kernel_comparison_test --count      calls implementations between marks; prints a line for each
 //                                       kernel: its source, its name and what was called
 //   kernel_comparison_test --time       times calls of all implementations, in interleaved rounds
@@ -57,7 +58,8 @@ std::vector<Kernel> AllKernels() {
 bool ProcessorRuns([[maybe_unused]] Side side) {
 #ifdef QZ_KERNELS_X86_64
   const InstructionSet best = BestInstructionSet();
-  if (side == kAvx512Vnni) return best == InstructionSet::kAvx512Vnni;
+  if (side == kAvx512Vnni || side == kReferenceUserFlags)
+    return best == InstructionSet::kAvx512Vnni;
   if (side != kReference) return best != InstructionSet::kBaseline;
 #endif
   return true;
@@ -162,6 +164,23 @@ int CompareAll(uint64_t first_seed) {
   return tally.not_run_here > 0 ? kNothingToCompareHere : EXIT_FAILURE;
 }
 
+#ifdef QZ_KERNELS_X86_64
+int CompareUserFlags(uint64_t first_seed) {
+  if (!ProcessorRuns(kReferenceUserFlags)) {
+    std::printf("not compared: this processor has no AVX512-VNNI\n");
+    return kNothingToCompareHere;
+  }
+  size_t compared = 0;
+  bool passed = true;
+  for (const Kernel& kernel : AllKernels()) {
+    if (kernel.compare == nullptr) continue;
+    ++compared;
+    passed &= CompareVariant(kernel, kReferenceUserFlags, first_seed);
+  }
+  return passed && compared > 0 ? EXIT_SUCCESS : EXIT_FAILURE;
+}
+#endif
+
 // The sides of a kernel that are variants, or are what such a variant has to beat.
 std::vector<Side> SidesToMeasure(const Kernel& kernel) {
   if (kernel.run == nullptr) return {};
@@ -250,12 +269,17 @@ int main(int argc, char** argv) {
   if (arguments.size() == 2 && arguments[0] == "--seed") {
     return qz::test::CompareAll(std::strtoull(arguments[1].c_str(), nullptr, 10));
   }
+#ifdef QZ_KERNELS_X86_64
+  if (arguments.size() == 1 && arguments[0] == "--user-flags") {
+    return qz::test::CompareUserFlags(std::random_device{}());
+  }
+#endif
   if (arguments.size() == 1 && arguments[0] == "--count") {
     qz::test::CountAll();
   } else if (arguments.size() == 1 && arguments[0] == "--time") {
     qz::test::TimeAll();
   } else {
-    std::fprintf(stderr, "expected no arguments, --seed N, --count or --time\n");
+    std::fprintf(stderr, "expected no arguments, --seed N, --user-flags, --count or --time\n");
     return EXIT_FAILURE;
   }
   return EXIT_SUCCESS;
