@@ -23,17 +23,17 @@ class ByteReader {
     if (fstat(fd, &status) == 0) size_ = status.st_size;
   }
 
-  off_t size() const { return size_; }
+  int64_t size() const { return size_; }
 
   // The `count` bytes at `offset`, as one number; all must lie within the file.
-  uint32_t BigEndian(off_t offset, int count) {
+  uint32_t BigEndian(int64_t offset, int count) {
     uint32_t number = 0;
     for (int i = 0; i < count; ++i) number = number << 8 | Byte(offset + i);
     return number;
   }
 
  private:
-  uint8_t Byte(off_t offset) {
+  uint8_t Byte(int64_t offset) {
     if (offset < begin_ || offset >= begin_ + held_) {
       begin_ = offset;
       held_ = pread(fd_, buffer_.data(), buffer_.size(), offset);
@@ -43,8 +43,8 @@ class ByteReader {
   }
 
   int fd_;
-  off_t size_ = 0;
-  off_t begin_ = 0;
+  int64_t size_ = 0;
+  int64_t begin_ = 0;
   ssize_t held_ = 0;
   std::array<uint8_t, 16384> buffer_;
 };
@@ -54,7 +54,7 @@ struct FrameHeader {
   uint32_t layer;    // 1 to 3
   uint32_t rate_hz;
   bool mono;
-  off_t bytes;  // of the whole frame
+  int64_t bytes;  // of the whole frame
 };
 
 bool SameStream(const FrameHeader& a, const FrameHeader& b) {
@@ -92,31 +92,31 @@ std::optional<FrameHeader> ParseHeader(uint32_t bits) {
   const uint32_t padding = bits >> 9 & 1;
   const uint32_t bit_rate = BitRate(mpeg1, header.layer, bit_rate_index);
   if (header.layer == 1) {
-    header.bytes = 4 * (off_t{12} * bit_rate / header.rate_hz + padding);
+    header.bytes = 4 * (int64_t{12} * bit_rate / header.rate_hz + padding);
   } else {
     const uint32_t slots = header.layer == 3 && !mpeg1 ? 72 : 144;
-    header.bytes = off_t{slots} * bit_rate / header.rate_hz + padding;
+    header.bytes = int64_t{slots} * bit_rate / header.rate_hz + padding;
   }
   return header;
 }
 
 // Where the frames begin: behind an ID3 tag of version 2, whose size has 7 bits a byte.
-off_t SkipTag(ByteReader* file) {
-  constexpr off_t kTagHeader = 10;
+int64_t SkipTag(ByteReader* file) {
+  constexpr int64_t kTagHeader = 10;
   if (file->size() < kTagHeader || file->BigEndian(0, 3) != 0x494433) return 0;
-  off_t size = 0;
+  int64_t size = 0;
   for (int i = 6; i < 10; ++i) size = size << 7 | (file->BigEndian(i, 1) & 0x7F);
   return kTagHeader + size;
 }
 
 // The number of frames that an information frame at `offset` states; 0 if it is none.
-uint32_t StatedFrames(ByteReader* file, off_t offset, const FrameHeader& header) {
+uint32_t StatedFrames(ByteReader* file, int64_t offset, const FrameHeader& header) {
   constexpr uint32_t kXing = 0x58696E67;
   constexpr uint32_t kInfo = 0x496E666F;
   constexpr uint32_t kCountIsThere = 1;
   const bool mpeg1 = header.version == 3;
-  const off_t side_information = mpeg1 ? (header.mono ? 17 : 32) : (header.mono ? 9 : 17);
-  const off_t mark = offset + off_t{kFrameHeader} + side_information;
+  const int64_t side_information = mpeg1 ? (header.mono ? 17 : 32) : (header.mono ? 9 : 17);
+  const int64_t mark = offset + int64_t{kFrameHeader} + side_information;
   if (header.layer != 3 || mark + 12 > file->size()) return 0;
   const uint32_t name = file->BigEndian(mark, 4);
   if (name != kXing && name != kInfo) return 0;
@@ -127,11 +127,11 @@ uint32_t StatedFrames(ByteReader* file, off_t offset, const FrameHeader& header)
 
 std::string FindMpegTruncation(int fd) {
   ByteReader file(fd);
-  off_t offset = SkipTag(&file);
+  int64_t offset = SkipTag(&file);
   std::optional<FrameHeader> first;
   uint32_t stated = 0;
   uint32_t frames = 0;  // whole ones
-  for (; offset + off_t{kFrameHeader} <= file.size(); ++frames) {
+  for (; offset + int64_t{kFrameHeader} <= file.size(); ++frames) {
     const auto header = ParseHeader(file.BigEndian(offset, kFrameHeader));
     if (!header || (first && !SameStream(*header, *first))) return {};
     if (!first) {
