@@ -51,9 +51,9 @@ class HeaderParser {
   const std::vector<size_t>& shape() const { return shape_; }
 
  private:
-  [[noreturn]] void Fail(const char* right) const {
+  [[noreturn]] void Fail(const char* expected) const {
     throw base::InputError(name_ + ": byte " + std::to_string(kHeaderOffset + location_) +
-                           " of the header should be " + right);
+                           " of the header should be " + expected);
   }
 
   void SkipSpace() {

@@ -84,7 +84,7 @@ class NpzReader {
     return name.substr(0, name.size() - kSuffixLength);
   }
 
-  // The bytes of the current file, whose check sum must be right.
+  // The bytes of the current file, whose check sum must match.
   std::string Unpack(const unz_file_info64& info, const std::string& location) {
     if (info.uncompressed_size > limits_.file_bytes) {
       throw base::InputError(location + ": has " + std::to_string(info.uncompressed_size) +
@@ -103,7 +103,7 @@ class NpzReader {
     const int closed = unzCloseCurrentFile(archive_.get());
     if (opened != UNZ_OK || got < 0 || static_cast<size_t>(got) != bytes.size() ||
         closed != UNZ_OK) {
-      throw base::InputError(location + ": damaged: can't be unpacked, or its check sum is wrong");
+      throw base::InputError(location + ": damaged: can't be unpacked, or its check sum differs");
     }
     return bytes;
   }

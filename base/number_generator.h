@@ -1,5 +1,5 @@
-// Reproducible numbers for the stand-in model: integers and +, -, x only, so that a seed gives the
-// same sequence on every machine.
+// Reproducible random numbers: integers and +, -, x only, so that a seed gives the same sequence on
+// every machine.
 #pragma once
 
 #include <cstdint>
@@ -18,7 +18,7 @@ class NumberGenerator {
     return z ^ (z >> 31);
   }
 
-  // Integer from low to high, both included.
+  // Integer of [low, high].
   int Between(int low, int high) {
     return low + static_cast<int>(Next() % static_cast<uint64_t>(high - low + 1));
   }

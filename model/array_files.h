@@ -1,4 +1,4 @@
-// A model's plain arrays as a file: the form in which models go to and come from elsewhere.
+// A model's arrays as a file: the form in which models go to and come from elsewhere.
 #pragma once
 
 #include <string>

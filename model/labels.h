@@ -1,4 +1,4 @@
-// What the five outputs answer to. The module keeps only codes; the names stand in a small file
+// The classes of the five outputs. The module has only their codes; the names are in a small file
 // beside the model.
 #pragma once
 
@@ -22,7 +22,7 @@ using Labels = std::array<Label, kClasses>;
 // of the outputs, in order. Throws base::InputError.
 Labels ReadLabels(const std::string& path);
 
-// The output that answers to a class; -1 if none does.
+// The output of a class; -1 if there is none.
 int OutputOf(const Labels& labels, const std::string& class_name);
 
 }  // namespace qz::model

@@ -29,7 +29,8 @@ const KindWords& WordsOf(Kind kind) {
 
 void Digest(uint64_t value, size_t size, Tally* tally) {
   for (size_t i = 0; i < size; ++i) {
-    tally->digest = (tally->digest ^ (value >> (8 * i) & 0xFF)) * 0x100000001B3u;
+    const auto byte = static_cast<uint8_t>(value >> (8 * i));
+    tally->digest = base::Digest(&byte, 1, tally->digest);
   }
 }
 

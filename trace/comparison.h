@@ -4,6 +4,7 @@
 #include <string>
 #include <vector>
 
+#include "base/digest.h"
 #include "trace/trace_records.h"
 
 namespace qz::trace {
@@ -11,7 +12,7 @@ namespace qz::trace {
 // How many records of one kind there were, and a 64-bit FNV-1a digest of all that they hold.
 struct Tally {
   uint64_t records = 0;
-  uint64_t digest = 0xCBF29CE484222325u;
+  uint64_t digest = base::kEmptyDigest;
 };
 
 // Compares two traces record by record, up to the first difference. Counts from 0: frames, network

@@ -51,7 +51,7 @@ TEST(Npy, IsWhatNumPySavesAndLoads) {
   EXPECT_THAT(ParseNpy(Saved(other, "\x80"), "x").shape, ElementsAre(1, 1));
 }
 
-TEST(Npy, NamesWhatIsWrong) {
+TEST(Npy, NamesTheValueAndWhatIsExpected) {
   const std::string good = Header("|i1", "(2,)");
   const std::pair<std::string, const char*> cases[] = {
       {"", "x: not an array in NumPy's format"},
@@ -141,7 +141,7 @@ TEST_F(Npz, RefusesWhatIsTooLargeOrDamaged) {
   EXPECT_THAT(ErrorOf(other_method), HasSubstr(": x: is encrypted or packed by another method"));
   EXPECT_EQ(ErrorOf("no archive"), ": not an archive of arrays (.npz)");
   EXPECT_THROW(ReadNpz(folder_.Path("absent"), {2, 256}), base::InputError);
-  // The last two bytes only say how long a comment is.
+  // The last two bytes are only the length of a comment.
   for (size_t size = 0; size < archive_.size() - 2; size += 3) {
     EXPECT_NE(ErrorOf(archive_.substr(0, size)), "") << size;
   }

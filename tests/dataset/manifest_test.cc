@@ -1,4 +1,4 @@
-// Lists of recordings: what a list says, and what is said of lists that can't be used.
+// Lists of recordings: what they hold, and the messages about lists that can't be used.
 
 #include "dataset/manifest.h"
 
@@ -41,7 +41,7 @@ TEST_F(Manifest, HoldsTheRecordingsInOrder) {
   EXPECT_EQ(recordings[1].fold, 99);
 }
 
-TEST_F(Manifest, NamesTheLineThatIsWrong) {
+TEST_F(Manifest, NamesTheLineAtFault) {
   const std::string list = Path("list.tsv") + ": ";
   const std::pair<std::string, std::string> cases[] = {
       {"", "lists no recording"},

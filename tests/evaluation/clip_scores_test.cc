@@ -8,6 +8,7 @@
 #include <cmath>
 #include <set>
 
+#include "base/digest.h"
 #include "dataset/clip_features.h"
 #include "detector/window.h"
 #include "model/synthetic_model.h"
@@ -37,8 +38,7 @@ Scores ReferenceRun(const PackedModel& packed, const uint16_t* features, uint64_
                  detector::NetworkInput);
   const model::NetworkRun run = model::RunNetwork(packed, window);
   const auto add = [digest](const void* bytes, size_t count) {
-    const auto* values = static_cast<const unsigned char*>(bytes);
-    for (size_t i = 0; i < count; ++i) *digest = (*digest ^ values[i]) * 0x100000001B3u;
+    *digest = base::Digest(bytes, count, *digest);
   };
   for (const model::Tensor& output : run.outputs) add(output.values.data(), output.values.size());
   add(run.scores.data(), sizeof run.scores);
@@ -53,7 +53,7 @@ TEST(ClipScores, EqualTheReferenceOfEachWindow) {
     const ClipScores scores = ScoreClip(*packed, sound);
     sound.resize(96000);  // 3 buffers, of which 598 frames come
     const std::vector<uint16_t> features = dataset::FeaturesOf(sound.data(), sound.size());
-    uint64_t digest = 0xCBF29CE484222325u;
+    uint64_t digest = base::kEmptyDigest;
     Scores max{};
     ASSERT_EQ(scores.runs.size(), 4u);
     for (size_t run = 0; run < 4; ++run) {

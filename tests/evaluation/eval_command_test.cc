@@ -107,9 +107,9 @@ TEST_F(EvalCommand, NamesSkipsAndCountsWhatCannotBeRead) {
   WriteSound("2rooster.wav", SF_FORMAT_WAV | SF_FORMAT_PCM_16, 16000, 1, std::vector<int16_t>());
   EXPECT_EQ(Eval("list.tsv"), 3);
   EXPECT_EQ(std::count(err_.begin(), err_.end(), '\n'), 4) << err_;
-  for (const char* words : {"qz: skipped: 1rain.wav: ", "qz: skipped: 2rain.wav: ",
-                            "qz: skipped: 2rooster.wav: ", "qz: skipped 3 of 12 clips\n"}) {
-    EXPECT_THAT(err_, HasSubstr(words));
+  for (const char* message : {"qz: skipped: 1rain.wav: ", "qz: skipped: 2rain.wav: ",
+                              "qz: skipped: 2rooster.wav: ", "qz: skipped 3 of 12 clips\n"}) {
+    EXPECT_THAT(err_, HasSubstr(message));
   }
   EXPECT_THAT(out_, StartsWith("list.tsv: 9 clips, 36.0 s of audio, 3 skipped\n"));
 
@@ -120,19 +120,19 @@ TEST_F(EvalCommand, NamesSkipsAndCountsWhatCannotBeRead) {
   EXPECT_FALSE(std::filesystem::exists(Path("s")));
 }
 
-TEST_F(EvalCommand, SaysInOneLineWhyItMeasuresNothing) {
+TEST_F(EvalCommand, PrintsInOneLineWhyItMeasuresNothing) {
   WriteBytes("no_tick.tsv", LinesWithout("clock_tick\t2"));
-  WriteBytes("wrong.tsv", lines_ + "a.wav\train\n");
+  WriteBytes("short.tsv", lines_ + "a.wav\train\n");
   model::PackedModel invalid = model::MakeSyntheticModel(1);
   model::Store<int8_t>(invalid, model::kTables[4].WeightOffset(0, 0, 0), -128);
-  WriteBytes("unsound", {invalid.begin(), invalid.end()});
+  WriteBytes("invalid", {invalid.begin(), invalid.end()});
   const std::tuple<std::string, int, std::string> cases[] = {
       {"no_tick.tsv --fold 2", 3, "no_tick.tsv: fold 2: no clip of clock_tick, should be"},
       {"list.tsv --fold 3", 3, "list.tsv: fold 3: no clip of dog_bark, baby_cry, rooster, clock"},
-      {"wrong.tsv", 3, "wrong.tsv: line 20: 2 fields, should be 3"},
+      {"short.tsv", 3, "short.tsv: line 20: 2 fields, should be 3"},
       {"absent.tsv", 3, "absent.tsv: can't be opened"},
       {"list.tsv --model list.tsv", 3, "list.tsv: The packed model has "},
-      {"list.tsv --fold-model 1=unsound", 3, "unsound: w6, block 0: the weight of column 0"},
+      {"list.tsv --fold-model 1=invalid", 3, "invalid: w6, block 0: the weight of column 0"},
       {"list.tsv --labels list.tsv", 3,
        "list.tsv: line 1: the first line should be: output, category"},
       {"list.tsv --fold-model 1", 2, "--fold-model: 1 should be FOLD=FILE"},

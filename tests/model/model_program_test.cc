@@ -35,8 +35,8 @@ class ModelProgram : public test::QzProgram {
 TEST_F(ModelProgram, ChecksTableByTable) {
   const std::string file = Write("m.bin", Good());
   EXPECT_EQ(Run("$QZ model check " + file), 0);
-  EXPECT_THAT(out_, HasSubstr("\nw6    12032 bytes  sound\n"));
-  EXPECT_THAT(out_, HasSubstr("\n" + file + ": sound\n"));
+  EXPECT_THAT(out_, HasSubstr("\nw6    12032 bytes  valid\n"));
+  EXPECT_THAT(out_, HasSubstr("\n" + file + ": valid\n"));
 
   PackedModel bad = Good();
   const auto& w4 = *model::FindTable(4);
@@ -45,7 +45,7 @@ TEST_F(ModelProgram, ChecksTableByTable) {
   EXPECT_EQ(Run("$QZ model check " + Write("m.bin", bad)), 1);
   EXPECT_THAT(out_, HasSubstr("\nw4     4352 bytes  2 findings\n" + file +
                               ": w4, block 1: the scale of column 9 is -1; "));
-  EXPECT_THAT(out_, HasSubstr("\n" + file + ": not sound: 2 findings\n"));
+  EXPECT_THAT(out_, HasSubstr("\n" + file + ": not valid: 2 findings\n"));
   bad.pop_back();
   EXPECT_EQ(Run("$QZ model check " + Write("m.bin", bad)), 1);
   EXPECT_EQ(out_, file + ": The packed model has 85999 bytes; expected 86000.\n");

@@ -6,19 +6,13 @@
 #include <limits>
 #include <vector>
 
+#include "base/number_generator.h"
+
 namespace qz::test {
 
-// SplitMix64: 64 well-mixed bits a step from any seed.
-class Random {
+class Random : public base::NumberGenerator {
  public:
-  explicit Random(uint64_t seed) : state_(seed) {}
-
-  uint64_t Next() {
-    uint64_t z = (state_ += 0x9E3779B97F4A7C15u);
-    z = (z ^ (z >> 30)) * 0xBF58476D1CE4E5B9u;
-    z = (z ^ (z >> 27)) * 0x94D049BB133111EBu;
-    return z ^ (z >> 31);
-  }
+  using NumberGenerator::NumberGenerator;
 
   // Uniform over [low, high], both included.
   int64_t Between(int64_t low, int64_t high) {
@@ -33,9 +27,6 @@ class Random {
     for (T& value : values) value = static_cast<T>(Between(low, high));
     return values;
   }
-
- private:
-  uint64_t state_;
 };
 
 template <typename T>

@@ -2,6 +2,7 @@
 
 #include <set>
 
+#include "base/digest.h"
 #include "hub/messages.h"
 #include "tests/support/random.h"
 #include "tests/support/test_hub.h"
@@ -74,11 +75,11 @@ TEST(LoadedModule, ServesHostsAndNanoappsFromOneRecording) {
               ElementsAre("2@1", "4@1", "2@2", "4@2", "2@3", "4@3", "6@1", "6@2", "6@3"));
   ASSERT_EQ(detected.reports.size(), 2 * kBuffers);
   std::set<float> seen;
-  uint64_t digest = 0xCBF29CE484222325u;  // FNV-1a
+  uint64_t digest = base::kEmptyDigest;
   for (size_t pass = 0; pass < kBuffers; ++pass) {
     const Bytes& bytes = detected.reports[2 * pass];
     EXPECT_EQ(detected.reports[2 * pass + 1], bytes);
-    for (const uint8_t byte : bytes) digest = (digest ^ byte) * 0x100000001B3u;
+    digest = base::Digest(bytes.data(), bytes.size(), digest);
     const auto report = hub::DecodeFramedSoundReport(bytes.data(), bytes.size());
     ASSERT_TRUE(report.has_value());
     EXPECT_EQ(report->model_version, 202208270u);

@@ -69,7 +69,7 @@ TEST_F(Features, GoIntoAFolderFromAFreshStartEach) {
   EXPECT_EQ(Array("into/deep/a.npy").shape[0], 598u);
 }
 
-TEST_F(Features, OfAManifestAreListedAndWhatIsMissingIsSaid) {
+TEST_F(Features, OfAManifestAreListedAndWhatIsMissingIsNamed) {
   Wav("a.wav", Sound());
   Wav("b.wav", {1, 2, 3});
   WriteBytes("c.wav", "no sound");

@@ -67,7 +67,7 @@ TEST_F(Prove, BuildsThatAreAlikeGiveTheSame) {
   EXPECT_THAT(err_, HasSubstr("qz: standard output: can't be written: "));
 }
 
-TEST_F(Prove, WhatProvesLittleIsNoProof) {
+TEST_F(Prove, TooLittleAudioIsNoComparison) {
   WriteSound("sound.wav", SF_FORMAT_WAV | SF_FORMAT_PCM_16, 16000, 1, std::vector<float>(16000));
   EXPECT_EQ(RunProve("good", "alike"), 1);
   EXPECT_THAT(err_, HasSubstr("qz: the network did not run in 1 buffers"));
@@ -78,7 +78,7 @@ TEST_F(Prove, WhatProvesLittleIsNoProof) {
   }
 }
 
-// The faulty kernels say themselves where they first were at fault.
+// The faulty kernels print themselves where they first were at fault.
 TEST_F(Prove, FaultyKernelsAreFound) {
   MakeBuild("faulty", "qz_trace_faulty");
   const std::pair<std::string, std::string> kernels[] = {{"max_pool", "network run "},
@@ -121,7 +121,7 @@ TEST_F(Prove, WhatIsNoWorkingBuildIsNamed) {
   MakeScript("talks", "echo This is no trace at all.; exec sleep 60");
   MakeBuild("unlaunched", "qz-trace");
   WriteBytes("unlaunched/launcher", "/nonexistent\n");
-  // A module whose head no longer tells where its sections are loads all the same.
+  // A module whose head no longer has the offset of its sections loads all the same.
   MakeBuild("stripped", "qz-trace");
   std::string module = Contents("stripped/lib/qz.so");
   std::filesystem::remove(Path("stripped/lib/qz.so"));
@@ -138,10 +138,10 @@ TEST_F(Prove, WhatIsNoWorkingBuildIsNamed) {
       {"unlaunched", "unlaunched/bin/qz-trace: "},
       {"stripped", "stripped/lib/qz.so: no symbol of an object inference_input_buffer of at least"},
   };
-  for (const auto& [build, wrong] : cases) {
+  for (const auto& [build, error] : cases) {
     EXPECT_EQ(RunProve("good", build), 4) << build;
     EXPECT_EQ(out_, "");
-    EXPECT_THAT(err_, AllOf(HasSubstr("\nqz: " + build + "/bin/"), HasSubstr(wrong)));
+    EXPECT_THAT(err_, AllOf(HasSubstr("\nqz: " + build + "/bin/"), HasSubstr(error)));
   }
 }
 
@@ -176,7 +176,7 @@ TEST_F(Prove, AnInterruptLeavesNoProgramBehind) {
   EXPECT_THAT(err_, HasSubstr("qz: interrupted"));
 }
 
-TEST_F(Prove, WhatCannotBeReadIsSaid) {
+TEST_F(Prove, WhatCannotBeReadIsNamed) {
   EXPECT_EQ(Run("$QZ prove " + Path("missing.wav") + " one-build another"), 3);
   EXPECT_THAT(err_, HasSubstr("missing.wav: can't be opened"));
   EXPECT_EQ(Run("$QZ prove " + Path("sound.wav") + " one-build"), 2);

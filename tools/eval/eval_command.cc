@@ -28,7 +28,7 @@ struct Job {
   std::vector<ScoredClip> clips;  // without their scores at first
 };
 
-// A class without a clip would have no figures.
+// A class without a clip would have no metrics.
 void RequireAllClasses(const Job& job, const model::Labels& labels, const std::string& manifest,
                        const std::string& condition) {
   std::string missing;
@@ -53,7 +53,7 @@ class Eval {
   // Now, not after the work.
   void CheckScoresOut(const std::vector<dataset::Recording>& recordings) const;
   void ScoreAll();
-  // False, and said, if the clip can't be read.
+  // False, after a message, if the clip can't be read.
   bool Score(const PackedModel& packed, ScoredClip* clip);
   std::string ScoresTable() const;
   void Print();
@@ -95,7 +95,7 @@ void Eval::CheckScoresOut(const std::vector<dataset::Recording>& recordings) con
 bool Eval::Score(const PackedModel& packed, ScoredClip* clip) {
   try {
     std::vector<int16_t> samples = dataset::ReadClip(clip->file);
-    if (samples.empty()) throw base::InputError(clip->file + ": holds no sound");
+    if (samples.empty()) throw base::InputError(clip->file + ": holds no audio");
     clip->samples = samples.size();
     clip->max = evaluation::ScoreClip(packed, std::move(samples)).max;
     return true;

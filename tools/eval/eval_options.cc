@@ -27,9 +27,9 @@ std::vector<EvalOptions::Part> ParseFoldModels(const std::vector<std::string>& w
     const char* const end = word.data() + equals;
     int fold = 0;
     const auto [stop, error] = std::from_chars(word.data(), end, fold);
-    const bool sound = error == std::errc() && stop == end && equals + 1 < word.size() &&
+    const bool valid = error == std::errc() && stop == end && equals + 1 < word.size() &&
                        fold >= 1 && fold <= dataset::kMaxFold;
-    if (!sound) {
+    if (!valid) {
       throw CLI::ValidationError(
           "--fold-model",
           word + " should be FOLD=FILE, with a fold of 1 to " + std::to_string(dataset::kMaxFold));
@@ -48,12 +48,12 @@ std::vector<EvalOptions::Part> ParseFoldModels(const std::vector<std::string>& w
 }  // namespace
 
 void AddEval(CLI::App* app, base::ExitCode* exit_code) {
-  CLI::App* eval = app->add_subcommand("eval", "Measure how well a model tells recordings apart");
+  CLI::App* eval = app->add_subcommand("eval", "Measure how well a model classifies recordings");
   const auto line = std::make_shared<EvalLine>();
   EvalOptions& options = line->options;
   eval->add_option("MANIFEST", options.manifest,
                    "List of recordings: file, class and fold, with tabs between. Fold 0 is never "
-                   "measured; each clip is heard from a fresh start, with silence behind it")
+                   "measured; each clip is scored from a fresh start, with silence behind it")
       ->required();
   CLI::Option* model = eval->add_option("--model", line->model,
                                         "Packed model (default: the module's, ../lib/qz.model)");
@@ -63,13 +63,13 @@ void AddEval(CLI::App* app, base::ExitCode* exit_code) {
                           ->check(CLI::Range(1, dataset::kMaxFold));
   eval->add_option("--fold-model", line->fold_models,
                    "FOLD=FILE, once for each fold to measure: cross-validation. A fold's clips are "
-                   "scored by its own model; the figures are means over the figures of the folds")
+                   "scored by its own model; the metrics are means over those of the folds")
       ->excludes(model)
       ->excludes(fold)
       ->allow_extra_args(false);
   eval->add_flag("--json", options.json, "One JSON object on standard output");
   eval->add_option("--scores-out", options.scores_out,
-                   "A file for the highest scores of each clip, with tabs between");
+                   "A file for the maximum scores of each clip, with tabs between");
   eval->callback([line, exit_code] {
     const std::filesystem::path lib = OwnBuild() / "lib";
     if (line->model.empty()) line->model = (lib / "qz.model").string();

@@ -47,7 +47,7 @@ class Features {
   void ListFiles();
   void ListManifest();
   void AddJob(dataset::Recording sound, const fs::path& folder);
-  // Says so if the sound can't be read.
+  // Prints a message if the file can't be read.
   void Write(const Job& job);
   void RemoveEarlierList() const;
   base::ExitCode WriteAll();
@@ -97,7 +97,7 @@ void Features::Write(const Job& job) {
     console_.Message("qz: skipped: " + std::string(error.what()));
     return;
   }
-  if (base::Interrupted()) return;  // in the midst of a sound, perhaps
+  if (base::Interrupted()) return;  // perhaps in the middle of a file
   const size_t frames = detector::FramesOf(samples.size());
   const fs::path path = folder_ / job.output;
   if (path.has_parent_path()) base::MakeOutputFolder(path.parent_path().string());

@@ -56,7 +56,7 @@ size_t CheckOneTable(const std::string& file, const PackedModel& packed,
   char line[96];
   std::snprintf(line, sizeof line, "%-4s %6zu bytes  %s", std::string(table.name).c_str(),
                 table.Bytes(),
-                findings.empty() ? "sound" : Counted(findings.size(), "finding").c_str());
+                findings.empty() ? "valid" : Counted(findings.size(), "finding").c_str());
   console->Data(line);
   if (!findings.empty()) {
     console->Data(WithoutLastLineEnd(model::FormatFindings(file, findings)));
@@ -77,7 +77,7 @@ base::ExitCode ModelCheckCommand(const std::string& file) {
   for (const model::TableLayout& table : model::kTables) {
     findings += CheckOneTable(file, packed, table, &console);
   }
-  console.Data(file + (findings == 0 ? ": sound" : ": not sound: " + Counted(findings, "finding")));
+  console.Data(file + (findings == 0 ? ": valid" : ": not valid: " + Counted(findings, "finding")));
   return OutputResult(findings == 0 ? base::kSuccess : base::kFaultFound, &console);
 }
 

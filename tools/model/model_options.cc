@@ -16,7 +16,7 @@ struct ModelLine {
 
 using Command = base::ExitCode (*)(const std::string& file, const std::string& other);
 
-// Adds a subcommand of FILE and one more word.
+// Adds a subcommand of FILE and one more argument.
 void AddModelCommand(CLI::App* model, const char* name, const char* about, const char* about_file,
                      CLI::Option* (*add_other)(CLI::App*, std::string*), Command command,
                      base::ExitCode* exit_code) {
@@ -35,14 +35,14 @@ void AddModel(CLI::App* app, base::ExitCode* exit_code) {
     return sub->add_option("-o", *path, "The file to write")->required();
   };
   AddModelCommand(
-      model, "check", "Say table by table whether a model is sound", "Packed model", nullptr,
+      model, "check", "Check a model table by table", "Packed model", nullptr,
       [](const std::string& file, const std::string&) { return ModelCheckCommand(file); },
       exit_code);
   AddModelCommand(
       model, "info", "Show what is in the tables", "Packed model",
       [](CLI::App* sub, std::string* clip) {
         return sub->add_option("--clip", *clip,
-                               "A sound file: show too what the tensors hold while it is heard");
+                               "A sound file: also show the values of the tensors over it");
       },
       ModelInfoCommand, exit_code);
   AddModelCommand(model, "import", "Pack a model's arrays",

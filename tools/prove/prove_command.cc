@@ -129,7 +129,7 @@ base::ExitCode Compare(const ProveOptions& options, const RawAudio& audio, Conso
 base::ExitCode ProveCommand(const ProveOptions& options) {
   base::CatchInterrupt();
   Console console;
-  std::error_code missing;  // a folder, which is reported later
+  std::error_code missing;  // is reported later
   if (std::filesystem::equivalent(options.builds[0], options.builds[1], missing)) {
     console.Message("qz: " + options.builds[0] + " and " + options.builds[1] +
                     " are one folder, should be two builds (see qz prove --help)");

@@ -16,7 +16,7 @@ struct ProveOptions {
 };
 
 // Plays a file to the detector of both builds and compares what they do: their modules, as loaded,
-// by all that they log and send and by what stands in their memory after each buffer of audio; the
+// by all that they log and send and by what is in their memory after each buffer of audio; the
 // same nanoapp linked into qz-trace by every frame and every operator too. Both nanoapps of a build
 // must agree. Prints what was compared, or the first difference. Throws base::Error.
 base::ExitCode ProveCommand(const ProveOptions& options);

@@ -22,11 +22,11 @@ std::vector<std::string> DefaultBuilds() {
 void AddProve(CLI::App* app, base::ExitCode* exit_code) {
   CLI::App* prove = app->add_subcommand(
       "prove",
-      "Play a sound file to the detector of two builds, compare all that they say and compute");
+      "Play a sound file to the detector of two builds, compare all that they send and compute");
   const auto options = std::make_shared<ProveOptions>();
   prove->add_option("FILE", options->file, "WAV, FLAC, OGG, ...; - is standard input")->required();
   // Without any the detector takes no audio, and nothing is computed.
-  AddClientOptions(prove, &options->host_clients, &options->client_nanoapps, /*least_nanoapps=*/1);
+  AddClientOptions(prove, &options->host_clients, &options->client_nanoapps, /*min_nanoapps=*/1);
   prove
       ->add_option("BUILDS", options->builds,
                    "Two build folders (default: this program's own, and target beside it)")

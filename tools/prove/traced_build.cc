@@ -94,7 +94,7 @@ void TracedBuild::Next(trace::Record* record) {
   try {
     reader_.Next(record);
   } catch (const trace::TraceError& error) {
-    // One that writes nonsense need not end; its exit status would say nothing more either.
+    // One that writes nonsense need not end; its exit status would add nothing either.
     const std::string end = at_end_ && process_ >= 0 ? AwaitEnd() : "";
     throw base::LaunchError(program_ + ": " + error.what() + (end.empty() ? "" : "; it " + end));
   }

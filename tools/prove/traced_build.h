@@ -11,8 +11,9 @@
 
 namespace qz::tools {
 
-// A build's bin/qz-trace at work on its lib/qz.so, as a child process. Words that run its programs
-// on this machine stand in the build folder's file `launcher`, one a line; often there are none.
+// A build's bin/qz-trace at work on its lib/qz.so, as a child process. The command that runs
+// its programs on this machine is in the build folder's file `launcher`, a word a line; often it is
+// empty.
 // Where they run the program somewhere else, the paths that follow must be reachable there, and its
 // standard output must come back; it has no standard input.
 class TracedBuild {
@@ -31,8 +32,8 @@ class TracedBuild {
  private:
   void Start(const std::vector<std::string>& command);
   size_t Read(uint8_t* bytes, size_t size);
-  // Waits for the program's end, or ends it at an interrupt, and all that it has left behind. Says
-  // how it ended; empty when it was with exit status 0.
+  // Waits for the program's end, or ends it at an interrupt, and all that it has left behind.
+  // Returns how it ended; empty when it was with exit status 0.
   std::string AwaitEnd();
 
   std::string program_;
