@@ -6,7 +6,7 @@
 
 namespace qz::train {
 
-// Adam with decoupled weight decay, over the learnt numbers.
+// Adam with decoupled weight decay, over the trained numbers.
 struct Adam {
   Values mean = Values(kParameters.trained);
   Values square = Values(kParameters.trained);

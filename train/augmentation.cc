@@ -22,7 +22,8 @@ double MeanSquare(const std::vector<float>& sound) {
 
 bool Happens(double share, base::NumberGenerator* random) { return random->Unit() < share; }
 
-// `slope`: how much of each sample stays in the next; 0 is white. Two of them make a noise between.
+// `slope`: the share of each sample that is added to the next; 0 is white noise. `white` is the
+// share of white noise on top.
 std::vector<float> MakeNoise(double slope, double white, uint64_t seed) {
   base::NumberGenerator random(seed);
   std::vector<float> noise(kNoiseSamples);
@@ -48,11 +49,11 @@ int64_t Onset(const std::vector<int16_t>& samples) {
   return std::find_if(samples.begin(), samples.end(), loud) - samples.begin();
 }
 
-// Places between samples, in 2^-24.
+// Positions between samples, in units of 2^-24.
 constexpr int64_t kPhaseOne = int64_t{1} << 24;
 
 // Adds samples from `phase` until `last` or the end of the sound, each interpolated between two;
-// gives the phase of the next.
+// returns the phase of the next.
 int64_t AddPart(const std::vector<int16_t>& samples, int64_t last, float gain, int64_t step,
                 int64_t phase, const float* end, float** out) {
   const int64_t left = last * kPhaseOne - phase;
@@ -113,7 +114,7 @@ void Augmentation::Make(size_t first, uint64_t seed, Eigen::Index sequence, Batc
   Mask(&random, sequence, features);
 }
 
-// Wholly in the sequence, where it fits, and else filling it; what lies before and behind it stays
+// Wholly in the sequence where it fits, else filling it; what comes before and after it stays
 // silent.
 void Augmentation::AddClip(const Clip& clip, double gain, base::NumberGenerator* random,
                            Sound* sound) const {
@@ -154,8 +155,8 @@ void Augmentation::AddNoise(base::NumberGenerator* random, Sound* sound) const {
   }
 }
 
-// Another microphone: louder low or high channels, all channels a place up or down. What was
-// silent stays so.
+// As from another microphone: louder low or high channels, all channels moved up or down by one.
+// What was silent stays so.
 void Augmentation::Colour(base::NumberGenerator* random, Eigen::Index sequence,
                           Batch* features) const {
   auto rows = features->values.middleRows(sequence * features->steps(), features->steps());
@@ -188,7 +189,7 @@ void Augmentation::Mask(base::NumberGenerator* random, Eigen::Index sequence,
     rows.middleRows(begin, length).setZero();
   }
   for (int i = 0; i < recipe_.channel_masks; ++i) {
-    const int width = random->Between(0, recipe_.widest_channel_mask);
+    const int width = random->Between(0, recipe_.max_channel_mask);
     const int begin = random->Between(0, static_cast<int>(rows.cols()) - width);
     rows.middleCols(begin, width).setZero();
   }

@@ -1,5 +1,5 @@
-// Makes many sounds of few: the same recording at another place, loudness, speed, among other
-// sounds, in noise; and features with gaps, as from another microphone.
+// Data augmentation: the same recording at another time, loudness and speed, mixed with others and
+// with noise; and features with another spectral tilt and with masks.
 #pragma once
 
 #include <cstdint>
@@ -14,7 +14,7 @@ namespace qz::train {
 
 class Augmentation {
  public:
-  // The clips are not copied; there is at least one.
+  // The clips are not copied and outlive this; there is at least one.
   Augmentation(const Recipe& recipe, const std::vector<Clip>& clips);
 
   // Writes sequence `sequence` of a batch of features (0 to 255, FramesFor(recipe.windows) frames)

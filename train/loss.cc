@@ -9,8 +9,8 @@ namespace {
 // log(1 + e^x) without overflow.
 double SoftPlus(double x) { return x > 0 ? x + std::log1p(std::exp(-x)) : std::log1p(std::exp(x)); }
 
-// Beyond it a score of 8 bits changes no more.
-constexpr double kFarthestLogit = 6;
+// Beyond it a score of 8 bits does not change.
+constexpr double kMaxLogit = 6;
 
 double Logistic(double x) { return 1 / (1 + std::exp(-x)); }
 
@@ -47,14 +47,15 @@ double ClipLoss(const Batch& logits, const Matrix& targets, const LossShape& sha
   return loss / static_cast<double>(divisor);
 }
 
-double TeachingLoss(const Batch& logits, const Batch& distilled, float divisor, Batch* dlogits) {
+double DistillationLoss(const Batch& logits, const Batch& distillation_targets, float divisor,
+                        Batch* dlogits) {
   dlogits->Resize(logits.sequences, logits.steps(), logits.channels());
   const double parts = static_cast<double>(divisor) * static_cast<double>(logits.steps());
   double loss = 0;
   for (Eigen::Index i = 0; i < logits.values.size(); ++i) {
-    const auto distillation_target = static_cast<double>(distilled.values.data()[i]);
-    const double away = static_cast<double>(logits.values.data()[i]) -
-                        std::clamp(distillation_target, -kFarthestLogit, kFarthestLogit);
+    const auto target = static_cast<double>(distillation_targets.values.data()[i]);
+    const double away =
+        static_cast<double>(logits.values.data()[i]) - std::clamp(target, -kMaxLogit, kMaxLogit);
     loss += 0.5 * away * away;
     dlogits->values.data()[i] = static_cast<float>(away / parts);
   }

@@ -5,25 +5,26 @@
 
 namespace qz::train {
 
-// How windows of a sequence make one score, and what a wrong score costs.
+// How the windows of a sequence give one score, and the loss of it.
 struct LossShape {
   float sharpness = 3;  // of the soft maximum over the windows of a sequence
   float smoothing = 0;  // targets are moved that far from 0 and 1
-  // Cost of a missed positive as a multiple of a false alarm's, by class.
+  // Loss of a missed positive as a multiple of a false alarm's, by class.
   RowVector positive_weight = RowVector::Ones(model::kClasses);
 };
 
 // logits: sequences of windows x classes; targets: sequences x classes, 0 to 1. The clip's logit is
-// the soft maximum (1 / sharpness) log mean exp(sharpness x logit) over its windows, its cost the
-// cross-entropy of its logistic with the target. Gives the sum over sequences and classes divided
+// the soft maximum (1 / sharpness) log mean exp(sharpness x logit) over its windows, its loss the
+// cross-entropy of its logistic with the target. Returns the sum over sequences and classes divided
 // by `divisor`, and its gradient.
 double ClipLoss(const Batch& logits, const Matrix& targets, const LossShape& shape, float divisor,
                 Batch* dlogits);
 
-// Half the square of every window's distance from the teachers' logit, which counts from -6 to 6:
-// sum over windows and classes, divided by `divisor` and the windows of a sequence, and its
-// gradient. The cross-entropy of the logistics would let sure answers, whose order matters, run
-// together.
-double TeachingLoss(const Batch& logits, const Batch& distilled, float divisor, Batch* dlogits);
+// Half the square of every logit's distance from the teachers' mean logit, which is clamped to -6
+// to 6: sum over windows and classes, divided by `divisor` and the windows of a sequence, and its
+// gradient. The cross-entropy of the logistics would hardly tell confident scores apart, whose
+// order matters.
+double DistillationLoss(const Batch& logits, const Batch& distillation_targets, float divisor,
+                        Batch* dlogits);
 
 }  // namespace qz::train

@@ -17,22 +17,24 @@ namespace {
 
 struct Entry {
   const char* name;
-  double low, high;
+  double min, max;
   int Recipe::*whole;
   double Recipe::*real;
 };
 
-constexpr Entry Whole(const char* name, int Recipe::*field, double low, double high) {
-  return {name, low, high, field, nullptr};
+constexpr Entry Whole(const char* name, int Recipe::*field, double min, double max) {
+  return {name, min, max, field, nullptr};
 }
-constexpr Entry Real(const char* name, double Recipe::*field, double low, double high) {
-  return {name, low, high, nullptr, field};
+constexpr Entry Real(const char* name, double Recipe::*field, double min, double max) {
+  return {name, min, max, nullptr, field};
 }
 
 constexpr Entry kEntries[] = {
     Whole("teachers", &Recipe::teachers, 1, 100),
     Whole("epochs", &Recipe::epochs, 1, 100000),
     Whole("tuning_epochs", &Recipe::tuning_epochs, 1, 100000),
+    Whole("min_steps", &Recipe::min_steps, 1, 1000000),
+    Whole("min_tuning_steps", &Recipe::min_tuning_steps, 1, 1000000),
     Whole("batch", &Recipe::batch, 2, 1024),
     Whole("windows", &Recipe::windows, 1, 64),
     Real("rate", &Recipe::rate, 0, 1),
@@ -43,8 +45,8 @@ constexpr Entry kEntries[] = {
     Real("smoothing", &Recipe::smoothing, 0, 0.49),
     Real("positive_weight", &Recipe::positive_weight, 0.01, 100),
     Real("sharpness", &Recipe::sharpness, 0.01, 100),
-    Real("lowest_gain", &Recipe::min_gain, -90, 90),
-    Real("highest_gain", &Recipe::max_gain, -90, 90),
+    Real("min_gain", &Recipe::min_gain, -90, 90),
+    Real("max_gain", &Recipe::max_gain, -90, 90),
     Real("start_share", &Recipe::start_share, 0, 1),
     Real("turn_share", &Recipe::turn_share, 0, 1),
     Real("speed_share", &Recipe::speed_share, 0, 1),
@@ -52,14 +54,14 @@ constexpr Entry kEntries[] = {
     Real("mix_share", &Recipe::mix_share, 0, 1),
     Real("mix_range", &Recipe::mix_range, 0, 90),
     Real("noise_share", &Recipe::noise_share, 0, 1),
-    Real("lowest_snr", &Recipe::min_snr, -90, 90),
-    Real("highest_snr", &Recipe::max_snr, -90, 90),
+    Real("min_snr", &Recipe::min_snr, -90, 90),
+    Real("max_snr", &Recipe::max_snr, -90, 90),
     Real("tilt", &Recipe::tilt, 0, 200),
     Real("shift_share", &Recipe::shift_share, 0, 1),
     Whole("time_masks", &Recipe::time_masks, 0, 100),
-    Whole("longest_time_mask", &Recipe::max_time_mask, 1, config::kWindowFrames),
+    Whole("max_time_mask", &Recipe::max_time_mask, 1, config::kWindowFrames),
     Whole("channel_masks", &Recipe::channel_masks, 0, config::kFeatureChannels),
-    Whole("widest_channel_mask", &Recipe::widest_channel_mask, 1, config::kFeatureChannels),
+    Whole("max_channel_mask", &Recipe::max_channel_mask, 1, config::kFeatureChannels),
 };
 
 std::string Number(double value) {
@@ -68,14 +70,15 @@ std::string Number(double value) {
   return text;
 }
 
-// What no single value tells.
+// Conditions on more than one value.
 void CheckRanges(const Recipe& recipe, const std::string& path) {
   if (recipe.batch % 2 != 0) {
     throw base::InputError(path + ": batch is " + std::to_string(recipe.batch) +
-                           ", should be even: two threads share it");
+                           ", expected an even number: two threads share it");
   }
   if (recipe.min_gain > recipe.max_gain || recipe.min_snr > recipe.max_snr) {
-    throw base::InputError(path + ": a lowest gain or SNR is above the highest");
+    throw base::InputError(
+        path + ": min_gain or min_snr is above its maximum, expected at most max_gain or max_snr");
   }
 }
 
@@ -87,11 +90,11 @@ void SetInRecipe(const std::string& name, const std::string& value, Recipe* reci
     char* end = nullptr;
     const double number = std::strtod(value.c_str(), &end);
     const bool whole = entry.whole == nullptr || number == std::floor(number);
-    if (value.empty() || *end != '\0' || !(number >= entry.low && number <= entry.high) || !whole) {
+    if (value.empty() || *end != '\0' || !(number >= entry.min && number <= entry.max) || !whole) {
       std::string line = name;
-      line += " is '" + value + "', should be a ";
+      line += " is '" + value + "', expected a ";
       line += entry.whole != nullptr ? "whole number from " : "number from ";
-      line += Number(entry.low) + " to " + Number(entry.high);
+      line += Number(entry.min) + " to " + Number(entry.max);
       throw base::InputError(line);
     }
     if (entry.whole != nullptr) {
@@ -101,7 +104,7 @@ void SetInRecipe(const std::string& name, const std::string& value, Recipe* reci
     }
     return;
   }
-  throw base::InputError("a recipe knows no '" + name + "'");
+  throw base::InputError("unknown name '" + name + "'");
 }
 
 Recipe ReadRecipe(const std::string& path) {
@@ -115,7 +118,7 @@ Recipe ReadRecipe(const std::string& path) {
     if (!(words >> name)) continue;
     const std::string location = path + ": line " + std::to_string(number) + ": ";
     if (!(words >> value) || words >> more) {
-      throw base::InputError(location + "should be a name and a value");
+      throw base::InputError(location + "expected a name and a value");
     }
     try {
       SetInRecipe(name, value, &recipe);

@@ -13,7 +13,7 @@ namespace qz::train {
 namespace {
 
 // To be raised with every change of the layout, or of what an epoch does. Numbers are as in memory,
-// little-endian; behind them stands their digest.
+// little-endian; their digest follows.
 constexpr char kMagic[] = "qz training state 2\n";
 
 // Of a hundred teachers and more.
@@ -28,7 +28,7 @@ std::string DigestOf(const std::vector<Clip>& clips) {
   return std::to_string(clips.size()) + " clips, digest " + std::to_string(digest);
 }
 
-// Hands every field to `visit` in the order of the file; the teachers have their number already.
+// Calls `visit` with every field in the order of the file; the number of teachers is set already.
 template <typename State, typename Visit>
 void ForEachField(State& state, Visit visit) {
   visit(&state.epoch, sizeof(state.epoch));
@@ -55,9 +55,9 @@ size_t SizeOf(const TrainingState& state) {
 }  // namespace
 
 std::string Fingerprint(const Recipe& recipe, uint64_t seed, const std::vector<Clip>& trained,
-                        const std::vector<Clip>& validated) {
-  return kMagic + Describe(recipe) + "seed " + std::to_string(seed) + "\nlearns from " +
-         DigestOf(trained) + "\njudged by " + DigestOf(validated) + "\n";
+                        const std::vector<Clip>& validation_clips) {
+  return kMagic + Describe(recipe) + "seed " + std::to_string(seed) + "\ntrained on " +
+         DigestOf(trained) + "\nvalidated on " + DigestOf(validation_clips) + "\n";
 }
 
 void WriteState(const std::string& path, const std::string& fingerprint,
@@ -81,7 +81,7 @@ std::optional<TrainingState> ReadState(const std::string& path, const std::strin
                            ": is of another run (recipe, seed or clips differ); remove it "
                            "or name another file");
   }
-  // As many teachers as the size tells.
+  // The number of teachers follows from the size.
   TrainingState state;
   const size_t fields = SizeOf(state), teacher = kParameters.all * sizeof(float);
   const size_t held = bytes.size() - fingerprint.size() - sizeof(uint64_t);

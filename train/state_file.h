@@ -1,4 +1,4 @@
-// A training run on disk, so that one that was stopped goes on as if it had not been.
+// A training run on disk, so that a stopped one continues as if it had not been stopped.
 #pragma once
 
 #include <optional>
@@ -8,9 +8,9 @@
 
 namespace qz::train {
 
-// What a run depends on, as text: recipe, seed, clips.
+// What the result of a run depends on, as text: recipe, seed, clips.
 std::string Fingerprint(const Recipe& recipe, uint64_t seed, const std::vector<Clip>& trained,
-                        const std::vector<Clip>& validated);
+                        const std::vector<Clip>& validation_clips);
 
 // Writes all or nothing. Throws std::runtime_error naming the file and the cause.
 void WriteState(const std::string& path, const std::string& fingerprint,

@@ -14,12 +14,13 @@ struct TrainOptions {
   std::string recipe_file;  // empty: the recipe built in
   std::string state_file;   // empty: none, a stopped run is lost
   uint64_t seed = 1;
-  int hold_out = 0;  // fold that is not learnt from but judged by; 0: none
-  int patience = 0;  // epochs without a better figure that end the float part; 0: never
+  int hold_out = 0;  // fold that is not trained but validated on; 0: none
+  int patience = 0;  // epochs without a better metric that end a teacher's training; 0: never
   int threads = 2;
 };
 
-// Learns from a list of recordings and writes a packed model. Throws base::Error.
+// Trains on a list of recordings and writes a packed model. Prints its own warnings; throws what
+// stops it before or during the work.
 base::ExitCode TrainCommand(const TrainOptions& options);
 
 }  // namespace qz::train

@@ -7,15 +7,15 @@
 
 namespace qz::train {
 
-// Tells how far a run is, on stderr: on a terminal a bar that is drawn over, elsewhere a line now
-// and then.
+// The progress of a run on stderr: on a terminal a bar that is redrawn, elsewhere a line every 20
+// epochs.
 class TrainProgress {
  public:
-  // `done` epochs were there before.
+  // `done` epochs were completed before.
   explicit TrainProgress(int done);
   ~TrainProgress();
 
-  // `figures` may be null: nothing is held out.
+  // `metrics` may be null: nothing is held out.
   void Show(const std::string& phase, int done, int left, double loss, const Metrics* metrics);
 
  private:

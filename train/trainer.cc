@@ -8,8 +8,8 @@
 namespace qz::train {
 namespace {
 
-// A batch is cut into so many parts, whatever the number of threads, each normalised by itself: the
-// sums do not depend on the machine.
+// A batch is divided into this many parts, whatever the number of threads, each normalised by
+// itself: the sums do not depend on the machine.
 constexpr size_t kShards = 2;
 
 constexpr float kRunningRate = 0.05f;
@@ -53,16 +53,16 @@ Trainer::Trainer(const Recipe& recipe, uint64_t seed, int threads, const std::ve
 }
 
 int Trainer::EpochsLeft(const TrainingState& state) const {
-  if (Tuning(state)) return recipe_.tuning_epochs - state.phase_epoch;
+  const int left = EpochsOf(Tuning(state)) - state.phase_epoch;
+  if (Tuning(state)) return left;
   const int teachers = recipe_.teachers - static_cast<int>(state.teachers.size());
-  return teachers * recipe_.epochs - state.phase_epoch + recipe_.tuning_epochs;
+  return left + (teachers - 1) * EpochsOf(/*tuning=*/false) + EpochsOf(/*tuning=*/true);
 }
 
 bool Trainer::Accepts(const TrainingState& state) const {
-  const int epochs = Tuning(state) ? recipe_.tuning_epochs : recipe_.epochs;
   return state.teachers.size() <= static_cast<size_t>(recipe_.teachers) && state.phase_epoch >= 0 &&
-         state.phase_epoch <= epochs && state.epoch >= state.phase_epoch &&
-         state.epoch <= 200 * 100000;
+         state.phase_epoch <= EpochsOf(Tuning(state)) && state.epoch >= state.phase_epoch &&
+         state.epoch <= recipe_.teachers * EpochsOf(/*tuning=*/false) + EpochsOf(/*tuning=*/true);
 }
 
 void Trainer::BeginPhase(TrainingState* state) const {
@@ -99,7 +99,7 @@ double Trainer::RunEpoch(TrainingState* state) {
   }
   ++state->epoch;
   ++state->phase_epoch;
-  if (!Tuning(*state) && state->phase_epoch == recipe_.epochs) {
+  if (!Tuning(*state) && state->phase_epoch == EpochsOf(/*tuning=*/false)) {
     EndTeacher(state->best_metric >= 0 ? state->best : state->average, state);
   }
   return loss / static_cast<double>(steps);
@@ -110,17 +110,25 @@ size_t Trainer::StepsAnEpoch() const {
   return (clips_.size() + batch - 1) / batch;
 }
 
-void Trainer::Teach(const TrainingState& state, Shard* shard) const {
-  shard->distilled = Batch();
+int Trainer::EpochsOf(bool tuning) const {
+  const auto min_steps = static_cast<size_t>(tuning ? recipe_.min_tuning_steps : recipe_.min_steps);
+  const size_t steps = StepsAnEpoch();
+  return std::max(tuning ? recipe_.tuning_epochs : recipe_.epochs,
+                  static_cast<int>((min_steps + steps - 1) / steps));
+}
+
+void Trainer::SetDistillationTargets(const TrainingState& state, Shard* shard) const {
+  Batch& targets = shard->distillation_targets;
+  targets = Batch();
   for (const Values& teacher : state.teachers) {
     const Batch& logits = shard->float_network.Forward(teacher, shard->features, nullptr);
-    if (shard->distilled.sequences == 0) {
-      shard->distilled = logits;
+    if (targets.sequences == 0) {
+      targets = logits;
     } else {
-      shard->distilled.values += logits.values;
+      targets.values += logits.values;
     }
   }
-  shard->distilled.values /= static_cast<float>(state.teachers.size());
+  targets.values /= static_cast<float>(state.teachers.size());
 }
 
 void Trainer::RunShard(const TrainingState& state, const QuantisedParameters* quantised,
@@ -144,8 +152,8 @@ void Trainer::RunShard(const TrainingState& state, const QuantisedParameters* qu
   } else {
     Batch logits = shard.quantised_network.Forward(*quantised, shard.features);
     logits.values *= static_cast<float>(kLogitScale);
-    Teach(state, &shard);
-    shard.loss = TeachingLoss(logits, shard.distilled, divisor, &shard.dlogits);
+    SetDistillationTargets(state, &shard);
+    shard.loss = DistillationLoss(logits, shard.distillation_targets, divisor, &shard.dlogits);
     shard.quantised_network.Backward(*quantised, shard.dlogits, &shard.gradient);
   }
 }
@@ -188,8 +196,7 @@ double Trainer::RunStep(TrainingState* state, const std::vector<size_t>& order, 
 float Trainer::RateAt(const TrainingState& state) const {
   const bool tuning = Tuning(state);
   const auto done = static_cast<double>(state.adam.steps);
-  const double all = static_cast<double>(tuning ? recipe_.tuning_epochs : recipe_.epochs) *
-                     static_cast<double>(StepsAnEpoch());
+  const double all = static_cast<double>(EpochsOf(tuning)) * static_cast<double>(StepsAnEpoch());
   const double warmth = std::min(1.0, (done + 1) / kWarmUpSteps);
   const double max = tuning ? recipe_.tuning_rate : recipe_.rate;
   return static_cast<float>(max * warmth * 0.5 * (1 + std::cos(kPi * done / all)));

@@ -1,5 +1,6 @@
-// A training run: some networks over float, the teachers; then the model, which begins as the first
-// of them and learns in the device's arithmetic to answer as they do together.
+// A training run: some networks over float, the teachers; then the model, which starts from the
+// first of them and is trained in the device's arithmetic on the mean of their logits
+// (distillation).
 #pragma once
 
 #include <cstdint>
@@ -14,13 +15,13 @@
 
 namespace qz::train {
 
-// All that a run is made of at the end of an epoch: what is written to go on from later.
+// The state of a run at the end of an epoch: what is written to continue from later.
 struct TrainingState {
   int epoch = 0;                             // epochs done in all
   int phase_epoch = 0;                       // of them in this phase: a teacher, or the tuning
-  std::vector<Values> teachers;              // folded, of the phases that are done
-  Values values = Values(kParameters.all);   // what is being learnt
-  Values average = Values(kParameters.all);  // its moving average: it is judged, and what remains
+  std::vector<Values> teachers;              // folded, of the completed phases
+  Values values = Values(kParameters.all);   // being trained
+  Values average = Values(kParameters.all);  // their moving average: validated, and the result
   Adam adam;
   // With patience: the average that was best in this phase.
   Values best = Values(kParameters.all);
@@ -38,16 +39,16 @@ class Trainer {
     return state.teachers.size() == static_cast<size_t>(recipe_.teachers);
   }
   bool Done(const TrainingState& state) const {
-    return Tuning(state) && state.phase_epoch == recipe_.tuning_epochs;
+    return Tuning(state) && state.phase_epoch == EpochsOf(/*tuning=*/true);
   }
-  // As far as is known.
+  // With patience there may be fewer.
   int EpochsLeft(const TrainingState& state) const;
-  // False for numbers that no run of this recipe comes to.
+  // False for numbers that no run of this recipe reaches.
   bool Accepts(const TrainingState& state) const;
   // Ends a teacher's phase: `average` becomes a teacher.
   void EndTeacher(const Values& average, TrainingState* state) const;
 
-  // One epoch: every clip once as the first of a sequence. Gives the mean loss.
+  // One epoch: every clip once as the first of a sequence. Returns the mean loss.
   double RunEpoch(TrainingState* state);
 
  private:
@@ -56,17 +57,19 @@ class Trainer {
     Matrix targets;
     FloatNetwork float_network;
     QuantisedNetwork quantised_network;
-    Batch distilled;
+    Batch distillation_targets;
     Batch dlogits;
     Values gradient;
     double loss = 0;
   };
 
   size_t StepsAnEpoch() const;
+  // Of a teacher or the tuning: the recipe's, or as many as its minimum of steps takes.
+  int EpochsOf(bool tuning) const;
   std::vector<size_t> OrderOf(int epoch) const;
   void BeginPhase(TrainingState* state) const;
   // The mean logits of all teachers.
-  void Teach(const TrainingState& state, Shard* shard) const;
+  void SetDistillationTargets(const TrainingState& state, Shard* shard) const;
   void RunShard(const TrainingState& state, const QuantisedParameters* quantised,
                 const std::vector<size_t>& order, size_t first, uint64_t step, size_t index);
   double RunStep(TrainingState* state, const std::vector<size_t>& order, size_t first,

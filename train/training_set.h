@@ -1,4 +1,4 @@
-// The recordings that a model learns from, and those that it is judged by.
+// The recordings that a model is trained and validated on.
 #pragma once
 
 #include <cstdint>
@@ -14,7 +14,7 @@ namespace qz::train {
 struct Clip {
   std::string file;
   int fold = 0;
-  int output = -1;               // that should answer; -1: none
+  int output = -1;               // of its class; -1: of none
   std::vector<int16_t> samples;  // mono, 16 kHz
 };
 
@@ -31,8 +31,8 @@ constexpr int FramesFor(int windows) {
   return static_cast<int>(config::kWindowFrames + config::kFramesBetweenRuns * (windows - 1));
 }
 
-// A clip from a fresh start and the silence behind it, as features 0 to 255, for all network runs
-// that judge it: FramesFor(runs) x features.
+// A clip from a fresh start and the silence after it, as features 0 to 255, for all network runs on
+// which it is validated: FramesFor(runs) x features.
 Batch ValidationFeatures(const std::vector<int16_t>& samples);
 
 // Writes as many frames of features as a sequence of the batch holds, as floats from 0 to 255.

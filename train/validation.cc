@@ -23,11 +23,11 @@ float DeviceScore(float logit_steps) {
   return static_cast<float>(std::min(std::floor(256 * logistic + 0.5), 255.0) / 256);
 }
 
-std::vector<Scores> ScoresOf(const Values& folded, const std::vector<Batch>& validated) {
+std::vector<Scores> ScoresOf(const Values& folded, const std::vector<Batch>& features) {
   FloatNetwork network;
   std::vector<Scores> all;
-  for (const Batch& features : validated) {
-    Scores scores = Max(network.Forward(folded, features, nullptr));
+  for (const Batch& clip : features) {
+    Scores scores = Max(network.Forward(folded, clip, nullptr));
     for (float& score : scores) score = 1 / (1 + std::exp(-score));
     all.push_back(scores);
   }
@@ -35,11 +35,11 @@ std::vector<Scores> ScoresOf(const Values& folded, const std::vector<Batch>& val
 }
 
 std::vector<Scores> ScoresOf(const QuantisedParameters& parameters,
-                             const std::vector<Batch>& validated) {
+                             const std::vector<Batch>& features) {
   QuantisedNetwork network;
   std::vector<Scores> all;
-  for (const Batch& features : validated) {
-    Scores scores = Max(network.Forward(parameters, features));
+  for (const Batch& clip : features) {
+    Scores scores = Max(network.Forward(parameters, clip));
     std::transform(scores.begin(), scores.end(), scores.begin(), DeviceScore);
     all.push_back(scores);
   }

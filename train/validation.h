@@ -1,4 +1,4 @@
-// Metrics of parameters on clips that they were not trained on.
+// Scores and metrics of parameters on clips.
 #pragma once
 
 #include <vector>
@@ -12,22 +12,23 @@ namespace qz::train {
 
 using detector::Scores;
 
-// The maximum score of each output over the network's runs, a clip each. `folded`: in float.
-std::vector<Scores> ScoresOf(const Values& folded, const std::vector<Batch>& validated);
+// The maximum score of each output over the network's runs, for each clip of which `features` has
+// the features. `folded`: in float.
+std::vector<Scores> ScoresOf(const Values& folded, const std::vector<Batch>& features);
 // By the device's arithmetic: multiples of 1/256.
 std::vector<Scores> ScoresOf(const QuantisedParameters& parameters,
-                             const std::vector<Batch>& validated);
+                             const std::vector<Batch>& features);
 
-// The ensemble of networks: the logistic of their mean logits, of float scores.
+// The ensemble of networks: the logistic of the mean of their logits, from float scores.
 std::vector<Scores> MeanLogits(const std::vector<std::vector<Scores>>& networks);
 
 // The device's score for a logit in steps of 0.256.
 float DeviceScore(float logit_steps);
 
 struct Metrics {
-  double average_precision = 0;  // means over the outputs that some clip is labelled with
+  double average_precision = 0;  // means over the outputs that have clips
   double roc_auc = 0;
-  int outputs = 0;  // that were evaluated
+  int outputs = 0;  // that have clips of their class and others
 };
 
 Metrics MetricsOf(const std::vector<Scores>& scores, const std::vector<Clip>& clips);

@@ -26,7 +26,7 @@ Batch RandomBatch(base::NumberGenerator* random, int sequences, int steps, int c
   return batch;
 }
 
-// How `value` changes with each of the numbers at `x`, by central differences.
+// The derivatives of `value` by each of the numbers at `x`, by central differences.
 std::vector<double> Slopes(Eigen::Index count, float* x, const std::function<double()>& value) {
   constexpr float kStep = 1.0f / 64;
   std::vector<double> slopes;
@@ -96,7 +96,7 @@ TEST(Layers, ConvolutionGradientsAreItsSlopes) {
   }
 }
 
-TEST(Layers, PoolHandsTheGradientToTheLarger) {
+TEST(Layers, PoolPassesTheGradientToTheLarger) {
   Batch x;
   x.Resize(1, 5, 2);
   x.values << 1, 4, 2, 4, -3, 0, -5, 1, 9, 9;
@@ -154,16 +154,16 @@ TEST(Loss, GradientIsItsSlope) {
              gradient.values, 1e-3, "logit");
 }
 
-TEST(Loss, DistillationTargetsAreFollowedWindowByWindow) {
+TEST(Loss, DistillationGradientIsItsSlope) {
   base::NumberGenerator random(5);
   Batch logits = RandomBatch(&random, 2, 3, 5);
-  const Batch distilled = RandomBatch(&random, 2, 3, 5);
+  const Batch targets = RandomBatch(&random, 2, 3, 5);
   Batch gradient, unused;
-  TeachingLoss(logits, distilled, 2, &gradient);
+  DistillationLoss(logits, targets, 2, &gradient);
   ExpectNear(Slopes(logits.values.size(), logits.values.data(),
-                    [&] { return TeachingLoss(logits, distilled, 2, &unused); }),
+                    [&] { return DistillationLoss(logits, targets, 2, &unused); }),
              gradient.values, 1e-3, "logit");
-  TeachingLoss(distilled, distilled, 2, &gradient);
+  DistillationLoss(targets, targets, 2, &gradient);
   EXPECT_EQ(gradient.values.cwiseAbs().maxCoeff(), 0);
 }
 

@@ -19,13 +19,15 @@ namespace {
 
 using testing::AllOf;
 using testing::HasSubstr;
+using testing::Not;
 using testing::ThrowsMessage;
 
 // Six short sounds in each of two folds, one of which is held out, and one that is not there.
 class Commands : public testing::Test {
  protected:
   void SetUp() override {
-    std::ofstream(folder_.Path("recipe")) << "teachers 1\nepochs 1\ntuning_epochs 1\nbatch 4\n";
+    std::ofstream(folder_.Path("recipe")) << "teachers 1\nepochs 1\ntuning_epochs 1\nmin_steps 1\n"
+                                          << "min_tuning_steps 1\nbatch 4\n";
     options_.output = folder_.Path("model");
     options_.recipe_file = folder_.Path("recipe");
     options_.labels_file = QZ_LABELS;
@@ -58,7 +60,7 @@ class Commands : public testing::Test {
     sf_close(file);
   }
 
-  std::string FitAndListen() {
+  std::string Fit() {
     testing::internal::CaptureStdout();
     testing::internal::CaptureStderr();
     exit_code_ = TrainCommand(options_);
@@ -70,10 +72,10 @@ class Commands : public testing::Test {
   base::ExitCode exit_code_ = base::kSuccess;
 };
 
-TEST_F(Commands, FitWritesASoundModelAndNamesWhatItSkipped) {
-  EXPECT_THAT(FitAndListen(),
+TEST_F(Commands, FitWritesAValidModelAndNamesWhatItSkipped) {
+  EXPECT_THAT(Fit(),
               AllOf(HasSubstr("skipped: " + folder_.Path("absent.wav") + ": can't be opened"),
-                    HasSubstr("learning from 6 clips, judged by 6, 1 skipped"),
+                    HasSubstr("training on 6 clips, validating on 6, 1 skipped"),
                     HasSubstr("on 6 clips that were held out"), HasSubstr("loss of quantisation"),
                     HasSubstr(" of 21 operators: "), HasSubstr(", the same\n")));
   EXPECT_EQ(exit_code_, base::kUnreadableInput);
@@ -85,11 +87,27 @@ TEST_F(Commands, FitWritesASoundModelAndNamesWhatItSkipped) {
               AllOf(HasSubstr("on 12 clips: "), HasSubstr(", the same\n")));
 }
 
+TEST_F(Commands, FitWarnsOfFewClipsAndOfAModelThatFailsOnThem) {
+  std::ofstream list(options_.manifest, std::ios::app);
+  for (int i = 0; i < 19; ++i) {
+    const std::string copy = "copy" + std::to_string(i) + ".wav";
+    std::filesystem::create_hard_link(folder_.Path("4.wav"), folder_.Path(copy));
+    list << copy << "\tperson_sneeze\t1\n";
+  }
+  list.close();
+  EXPECT_THAT(Fit(),
+              AllOf(HasSubstr("warning: few clips to train on: dog_bark 1, baby_cry 1, rooster 1, "
+                              "clock_tick 1; expected 20 or more a class\n"),
+                    Not(HasSubstr("warning: the model"))));
+  options_.hold_out = 0;
+  EXPECT_THAT(Fit(), HasSubstr("warning: the model does not recognise its own clips: mean AP 0."));
+}
+
 TEST_F(Commands, RefuseBeforeTheWorkBegins) {
   const auto fit = [&] { TrainCommand(options_); };
   options_.hold_out = 3;
   EXPECT_THAT(fit, ThrowsMessage<std::runtime_error>(
-                       HasSubstr("no clip of the class 'dog_bark' to judge by in fold 3")));
+                       HasSubstr("no clip of the class 'dog_bark' to validate on in fold 3")));
   options_.hold_out = 0;
   std::ofstream(options_.state_file) << "something";
   EXPECT_THAT(fit, ThrowsMessage<std::runtime_error>(HasSubstr("state: is of another run")));

@@ -1,5 +1,5 @@
-// Runs on a handful of made-up sounds: that the same is the same, that stopping does not matter,
-// that something is learnt, and what is refused.
+// Runs on a few synthetic sounds: the same seed gives the same model, stops don't matter, tones are
+// recognised after training, and which recipes are refused.
 
 #include <gmock/gmock.h>
 
@@ -20,7 +20,7 @@ namespace {
 
 using testing::HasSubstr;
 
-// A tone for each output, and noise that nothing answers to.
+// A tone for each output, and noise of no class.
 std::vector<Clip> Tones(int of_each) {
   std::vector<Clip> clips;
   for (int i = 0; i < 6 * of_each; ++i) {
@@ -42,6 +42,7 @@ Recipe ShortRecipe() {
   recipe.teachers = 2;
   recipe.epochs = 2;
   recipe.tuning_epochs = 2;
+  recipe.min_steps = recipe.min_tuning_steps = 1;
   recipe.batch = 4;
   recipe.windows = 1;
   return recipe;
@@ -75,7 +76,7 @@ TEST(Trainer, SameSeedSameModelWhateverTheThreadsAndStops) {
 }
 
 // The order of Eigen's sums follows from where a row begins, and with it the last bits.
-TEST(Trainer, NumbersBeginAtTheSamePlaceWhereverTheyLie) {
+TEST(Trainer, NumbersAreAlignedWhereverTheyAre) {
   std::vector<std::vector<char>> between;
   for (size_t i = 1; i < 20; ++i) {
     between.emplace_back(16 * i);
@@ -83,7 +84,7 @@ TEST(Trainer, NumbersBeginAtTheSamePlaceWhereverTheyLie) {
   }
 }
 
-TEST(Trainer, LearnsTonesAndStillKnowsThemInInt8) {
+TEST(Trainer, RecognisesTonesInFloatAndInt8) {
   Recipe recipe = ShortRecipe();
   recipe.teachers = 1;
   recipe.epochs = 120;
@@ -106,6 +107,25 @@ TEST(Trainer, LearnsTonesAndStillKnowsThemInInt8) {
   EXPECT_EQ(by_device.outputs, 5);
   EXPECT_GT(by_float.average_precision, 0.9);
   EXPECT_GT(by_device.average_precision, 0.85);
+}
+
+// Few recordings make few steps an epoch: there are as many epochs as the steps take.
+TEST(Trainer, RunsAtLeastTheStepsOfTheRecipe) {
+  Recipe recipe = ShortRecipe();
+  recipe.teachers = 1;
+  recipe.min_steps = 9;
+  recipe.min_tuning_steps = 4;
+  const std::vector<Clip> clips = Tones(1);  // 2 steps an epoch
+  Trainer trainer(recipe, 1, 1, clips);
+  TrainingState state;
+  EXPECT_EQ(trainer.EpochsLeft(state), 5 + 2);
+  state = RunTo(4, &trainer);
+  EXPECT_FALSE(trainer.Tuning(state));
+  state = RunTo(5, &trainer, state);
+  EXPECT_TRUE(trainer.Tuning(state));
+  EXPECT_TRUE(trainer.Accepts(state));
+  EXPECT_EQ(trainer.EpochsLeft(state), 2);
+  EXPECT_TRUE(trainer.Done(RunTo(7, &trainer, state)));
 }
 
 TEST(Trainer, TuningBeginsWithTheFirstTeacherHoweverItEnded) {
@@ -142,7 +162,7 @@ TEST(Augmentation, JoinsLabelsAndStaysInRange) {
     const auto made = features.values.bottomRows(FramesFor(1));
     EXPECT_GE(made.minCoeff(), 0);
     EXPECT_LE(made.maxCoeff(), 255);
-    EXPECT_GT(made.maxCoeff(), 60) << "the clip is not to be heard";
+    EXPECT_GT(made.maxCoeff(), 60) << "the clip is not in the features";
   }
   EXPECT_TRUE(joined);
 }
@@ -176,13 +196,13 @@ TEST(Recipe, IsReadAndRefused) {
   EXPECT_EQ(recipe.rate, 0.5);
   EXPECT_EQ(Describe(read(Describe(recipe))), Describe(recipe));
   const std::pair<const char*, const char*> kBad[] = {
-      {"epochs\n", "line 1: should be a name and a value"},
-      {"rate 0.1\nepochs 1.5\n", "line 2: epochs is '1.5', should be a whole number from 1 to"},
-      {"rate nan\n", "rate is 'nan', should be a number from 0 to 1"},
+      {"epochs\n", "line 1: expected a name and a value"},
+      {"rate 0.1\nepochs 1.5\n", "line 2: epochs is '1.5', expected a whole number from 1 to"},
+      {"rate nan\n", "rate is 'nan', expected a number from 0 to 1"},
       {"rate 1x\n", "rate is '1x'"},
-      {"batch 5\n", "batch is 5, should be even"},
-      {"lowest_snr 9\nhighest_snr 8\n", "a lowest gain or SNR is above"},
-      {"speed 1\n", "line 1: a recipe knows no 'speed'"}};
+      {"batch 5\n", "batch is 5, expected an even"},
+      {"min_snr 9\nmax_snr 8\n", "min_gain or min_snr is above its maximum"},
+      {"speed 1\n", "line 1: unknown name 'speed'"}};
   for (const auto& [text, message] : kBad) {
     try {
       read(text);
