@@ -19,8 +19,8 @@ struct TrainOptions {
   int threads = 2;
 };
 
-// Trains on a list of recordings and writes a packed model. Prints its own warnings; throws what
-// stops it before or during the work.
+// Trains on a list of recordings and writes a packed model. Prints its own warnings; throws
+// base::Error.
 base::ExitCode TrainCommand(const TrainOptions& options);
 
 }  // namespace qz::train
