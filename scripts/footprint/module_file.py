@@ -35,6 +35,7 @@ COMPONENT_OF_SOURCE = {
     "quantised_kernels": "kernels/quantised",
     "audio_frontend": "frontend",
     "mobilenet_backend": "network",
+    "detector": "detector",
     "audio_classifier": "classifier",
     "sound_detection_proto": "proto",
     "app": "app",

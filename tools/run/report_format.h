@@ -64,4 +64,14 @@ std::unique_ptr<ReportFormat> MakeTextFormat(TextStyle style, const Names& names
 // For programs: one JSON object a line, its kind under "type".
 std::unique_ptr<ReportFormat> MakeJsonFormat(const Names& names);
 
+// A format for programs, and the option of qz run that asks for it.
+struct NamedFormat {
+  const char* option;
+  const char* help;
+  std::unique_ptr<ReportFormat> (*make)(const Names& names);
+};
+inline constexpr NamedFormat kNamedFormats[] = {
+    {"--json", "One JSON object a line on standard output", MakeJsonFormat},
+};
+
 }  // namespace qz::tools

@@ -73,9 +73,10 @@ class Run {
 Run::Run(const RunOptions& options)
     : options_(options),
       names_(ReadNames(options.labels_path)),
-      format_(options.json ? MakeJsonFormat(names_)
-                           : MakeTextFormat(
-                                 {console_.data_on_terminal(), console_.data_in_colour()}, names_)),
+      format_(
+          options.format != nullptr
+              ? options.format->make(names_)
+              : MakeTextFormat({console_.data_on_terminal(), console_.data_in_colour()}, names_)),
       printer_(format_.get(), &console_) {
   std::optional<DetectionTable> rules;
   if (!options.thresholds_path.empty()) {

@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "tools/commands.h"
+#include "tools/run/report_format.h"
 #include "tools/run/run_command.h"
 
 namespace qz::tools {
@@ -66,7 +67,10 @@ void AddRun(CLI::App* app, base::ExitCode* exit_code) {
   run->add_option("--log-level", line->log_level, "What to show of the detector's log")
       ->check(CLI::IsMember(kLogLevels))
       ->capture_default_str();
-  run->add_flag("--json", options.json, "One JSON object a line on standard output");
+  for (const NamedFormat& format : kNamedFormats) {
+    run->add_flag_callback(
+        format.option, [&options, &format] { options.format = &format; }, format.help);
+  }
   run->add_flag("--realtime", options.real_time, "Play at the pace of the clock on the wall");
   run->add_option("--module", options.module_path, "The module to load (default: ../lib/qz.so)");
   run->add_flag("--scores", options.scores,
