@@ -1,5 +1,6 @@
 #include <cstring>
 
+#include "kernels/precondition.h"
 #include "kernels/quantised/indirection.h"
 #include "kernels/quantised/quantised_kernels.h"
 #include "kernels/quantised/requantisation.h"
@@ -37,6 +38,7 @@ QZ_KERNEL(orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cor
 (size_t channels, size_t width, const int8_t* const* in_ptrs, const void* w, int8_t* out,
  size_t in_ptrs_step, size_t out_gap, size_t in_offset, const int8_t* zero,
  const orra_fp32_requant_params* params) {
+  qz::Require(channels > 0 && width > 0);
   const qz::OutputRange range = qz::RangeOf(qz::DepthwiseParams(*params));
   for (size_t position = 0; position < width; ++position) {
     const int8_t* rows[kTaps];

@@ -1,5 +1,6 @@
 #include <algorithm>
 
+#include "kernels/precondition.h"
 #include "kernels/quantised/indirection.h"
 #include "kernels/quantised/quantised_kernels.h"
 #include "kernels/variant.h"
@@ -8,6 +9,7 @@ QZ_KERNEL(orra_s8_maxpool_minmax_ukernel_2p2x__neon_c16)
 (size_t positions, size_t pool_size, size_t channels, const int8_t* const* in_ptrs,
  size_t in_offset, int8_t* out, size_t in_ptrs_gap, size_t out_gap,
  const orra_s8_clamp_params* params) {
+  qz::Require(positions > 0 && pool_size > 0 && channels > 0);
   const int8_t low = params->output_min;
   const int8_t high = params->output_max;
   for (size_t position = 0; position < positions; ++position) {

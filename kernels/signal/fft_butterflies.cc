@@ -1,6 +1,7 @@
 // The three radix-4 butterfly stages of the complex FFT: they differ in where the entries and the
 // twiddles of a butterfly lie.
 
+#include "kernels/precondition.h"
 #include "kernels/signal/signal_arithmetic.h"
 #include "kernels/signal/signal_kernels.h"
 #include "kernels/signal/signal_tables.h"
@@ -42,6 +43,7 @@ inline void Butterfly(int16_t* x0, size_t quarter, const int16_t* w1, const int1
 QZ_KERNEL(orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4)
 (size_t butterflies, size_t /*quarter_bytes*/, int16_t* data, const int16_t* /*twiddles*/,
  size_t /*twiddle_stride*/) {
+  qz::Require(butterflies > 0);
   for (size_t b = 0; b < butterflies; ++b) {
     int16_t* x = data + 8 * b;
     StoreSums(x, 2, Scaled(x, kPrescale), Scaled(x + 2, kPrescale), Scaled(x + 4, kPrescale),
@@ -52,6 +54,7 @@ QZ_KERNEL(orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4)
 QZ_KERNEL(orra_cs16_bfly4_samples4_ukernel__neon)
 (size_t groups, size_t quarter_bytes, int16_t* data, const int16_t* /*twiddles*/,
  size_t /*twiddle_stride*/) {
+  qz::Require(groups > 0 && quarter_bytes == 16);
   const auto& twiddles = vrd_table_fft256_samples4_twiddle;
   const size_t quarter = quarter_bytes / sizeof(int16_t);
   for (size_t group = 0; group < groups; ++group) {
@@ -65,6 +68,8 @@ QZ_KERNEL(orra_cs16_bfly4_samples4_ukernel__neon)
 QZ_KERNEL(orra_cs16_bfly4_ukernel__neon_x4)
 (size_t groups, size_t quarter_bytes, int16_t* data, const int16_t* twiddles,
  size_t twiddle_stride) {
+  qz::Require(groups > 0 && quarter_bytes > 0 && quarter_bytes % 16 == 0 &&
+              twiddle_stride % 4 == 0);
   const size_t quarter = quarter_bytes / sizeof(int16_t);
   const size_t stride = twiddle_stride / sizeof(int16_t);
   for (size_t group = 0; group < groups; ++group) {

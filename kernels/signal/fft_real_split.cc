@@ -1,5 +1,6 @@
 // From the complex FFT of sample pairs to the spectrum of the real samples.
 
+#include "kernels/precondition.h"
 #include "kernels/signal/signal_arithmetic.h"
 #include "kernels/signal/signal_kernels.h"
 #include "kernels/variant.h"
@@ -11,6 +12,7 @@ using qz::signal::StoreWrapped;
 
 QZ_KERNEL(orra_cs16_fftr_ukernel__asm_aarch32_neon_x4)
 (size_t count, int16_t* data, const int16_t* twiddles) {
+  qz::Require(count > 0 && count % 8 == 0);
   constexpr int32_t kHalf = 16383;  // Q15, just under 1/2
 
   const Complex first = Scaled(data, kHalf);

@@ -1,11 +1,13 @@
 // Energies of overlapping triangular channels.
 
+#include "kernels/precondition.h"
 #include "kernels/signal/signal_kernels.h"
 #include "kernels/variant.h"
 
 QZ_KERNEL(orra_u32_filterbank_accumulate_ukernel__asm_aarch32_neon_x2)
 (size_t rows, const uint32_t* input, const uint8_t* widths, const uint16_t* weights,
  uint64_t* output) {
+  qz::Require(rows > 0);
   // Each segment falls for the current channel (w0) and rises for the next (w1); the first only
   // rises.
   uint64_t current = 0;

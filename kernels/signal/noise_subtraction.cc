@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "kernels/precondition.h"
 #include "kernels/signal/signal_kernels.h"
 #include "kernels/variant.h"
 
@@ -9,6 +10,7 @@ QZ_KERNEL(orra_u32_filterbank_subtract_ukernel__scalar_x2)
 (size_t count, const uint32_t* input, uint32_t smoothing_even, uint32_t smoothing_odd,
  uint32_t retain_even, uint32_t retain_odd, uint32_t floor_fraction, uint32_t scale_bits,
  uint32_t fraction_bits, uint32_t* noise, uint32_t* output) {
+  qz::Require(count > 0 && count % 2 == 0 && scale_bits < 32 && fraction_bits < 64);
   for (size_t c = 0; c < count; ++c) {
     const uint64_t smoothing = c % 2 == 0 ? smoothing_even : smoothing_odd;
     const uint64_t retain = c % 2 == 0 ? retain_even : retain_odd;

@@ -1,5 +1,5 @@
-// Fixed-point building blocks of the audio front end. These texts define the results: another
-// version of a kernel behind the same name equals them bit for bit.
+// Fixed-point building blocks of the audio front end. The reference implementations define the
+// results: a variant for one processor equals them bit for bit.
 //
 // A kernel's name carries the element type, the operation, and a suffix for the processor variant
 // and the elements per step that it was laid out for:
@@ -7,9 +7,10 @@
 //   u32       unsigned 32-bit; u64_u32 is unsigned 64-bit in, unsigned 32-bit out
 //   cs16      complex: two int16, real part first. A complex array is a plain int16 array of pairs.
 //
-// Common to all: no state, no allocation, no failure and no checks. Arguments named *_bytes or
-// `bytes` count bytes, all other sizes count elements; every count is at least 1 unless said
-// otherwise. Arrays are aligned to their element type and do not overlap unless said otherwise.
+// Common to all: no state, no allocation and no failure; sizes are checked
+// (kernels/precondition.h), but not on the device. Arguments named *_bytes or `bytes` count bytes,
+// all other sizes count elements; every count is at least 1 unless said otherwise. Arrays are
+// aligned to their element type and do not overlap unless said otherwise.
 // >> on signed values is an arithmetic (floor) shift; "wraps" means that the low bits are kept,
 // two's complement.
 #pragma once

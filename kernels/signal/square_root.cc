@@ -2,6 +2,7 @@
 
 #include <cmath>
 
+#include "kernels/precondition.h"
 #include "kernels/signal/signal_kernels.h"
 #include "kernels/variant.h"
 
@@ -34,6 +35,7 @@ inline uint32_t NearestRoot(uint64_t v) {
 
 QZ_KERNEL(orra_u64_u32_vsqrtshift_ukernel__scalar_cvtu32_sqrt_cvtu32f64_x1)
 (size_t bytes, const uint64_t* input, uint32_t* output, uint32_t shift) {
+  qz::Require(bytes > 0 && bytes % 8 == 0);
   for (size_t i = 0; i < bytes / sizeof(uint64_t); ++i) {
     const uint32_t root = NearestRoot(input[i]);
     output[i] = shift < 32 ? root >> shift : 0;

@@ -1,11 +1,12 @@
 // Convolution of 3 taps, by which each tap meets the row after that of the tap before: two
-// neighbouring rows of the output from 4 sums of products instead of 6. With rows x0 to x3 and
-// weights g0 to g2:
+// neighbouring rows of the output from 4 sums of products instead of 6. This is Winograd's minimal
+// filtering F(2,3) (S. Winograd, Arithmetic Complexity of Computations, 1980). With rows x0 to x3
+// and weights g0 to g2:
 //   2 (x0 g0 + x1 g1 + x2 g2) = A + B + (x0 - x2) 2 g0    A = (x1 + x2) (g0 + g1 + g2)
 //   2 (x1 g0 + x2 g1 + x3 g2) = A - B - (x1 - x3) 2 g2    B = (x2 - x1) (g0 - g1 + g2)
 // Of the two rows, the even one adds up A and then its last product, the odd one B and its last;
 // in between, A and B become their sum and their difference. All is exact: rows of up to 9 bits and
-// weights of up to 10 fit int16, twice the sums of kMostChannels int32, and the halves are whole
+// weights of up to 10 fit int16, twice the sums of kMaxChannels int32, and the halves are whole
 // numbers.
 #pragma once
 

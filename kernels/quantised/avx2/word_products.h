@@ -1,4 +1,5 @@
-// Sums of products in tiles of 4 rows and 16 columns. One multiplication makes two products:
+// Sums of products in tiles of 4 rows and 16 columns. One multiplication makes two products, by
+// Winograd's inner product (S. Winograd, A New Algorithm for Inner Product, 1968):
 //   x0 y0 + x1 y1 = (x0 + y1) (x1 + y0) - x0 x1 - y0 y1
 // What has to come off depends on the row alone and on the column alone, so that it is counted
 // while these are unpacked. All is exact modulo 2^32: sums of two bytes fit int16, of which an

@@ -1,4 +1,4 @@
-// Instructions against the plain text's, both g++ 12 -O3 (scripts/kernel-gains.py): 3,403
+// Instructions against the reference's, both g++ 12 -O3 (scripts/kernel-gains.py): 3,403
 // for 10,240, a ratio of 3.0, with 64 columns and 60 channels.
 
 #include <arm_neon.h>
@@ -13,7 +13,7 @@ namespace {
 
 constexpr size_t kColumns = 8;
 
-// The steps of the plain text's RequantiseRndnu, lane by lane. Shift instructions take the low byte
+// The steps of the reference's RequantiseRndnu, lane by lane. Shift instructions take the low byte
 // of a count; counts beyond 32 give what 32 gives (33 for the rounded shift).
 struct Steps {
   explicit Steps(const orra_rndnu_requant_params& params)

@@ -1,7 +1,7 @@
 // From the complex FFT of sample pairs to the spectrum of the real samples, eight bins from the
 // front and eight from the back at a time.
 //
-// 15 times as fast as g++ 12's -O3 -mavx2 code of the plain text, in the front end's call
+// 15 times as fast as g++ 12's -O3 -mavx2 code of the reference, in the front end's call
 // (Zen 4).
 
 #include "kernels/signal/avx2/complex_vector.h"

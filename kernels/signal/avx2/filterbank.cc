@@ -1,6 +1,6 @@
 // Energies of overlapping triangular channels, two bins and two channels at a time.
 //
-// 2.2 times as fast as g++ 12's -O3 -mavx2 code of the plain text, in the front end's call
+// 2.2 times as fast as g++ 12's -O3 -mavx2 code of the reference, in the front end's call
 // (Zen 4).
 
 #include <immintrin.h>

@@ -1,6 +1,6 @@
 // Table-driven natural logarithm in Q16, eight values at a time.
 //
-// 3.5 times as fast as g++ 12's -O3 -mavx2 code of the plain text, in the front end's call
+// 3.5 times as fast as g++ 12's -O3 -mavx2 code of the reference, in the front end's call
 // (Zen 4).
 
 #include "kernels/signal/avx2/lanes.h"
@@ -23,7 +23,7 @@ inline __m256i ExponentAndFraction(__m256i y) {
   return _mm256_add_epi32(unbiased, _mm256_slli_epi32(halvings, 16));
 }
 
-// log2(y) in Q16, y not 0, in the steps of the plain text.
+// log2(y) in Q16, y not 0, in the steps of the reference.
 inline __m256i Log2(__m256i y) {
   const __m256i line = ExponentAndFraction(y);
   const __m256i fraction = _mm256_and_si256(line, _mm256_set1_epi32(0xFFFF));

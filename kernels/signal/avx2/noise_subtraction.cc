@@ -1,6 +1,6 @@
 // Spectral subtraction of a slowly followed noise level, with a floor, eight channels at a time.
 //
-// 3.5 times as fast as g++ 12's -O3 -mavx2 code of the plain text, in the front end's call
+// 3.5 times as fast as g++ 12's -O3 -mavx2 code of the reference, in the front end's call
 // (Zen 4).
 
 #include "kernels/signal/avx2/lanes.h"

@@ -1,6 +1,6 @@
 // Squared magnitudes of complex bins, eight at a time.
 //
-// 2.6 times as fast as g++ 12's -O3 -mavx2 code of the plain text, in the front end's call
+// 2.6 times as fast as g++ 12's -O3 -mavx2 code of the reference, in the front end's call
 // (Zen 4).
 
 #include "kernels/signal/avx2/lanes.h"

@@ -1,6 +1,6 @@
 // Integer square root of 64-bit values through the double-precision instruction, four at a time.
 //
-// 3.8 times as fast as g++ 12's -O3 -mavx2 code of the plain text, in the front end's call
+// 3.8 times as fast as g++ 12's -O3 -mavx2 code of the reference, in the front end's call
 // (Zen 4).
 
 #include <immintrin.h>
@@ -28,7 +28,7 @@ inline __m256i NearestRoots(__m256i v) {
   return _mm256_sub_epi64(r, _mm256_and_si256(_mm256_srli_epi64(r, 16), is_32_bit));
 }
 
-// As in the plain text, of any value but 0.
+// As in the reference, of any value but 0.
 inline uint32_t NearestRoot(uint64_t v) {
   const double value = static_cast<double>(static_cast<uint32_t>(v >> 32)) * 4294967296.0 +
                        static_cast<double>(static_cast<uint32_t>(v));

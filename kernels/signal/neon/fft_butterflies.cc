@@ -1,6 +1,6 @@
 // The three radix-4 butterfly stages of the complex FFT, four butterflies at a time.
 //
-// Fewer instructions than g++ 12's -O3 code of the plain text, executed under emulation in the
+// Fewer instructions than g++ 12's -O3 code of the reference, executed under emulation in the
 // front end's calls: 4.2 times in the first stage, 3.2 in the second, 6.2 in the later ones.
 
 #include <arm_neon.h>

@@ -1,7 +1,7 @@
 // From the complex FFT of sample pairs to the spectrum of the real samples, four bins from the
 // front and four from the back at a time.
 //
-// 4.8 times fewer instructions than g++ 12's -O3 code of the plain text, executed under emulation
+// 4.8 times fewer instructions than g++ 12's -O3 code of the reference, executed under emulation
 // in the front end's call.
 
 #include <arm_neon.h>

@@ -1,6 +1,6 @@
 // Overlapping triangular filters, four bins at a time.
 //
-// 1.73 times fewer instructions than g++ 12's -O3 code of the plain text, executed under emulation
+// 1.73 times fewer instructions than g++ 12's -O3 code of the reference, executed under emulation
 // in the front end's call.
 
 #include <arm_neon.h>

@@ -1,6 +1,6 @@
 // The analysis window of a frame, 8 samples a step.
 //
-// 1.37 times fewer instructions than g++ 12's -O3 code of the plain text, executed under emulation
+// 1.37 times fewer instructions than g++ 12's -O3 code of the reference, executed under emulation
 // in the front end's call. Structured loads and stores of 16 samples would make it 2 times, but 13
 // cycles instead of 8 for 16 samples (llvm-mca, cortex-a57).
 
