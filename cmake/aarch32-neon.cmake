@@ -1,12 +1,13 @@
-# Toolchain of the hub's own processor: ARMv8-A in AArch32 state with NEON, tuned for the Cortex-A35.
-# Debian's cross compiler, with the libraries that scripts/make-sysroot.sh has unpacked; what is built
-# runs on this machine under qemu-arm.
+# Toolchain of the device: ARMv8-A in AArch32 state with NEON, tuned for the Cortex-A35. Debian's cross
+# compiler, with the libraries that scripts/make-sysroot.sh has unpacked; what is built runs on this machine
+# under qemu-arm.
 
 set(CMAKE_SYSTEM_NAME Linux)
 set(CMAKE_SYSTEM_PROCESSOR armv8)
 
-# The folder is known to the first run only; nested ones, which try the compiler, are told.
-set(QZ_SYSROOT "${CMAKE_SOURCE_DIR}/build/sysroot-armhf" CACHE PATH "Libraries of the processor")
+# A cache variable of the first run only; passed on to the nested ones, which try the compiler.
+get_filename_component(project_folder "${CMAKE_CURRENT_LIST_DIR}" DIRECTORY)
+set(QZ_SYSROOT "${project_folder}/build/sysroot-armhf" CACHE PATH "Libraries of the processor")
 list(APPEND CMAKE_TRY_COMPILE_PLATFORM_VARIABLES QZ_SYSROOT)
 if(NOT EXISTS "${QZ_SYSROOT}/packages")
   message(FATAL_ERROR "${QZ_SYSROOT} is missing or not complete: run scripts/make-sysroot.sh \"${QZ_SYSROOT}\"")
@@ -19,7 +20,7 @@ set(processor "-mcpu=cortex-a35 -mfpu=neon-fp-armv8 -mfloat-abi=hard")
 set(CMAKE_C_FLAGS_INIT "${processor}")
 set(CMAKE_CXX_FLAGS_INIT "${processor}")
 
-# Programs are this machine's, all else the processor's.
+# Programs are this machine's, everything else is the device's.
 set(CMAKE_LIBRARY_ARCHITECTURE arm-linux-gnueabihf)
 set(CMAKE_FIND_ROOT_PATH_MODE_PROGRAM NEVER)
 set(CMAKE_FIND_ROOT_PATH_MODE_LIBRARY ONLY)

@@ -1,23 +1,28 @@
-# How the components of the house are compiled: one target per component, and the include path of a target holds
-# only its own folder and the components it links, so that an include against the order fails to compile.
+# How components are compiled: one target each. scripts/check-dependencies.py checks what they include.
 
 find_package(Python3 REQUIRED COMPONENTS Interpreter)
 
-# Flags of everything: floats exactly as written, no warning let through.
+# Flags of everything: floats exactly as written.
 add_library(qz_flags INTERFACE)
 target_include_directories(qz_flags INTERFACE ${PROJECT_SOURCE_DIR})
-target_compile_options(qz_flags INTERFACE -ffp-contract=off -Wall -Wextra -Wshadow -Wundef -Werror)
+target_compile_options(qz_flags INTERFACE -ffp-contract=off -Wall -Wextra -Wshadow -Wundef $<$<BOOL:${QZ_WERROR}>:-Werror>)
 if(CMAKE_SYSTEM_PROCESSOR MATCHES "^arm")
-  # Nothing built here meets what compilers of ten years ago have built.
+  # Nothing built here is linked to what compilers of ten years ago have built.
   target_compile_options(qz_flags INTERFACE -Wno-psabi)
 endif()
 if(CMAKE_CROSSCOMPILING)
   # The device's build goes without the checks of preconditions.
   target_compile_definitions(qz_flags INTERFACE QZ_WITHOUT_CHECKS)
 endif()
-if(QZ_SANITIZE)
+if(QZ_SANITIZE STREQUAL "address")
   # vptr checks need RTTI, which the module does without.
   set(sanitizers -fsanitize=address,undefined -fno-sanitize=vptr -fno-sanitize-recover=all)
+elseif(QZ_SANITIZE STREQUAL "thread")
+  set(sanitizers -fsanitize=thread)
+elseif(QZ_SANITIZE)
+  message(FATAL_ERROR "QZ_SANITIZE is '${QZ_SANITIZE}', expected address, thread or nothing")
+endif()
+if(QZ_SANITIZE)
   target_compile_options(qz_flags INTERFACE ${sanitizers} -fno-omit-frame-pointer)
   target_link_options(qz_flags INTERFACE ${sanitizers})
 endif()
@@ -141,15 +146,28 @@ function(qz_component name)
   target_link_libraries(${name} PUBLIC ${component_LINKS} PRIVATE qz_flags)
 endfunction()
 
-# qz_test(NAME SOURCES... LINKS... [STARTS_PROGRAMS] [NEEDS_AVX2]): one suite, run by CTest as one test that
-# fails when it holds none. On a PC it runs once more, under the label without_avx2, on an emulated processor;
-# not so where it STARTS_PROGRAMS, which would run on this one, or NEEDS_AVX2.
+# What `make check` and the build under ThreadSanitizer build.
+add_custom_target(unit_tests)
+add_custom_target(thread_tests)
+
+# qz_test(NAME SOURCES... LINKS... [STARTS_PROGRAMS] [NEEDS_AVX2] [USES_THREADS]): one suite, run by CTest as one
+# test that fails when it holds none; under the label unit unless it STARTS_PROGRAMS, and under threads if it
+# USES_THREADS. On a PC it runs once more, under the label without_avx2, on an emulated processor, unless it
+# STARTS_PROGRAMS, which would run on this one, or NEEDS_AVX2.
 function(qz_test name)
-  cmake_parse_arguments(test "STARTS_PROGRAMS;NEEDS_AVX2" "" "SOURCES;LINKS" ${ARGN})
+  cmake_parse_arguments(test "STARTS_PROGRAMS;NEEDS_AVX2;USES_THREADS" "" "SOURCES;LINKS" ${ARGN})
   add_executable(${name} ${test_SOURCES})
   target_link_libraries(${name} PRIVATE ${test_LINKS} qz_test_support qz_flags)
   add_test(NAME ${name} COMMAND ${name})
   set_tests_properties(${name} PROPERTIES TIMEOUT 900)
+  if(NOT test_STARTS_PROGRAMS)
+    set_property(TEST ${name} APPEND PROPERTY LABELS unit)
+    add_dependencies(unit_tests ${name})
+  endif()
+  if(test_USES_THREADS)
+    set_property(TEST ${name} APPEND PROPERTY LABELS threads)
+    add_dependencies(thread_tests ${name})
+  endif()
   if(NOT test_STARTS_PROGRAMS AND NOT test_NEEDS_AVX2)
     qz_test_without_avx2(${name}_without_avx2 $<TARGET_FILE:${name}>)
   endif()

@@ -6,7 +6,7 @@ Usage: compare-with-forest.py FEATURES [LABELS]     (default model/labels.tsv)
 FEATURES is a folder that `qz features --manifest MANIFEST -o FEATURES` wrote. A forest of 500 trees sees of each
 clip, per channel, the mean, the deviation, the 90th percentile and the mean absolute step of the features. Each fold
 is scored by a forest of all the other folds' clips, fold 0's included; the figures are those of `qz eval`, with a
---fold-model for each fold: means over the folds. Needs Debian's python3-sklearn (setup-debian.sh figures).
+--fold-model for each fold: means over the folds. Needs Debian's python3-sklearn (setup-debian.sh validation).
 """
 
 import csv

@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # Installs what is missing of the Debian packages that this project needs; silent when nothing is.
-# Usage: scripts/setup-debian.sh [build] [clip] [demo] [train] [figures] [counts] [lint] [target]
+# Usage: scripts/setup-debian.sh [build] [test] [sanitize] [clip] [demo] [train] [validation] [counts] [lint] [target]
 # No argument: all groups.
 set -euo pipefail
 
@@ -9,22 +9,24 @@ packages_of() {
     build)
       echo g++ cmake ninja-build make python3 nanopb libnanopb-dev libprotobuf-dev \
         protobuf-compiler libsndfile1-dev libsoxr-dev libminizip-dev zlib1g-dev libcli11-dev \
-        nlohmann-json3-dev libgtest-dev libgmock-dev libbenchmark-dev libeigen3-dev binutils
+        nlohmann-json3-dev libeigen3-dev binutils
       ;;
+    test) echo libgtest-dev libgmock-dev libbenchmark-dev qemu-user ;;
+    sanitize) echo clang-14 libclang-rt-14-dev ;;
     clip) echo sox libsox-fmt-base alsa-utils sound-theme-freedesktop ;;
     demo)
       echo sox libsox-fmt-base libsox-fmt-mp3 alsa-utils sound-theme-freedesktop scratch \
         elpa-redtick
       ;;
     train) echo espeak-ng sox libsox-fmt-base sound-theme-freedesktop scratch ;;
-    figures) echo python3 python3-numpy python3-sklearn ;;
+    validation) echo python3 python3-numpy python3-sklearn ;;
     lint) echo git clang-format clang-tidy ;;
     counts) echo valgrind python3 ;;
     target)
       echo g++-arm-linux-gnueabihf qemu-user cmake ninja-build make python3 nanopb protobuf-compiler
       ;;
     *)
-      echo "setup-debian.sh: no such group: '$1', should be build, clip, demo, train, figures, counts, lint or target" >&2
+      echo "setup-debian.sh: no such group: '$1', expected build, test, sanitize, clip, demo, train, validation, counts, lint or target" >&2
       exit 2
       ;;
   esac
@@ -39,7 +41,7 @@ still_missing() {
   for package in "$@"; do installed "$package" || echo "$package"; done
 }
 
-[ $# -gt 0 ] || set -- build clip demo train figures counts lint target
+[ $# -gt 0 ] || set -- build test sanitize clip demo train validation counts lint target
 wanted=()
 for group in "$@"; do
   names=$(packages_of "$group")
@@ -65,10 +67,10 @@ if [ "$(id -u)" != 0 ]; then
   run=(sudo "${run[@]}")
 fi
 
-# One index that can't be fetched need not matter: what the others, or the present ones, hold may do.
+# An index that can't be fetched need not matter: the others, or those of earlier, may have every package.
 "${run[@]}" apt-get -q update >&2 ||
   echo "setup-debian.sh: the package index could not be updated; trying with the present one" >&2
-# One package that can't be had must not keep back the others.
+# One package that can't be installed must not prevent the others.
 "${run[@]}" apt-get -q install -y --no-install-recommends "${missing[@]}" >&2 ||
   for package in "${missing[@]}"; do
     "${run[@]}" apt-get -q install -y --no-install-recommends "$package" >&2 || true
