@@ -46,10 +46,11 @@ TEST_F(Programs, PrintHelpAndVersion) {
     EXPECT_THAT(out_, StartsWith(name + build));
     EXPECT_EQ(Run(program + " --help"), 0) << err_;
     EXPECT_THAT(out_, AllOf(HasSubstr(name), HasSubstr(name + build)));
-    for (const std::string word : {" --version", " --help"}) {
-      EXPECT_EQ(Run(program + word + " >/dev/full"), 5) << program + word;
+    for (const char* word : {" --version", " --help"}) {
+      const std::string line = program + word;
+      EXPECT_EQ(Run(line + " >/dev/full"), 5) << line;
       EXPECT_THAT(err_, StartsWith(name + ": standard output: can't be written"));
-      EXPECT_EQ(Run("{ " + program + word + "; echo $? >&2; } | true"), 0);
+      EXPECT_EQ(Run("{ " + line + "; echo $? >&2; } | true"), 0);
       EXPECT_EQ(err_, "0\n") << "a reader that leaves is none of our faults";
     }
     EXPECT_EQ(Run(program + " --melt"), 2);
