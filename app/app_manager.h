@@ -23,8 +23,8 @@ struct ClientIdHostEndpointPair {
 };
 
 // The whole nanoapp behind its entry points: dispatches the runtime's events, holds the microphone
-// while some client needs it, and serves the host's clients. Nothing fails; what goes wrong is
-// logged and the work dropped. All on the nanoapp's event thread.
+// while some client needs it, and serves the host's clients. Failures are logged and the work is
+// dropped. All on the nanoapp's event thread.
 class AppManager : public SoundDetectionEventListenerInterface {
  public:
   AppManager();
@@ -56,7 +56,7 @@ class AppManager : public SoundDetectionEventListenerInterface {
   void HandleEnableRequest(const chreMessageFromHostData* message);
   void HandleDisableRequest(const chreMessageFromHostData* message);
   bool AddClientIdHostEndpointPair(uint16_t client_id, uint16_t host_endpoint);
-  // Place of the client's entry in the map, or its size.
+  // Index of the client's entry in the map, or its size.
   size_t FindHostClient(uint16_t client_id) const;
   void SendSoundDetectionEvent(const ConfidenceEvents& events, uint32_t model_version,
                                uint64_t timestamp_ns);

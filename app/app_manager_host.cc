@@ -12,8 +12,8 @@ namespace {
 constexpr uint32_t kQueryResponseBufferSize = 1024;
 constexpr uint16_t kInvalidHostEndpoint = 0xFFFF;
 
-// Place of the out-of-memory log line of a query: fixed, so that a line from the field keeps its
-// meaning when the code moves.
+// Source position in the out-of-memory log line of a query: fixed, so that a line from the field
+// keeps its meaning when the code moves.
 constexpr const char* kSourceFile = "app_manager.cc";
 constexpr int kQueryOomLine = 174;
 
@@ -176,8 +176,8 @@ void AppManager::SendToHostClients(SoundDetectionMessageType type, ChreBuffer me
                                    uint32_t size, chreMessageFreeFunction* free_callback,
                                    const char* send_failure) {
   for (const ClientIdHostEndpointPair& pair : client_id_host_endpoint_map_) {
-    // The runtime owns what it sends, so every client needs a buffer of its own. A client for which
-    // there is none is as one whose message could not be sent.
+    // The runtime owns what it sends, so every client needs a buffer of its own. No memory for one
+    // is logged like a message that could not be sent.
     ChreBuffer copy = ChreBuffer::Allocate(size);
     if (copy) memcpy(copy.get(), message.get(), size);
     if (!copy || !chreSendMessageToHostEndpoint(copy.release(), size, type, pair.host_endpoint,

@@ -5,7 +5,7 @@
 #include <cstddef>
 #include <cstdint>
 
-// Nothing here allocates with new. The operators stand so that the module needs no library for
+// Nothing here allocates with new. The operators are here so that the module needs no library for
 // them: an address that faults at first use where there would be an allocation, and nothing where
 // there would be a release (virtual destructors refer to operator delete).
 
@@ -22,7 +22,7 @@ void operator delete[](void*, size_t) noexcept {}
 #pragma GCC visibility push(hidden)
 extern "C" {
 
-// A call of an abstract function: there is nobody to tell.
+// A call of an abstract function: there is nobody to report it to.
 void __cxa_pure_virtual() { __builtin_trap(); }
 
 // nanopb's library is built with stack checks, which on some processors take the value that they

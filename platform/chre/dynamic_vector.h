@@ -28,7 +28,7 @@ class DynamicVectorBase {
   bool empty() const { return size_ == 0; }
 
  protected:
-  // Makes room for `capacity` elements; false when the heap gives no block.
+  // Makes space for `capacity` elements; false when the heap gives no block.
   bool doReserve(size_t capacity, size_t element_size) {
     if (capacity <= capacity_) return true;
     if (capacity > std::numeric_limits<uint32_t>::max() / element_size) return false;

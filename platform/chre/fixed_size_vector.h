@@ -29,7 +29,7 @@ class FixedSizeVector {
   // The vector must not be full.
   void push_back(const T& element) { elements_[size_++] = element; }
 
-  // Removes one element; the later ones move down by one place.
+  // Removes one element; the later ones move down by one index.
   void erase(size_t index) {
     for (size_t i = index + 1; i < size_; ++i) elements_[i - 1] = elements_[i];
     --size_;

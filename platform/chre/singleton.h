@@ -9,7 +9,7 @@ namespace chre {
 template <typename T>
 class Singleton {
  public:
-  // Builds the object unless it stands already. The flag is set first.
+  // Constructs the object unless it exists. The flag is set first.
   template <typename... Args>
   static void init(Args&&... args) {
     if (sIsInitialized) return;
@@ -17,14 +17,14 @@ class Singleton {
     new (sObject) T(std::forward<Args>(args)...);
   }
 
-  // Destroys the object if it stands.
+  // Destroys the object if it exists.
   static void deinit() {
     if (!sIsInitialized) return;
     get()->~T();
     sIsInitialized = false;
   }
 
-  // The object; it must stand.
+  // The object; it must exist.
   static T* get() { return std::launder(reinterpret_cast<T*>(sObject)); }
 
  private:

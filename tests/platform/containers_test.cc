@@ -7,7 +7,7 @@ TEST(DynamicVector, DoublesItsStorageAndKeepsTheOrder) {
   qz::test::TestHub runtime;
   chre::DynamicVector<int> vector;
   for (const size_t capacity : {1, 2, 4, 4, 8}) {
-    // A refused growth changes nothing; where there is room nothing can be refused.
+    // A refused growth changes nothing; where there is space nothing can be refused.
     const bool grows = capacity != vector.capacity();
     const auto next = static_cast<int>(vector.size()) + 1;
     runtime.hub.heap().RefuseNth(1);

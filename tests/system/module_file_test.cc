@@ -1,5 +1,5 @@
-// The module as a loader sees it, read back from the file: what it exports and imports, what it
-// says of itself, what of it is constant, and that nothing runs at load.
+// The module as a loader sees it, read back from the file: what it exports and imports, its
+// record, what of it is constant, and that nothing runs at load.
 
 #include <gmock/gmock.h>
 
@@ -46,7 +46,7 @@ TEST_F(ModuleFile, HoldsTheUnstableIdInASectionOfItsOwn) {
   EXPECT_EQ(Location("_chreNanoappUnstableId"), section.sh_addr);
 }
 
-TEST_F(ModuleFile, SaysWhatItIs) {
+TEST_F(ModuleFile, HoldsTheRecord) {
   const ElfFile::Address at = Location("_chreNslDsoNanoappInfo");
   constexpr size_t kVendor = offsetof(chreNslNanoappInfo, vendor);
   constexpr size_t kAppId = offsetof(chreNslNanoappInfo, appId);
