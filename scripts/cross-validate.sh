@@ -1,5 +1,5 @@
 #!/usr/bin/env bash
-# Judges the recipe of the demonstration model: for each of the four folds of DATA a model that learnt from
+# Validates the recipe of the demonstration model: for each of the four folds of DATA a model trained on
 # the other three, all measured on what they did not learn from; then a simple reference on the same folds.
 # Usage: scripts/cross-validate.sh DATA
 set -euo pipefail

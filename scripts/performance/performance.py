@@ -2,8 +2,8 @@
 """Rewrites what docs/performance.md says of one `make bench-baselines`, and its picture.
 
 Usage: performance.py FOLDER, which holds what bench-baselines.sh left there:
-  table.md   the table of peers          raw.txt    its raw lines
-  parts.txt  our operators one by one    gains.txt  our kernels' texts side by side
+  table.md   the table of baselines       raw.txt    its raw lines
+  parts.txt  our operators one by one    gains.txt  our kernels' variants side by side
 """
 
 import json
@@ -83,7 +83,7 @@ def in_short(raw):
             ("a frame of the front end", "B", ("QZ, exact, AVX2",), "a float chain around FFTW", ("FFTW",))]
     lines = ["| | QZ µs | µs | beside it | ratio |", "|---|---|---|---|---|"]
     names = {line[2] for line in raw}
-    if "QZ, exact, AVX512-VNNI" not in names:  # nor has the peer more than AVX2 to hide then
+    if "QZ, exact, AVX512-VNNI" not in names:  # then the baseline has only AVX2 too
         rows[0] = (*rows[0][:4], ("oneDNN", "pad64"))
         del rows[1]
     for what, group, ours, name, theirs in rows:
@@ -93,7 +93,7 @@ def in_short(raw):
 
 
 def gains_table(rows):
-    lines = ["| Text | Kernel | SSE2 ns | for AVX2 ns | AVX2 ns | gain | AVX512-VNNI ns | gain | over AVX2 |",
+    lines = ["| Source | Kernel | reference, SSE2 ns | reference, AVX2 ns | AVX2 ns | gain | AVX512-VNNI ns | gain | over AVX2 |",
              "|---|---|---|---|---|---|---|---|---|"]
     for text, kernel, plain, compiled, avx2, vnni in rows:
         kernel = re.sub(r"^orra_|_ukernel.*", "", kernel)
@@ -145,8 +145,8 @@ def main():
 
     lines = [machine(ghz), "", *in_short(raw), "",
              "## The table", "", (folder / "table.md").read_text().strip(), "",
-             "## What each text gains", "",
-             "One call as the graphs make it, quiet nanoseconds; the gain is against the plain text, compiled for AVX2.",
+             "## What each variant gains", "",
+             "One call as the graphs make it, quiet nanoseconds; the gain is against the reference compiled for AVX2.",
              "", *gains_table(kernels), ""]
     before, after = PAGE.read_text().split(MARKS[0])[0], PAGE.read_text().split(MARKS[1])[1]
     PAGE.write_text(before + MARKS[0] + "\n".join(lines) + MARKS[1] + after)

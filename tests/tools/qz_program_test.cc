@@ -103,7 +103,7 @@ std::vector<Result> ResultsOf(const std::string& lines, const std::string& type)
   return results;
 }
 
-// A module of low thresholds, whatever model this build holds: over a stand-in.
+// A module of low thresholds, whatever model this build holds: over a synthetic one.
 const std::string kWithModel =
     "export MODEL=$(dirname $0)/model && " QZ_MODEL_TOOL " synthetic --seed 1 -o $MODEL && ";
 const std::string kLowModule = " --module " QZ_LOW_MODULE " --labels " QZ_LABELS " ";
