@@ -19,17 +19,17 @@ struct Tally {
 // runs, rows, channels, bytes and buffers; lines, messages and events for each nanoapp.
 class Comparison {
  public:
-  // The names of the two builds in sentences.
+  // The names of the two builds in messages.
   Comparison(std::string first_name, std::string second_name)
       : first_name_(std::move(first_name)), second_name_(std::move(second_name)) {}
 
-  // The next records of both. Empty when they are equal, else one sentence that names the place and
+  // The next records of both. Empty when they are equal, else a message that names the location and
   // both values; nothing may be compared afterwards.
   std::string Compare(const Record& first, const Record& second);
 
   // Empty when the module that was loaded and the nanoapp that was linked logged and sent the same
   // and left the same in memory after each buffer, so that what was observed in the second holds
-  // for the first; else one sentence. At the end.
+  // for the first; else a message. At the end.
   std::string NanoappsDiffer() const;
 
   // Of the kind's records so far, in both traces.
@@ -41,7 +41,7 @@ class Comparison {
 
  private:
   void Count(const Record& record);
-  // "place: `first` in the one, `second` in the other".
+  // "location: `first` in the one, `second` in the other".
   std::string Differ(const std::string& location, const std::string& first,
                      const std::string& second) const;
   std::string BytesDiffer(const Record& first, const Record& second) const;

@@ -42,7 +42,7 @@ std::vector<T> ReadTable(std::ifstream* file, size_t offset, size_t count) {
   return table;
 }
 
-// True for the plain name and for that of an object in a namespace, as compilers write it.
+// True for the name itself and for that of an object in a namespace, as compilers write it.
 bool Names(const std::string& symbol, const std::string& name) {
   const std::string in_namespace = std::to_string(name.size()) + name + "E";
   return symbol == name || (symbol.size() > in_namespace.size() &&
@@ -53,7 +53,7 @@ bool Names(const std::string& symbol, const std::string& name) {
 }  // namespace
 
 const uint8_t* FindObject(const void* inside, const std::string& name, size_t min_bytes,
-                          std::string* wrong) {
+                          std::string* error) {
   LoadedFile loaded{reinterpret_cast<uintptr_t>(inside), "", 0};
   dl_iterate_phdr(LookAt, &loaded);
   std::ifstream file(loaded.path, std::ios::binary);
@@ -76,7 +76,7 @@ const uint8_t* FindObject(const void* inside, const std::string& name, size_t mi
       return reinterpret_cast<const uint8_t*>(loaded.base + symbol.st_value);
     }
   }
-  *wrong = loaded.path + ": no symbol of an object " + name + " of at least " +
+  *error = loaded.path + ": no symbol of an object " + name + " of at least " +
            std::to_string(min_bytes) + " bytes, should be a file that was not stripped";
   return nullptr;
 }

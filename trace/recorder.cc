@@ -7,7 +7,7 @@
 namespace qz::trace {
 namespace {
 
-// Where the hub keeps a host's message is nothing that the nanoapp did, and another place each
+// The address at which the hub keeps a host's message is not the nanoapp's doing and differs each
 // time.
 std::string WithoutAddress(const std::string& line) {
   const std::string mark = "@ 0x";
@@ -27,10 +27,10 @@ void Recorder::Begin(uint32_t nanoapp, hub::Hub* hub) {
   Write(Kind::kPlayed, nanoapp_, 0, {});
 }
 
-bool Recorder::WatchMemory(std::string* wrong) {
+bool Recorder::WatchMemory(std::string* error) {
   for (uint32_t i = 0; i < kWatchedObjectCount; ++i) {
     const WatchedObject& object = kWatchedObjects[i];
-    objects_[i] = FindObject(hub_->nanoapp(), object.name, object.bytes, wrong);
+    objects_[i] = FindObject(hub_->nanoapp(), object.name, object.bytes, error);
     if (objects_[i] == nullptr) return false;
   }
   return true;

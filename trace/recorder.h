@@ -18,9 +18,9 @@ class Recorder final : public hub::ClientListener {
   // What comes from now on is of this nanoapp, kLoadedModule or kLinkedNanoapp. `hub` stays alive
   // until the next call.
   void Begin(uint32_t nanoapp, hub::Hub* hub);
-  // Finds the watched objects of the nanoapp that runs; false with one sentence in `*wrong` if one
+  // Finds the watched objects of the nanoapp that runs; false with a message in `*error` if one
   // isn't there.
-  bool WatchMemory(std::string* wrong);
+  bool WatchMemory(std::string* error);
   // So many buffers were played since WatchMemory.
   void Played(uint32_t buffers);
 
@@ -40,7 +40,7 @@ class Recorder final : public hub::ClientListener {
   const uint8_t* objects_[kWatchedObjectCount] = {};
 };
 
-// Tells `recorder` of every frame and every network run of the nanoapp that is linked into this
+// Reports to `recorder` every frame and every network run of the nanoapp that is linked into this
 // program.
 void ObserveLinkedNanoapp(Recorder* recorder);
 

@@ -61,7 +61,7 @@ struct Record {
 constexpr size_t kMaxRecordBytes = 65536;
 static_assert(config::kArenaBytes <= kMaxRecordBytes);
 
-// Appends the `size` low bytes of `value`, the lowest first.
+// Appends the `size` low bytes of `value`, least significant first.
 void AppendLittleEndian(uint64_t value, size_t size, std::vector<uint8_t>* bytes);
 
 class Writer {
@@ -78,7 +78,7 @@ class Writer {
   uint64_t counts_[kKindsBeforeEnd] = {};
 };
 
-// One sentence that names the record and what is wrong with it.
+// The message names the record and its fault.
 class TraceError : public std::runtime_error {
  public:
   using std::runtime_error::runtime_error;

@@ -1,5 +1,5 @@
 // Traces of a few records: written, read, cut short, and compared with others that differ in one
-// place.
+// value.
 
 #include <gmock/gmock.h>
 
@@ -45,8 +45,8 @@ std::string Written(const std::vector<Record>& records) {
   return stream;
 }
 
-// The records up to the end record, and what is wrong with the stream.
-std::vector<Record> Read(const std::string& stream, std::string* wrong) {
+// The records up to the end record, and the error that ended the stream early.
+std::vector<Record> Read(const std::string& stream, std::string* error) {
   size_t location = 0;
   Reader reader([&](uint8_t* bytes, size_t size) {
     // In small pieces, as from a pipe.
@@ -58,16 +58,16 @@ std::vector<Record> Read(const std::string& stream, std::string* wrong) {
   std::vector<Record> records;
   try {
     for (Record record; reader.Next(&record), record.kind != Kind::kEnd;) records.push_back(record);
-  } catch (const TraceError& error) {
-    *wrong = error.what();
+  } catch (const TraceError& refused) {
+    *error = refused.what();
   }
   return records;
 }
 
-std::string WrongWith(const std::string& stream) {
-  std::string wrong;
-  Read(stream, &wrong);
-  return wrong;
+std::string ErrorOf(const std::string& stream) {
+  std::string error;
+  Read(stream, &error);
+  return error;
 }
 
 std::string Compared(const std::vector<Record>& first, const std::vector<Record>& second) {
@@ -81,9 +81,9 @@ std::string Compared(const std::vector<Record>& first, const std::vector<Record>
 }
 
 TEST(Trace, ComesBackAsWritten) {
-  std::string wrong;
-  const std::vector<Record> records = Read(Written(GoodTrace()), &wrong);
-  EXPECT_EQ(wrong, "");
+  std::string error;
+  const std::vector<Record> records = Read(Written(GoodTrace()), &error);
+  EXPECT_EQ(error, "");
   EXPECT_EQ(records.size(), GoodTrace().size());
   EXPECT_EQ(Compared(records, GoodTrace()), "");
   // Kind, number, type, time and size of the second record, behind the 21 bytes of the first.
@@ -94,16 +94,16 @@ TEST(Trace, ComesBackAsWritten) {
 TEST(Trace, IsWholeOrNone) {
   const std::string whole = Written(GoodTrace());
   for (size_t size = 0; size < whole.size(); ++size) {
-    ASSERT_THAT(WrongWith(whole.substr(0, size)), HasSubstr("cut off")) << size;
+    ASSERT_THAT(ErrorOf(whole.substr(0, size)), HasSubstr("cut off")) << size;
   }
-  EXPECT_THAT(WrongWith(whole + "x"), HasSubstr("bytes behind the end record"));
-  EXPECT_EQ(WrongWith(whole.substr(21)),
+  EXPECT_THAT(ErrorOf(whole + "x"), HasSubstr("bytes behind the end record"));
+  EXPECT_EQ(ErrorOf(whole.substr(21)),
             "record " + std::to_string(GoodTrace().size() - 1) +
                 " of the trace: the end record counts 4 records of kind 1, there were 3");
-  EXPECT_THAT(WrongWith("x" + whole), HasSubstr("record 0 of the trace: its kind is 120"));
+  EXPECT_THAT(ErrorOf("x" + whole), HasSubstr("record 0 of the trace: its kind is 120"));
   std::string large = whole;
   large[19] = 2;
-  EXPECT_THAT(WrongWith(large), HasSubstr("it has 131072 bytes, should be at most 65536"));
+  EXPECT_THAT(ErrorOf(large), HasSubstr("it has 131072 bytes, should be at most 65536"));
 }
 
 TEST(Trace, FirstDifferenceIsNamed) {
