@@ -64,8 +64,8 @@ def filterbank():
 
 
 def braced(values, per_line):
-    texts = [str(v) if isinstance(v, int) else '{%d, %d}' % v for v in values]
-    lines = [', '.join(texts[i:i + per_line]) for i in range(0, len(texts), per_line)]
+    numbers = [str(v) if isinstance(v, int) else '{%d, %d}' % v for v in values]
+    lines = [', '.join(numbers[i:i + per_line]) for i in range(0, len(numbers), per_line)]
     return '{' + ',\n     '.join(lines) + '}'
 
 

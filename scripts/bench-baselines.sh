@@ -2,7 +2,7 @@
 # Times our kernels and the libraries that others would use instead, in interleaved rounds, and prints one
 # table; then our operators and kernels one by one. All of it stays in build/host/baselines.
 #   bench-baselines.sh BASELINES      the folder with the programs of the baselines' setup.sh and run.sh
-# PEERS_DIR (default a folder under /tmp) is where they are built; ROUNDS and BENCH_MAX_MS as run.sh says.
+# PEERS_DIR (default a folder under /tmp) is where they are built; ROUNDS and BENCH_MAX_MS are described in run.sh.
 # UPDATE=1 also rewrites docs/performance.md and its picture.
 set -euo pipefail
 cd "$(dirname "$0")/.."
@@ -26,7 +26,7 @@ cat >"$PEERS_EXTRA" <<EXTRA
 $bin/baseline_lines_Avx2
 $bin/baseline_lines_Baseline
 EXTRA
-# Where the processor has more than AVX2, both we and the network library use it unless told not to.
+# Where the processor has more than AVX2, both we and the network library use it by default.
 if grep -q ' avx512_vnni' /proc/cpuinfo; then
   cat >>"$PEERS_EXTRA" <<EXTRA
 $bin/baseline_lines

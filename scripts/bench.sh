@@ -7,7 +7,7 @@ cd "$(dirname "$0")/.."
 clip=build/host/clip.wav
 length_s=3600
 
-# An hour of the clip over and over, in the format that the name's ending tells.
+# An hour of the clip over and over, in the format of the file name's extension.
 make_hour() {
   local out=$1 rate_hz=$2 channels=$3
   [ ! -e "$out" ] || return 0

@@ -1,11 +1,11 @@
 #!/usr/bin/python3
-"""Measures a random forest on averaged features by cross-validation: what the network's figures are compared with.
+"""Measures a random forest on averaged features by cross-validation: what the network's metrics are compared with.
 
 Usage: compare-with-forest.py FEATURES [LABELS]     (default model/labels.tsv)
 
 FEATURES is a folder that `qz features --manifest MANIFEST -o FEATURES` wrote. A forest of 500 trees sees of each
 clip, per channel, the mean, the deviation, the 90th percentile and the mean absolute step of the features. Each fold
-is scored by a forest of all the other folds' clips, fold 0's included; the figures are those of `qz eval`, with a
+is scored by a forest of all the other folds' clips, fold 0's included; the metrics are those of `qz eval`, with a
 --fold-model for each fold: means over the folds. Needs Debian's python3-sklearn (setup-debian.sh validation).
 """
 
@@ -58,9 +58,9 @@ def check_folds(labels, classes, folds):
                     raise ValueError(f"no clip of {label} {where} fold {fold}, should be one or more")
 
 
-def print_table(labels, figures):
+def print_table(labels, metrics):
     print(f"{'class':16}  average precision  ROC AUC  recall")
-    for name, row in zip([*labels, "mean"], [*figures, figures.mean(axis=0)]):
+    for name, row in zip([*labels, "mean"], [*metrics, metrics.mean(axis=0)]):
         print(f"{name:16}  {row[0]:17.3f}  {row[1]:7.3f}  {row[2]:6.3f}")
 
 

@@ -1,11 +1,11 @@
 #!/usr/bin/env bash
 # Validates the recipe of the demonstration model: for each of the four folds of DATA a model trained on
-# the other three, all measured on what they did not learn from; then a simple reference on the same folds.
+# the other three, all measured on the fold they were not trained on; then a simple reference on the same folds.
 # Usage: scripts/cross-validate.sh DATA
 set -euo pipefail
 
 [ $# -eq 1 ] || { echo "usage: cross-validate.sh DATA" >&2; exit 2; }
-data=$(realpath -e -- "$1" 2>/dev/null) || data=$1  # what is no folder is told below
+data=$(realpath -e -- "$1" 2>/dev/null) || data=$1  # what is no folder is reported below
 cd "$(dirname "$0")/.."
 folder=build/cross-validation
 folds=(1 2 3 4)

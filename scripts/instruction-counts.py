@@ -3,7 +3,7 @@
 
 Usage: instruction-counts.py [--update] [BUILD]     (default build/host)
 
-Under callgrind, with the texts that every x86-64 processor runs and with those for AVX2: the same on every machine,
+Under callgrind, with the variants that every x86-64 processor runs and with those for AVX2: the same on every machine,
 however busy. Exit code: 0 nothing grew or shrank by more than 2 %, 1 something did or could not be counted.
 """
 
@@ -15,7 +15,7 @@ import sys
 import tempfile
 
 ROOT = pathlib.Path(__file__).resolve().parent.parent
-FIGURES = ROOT / "bench/instruction_counts.txt"
+COUNTS = ROOT / "bench/instruction_counts.txt"
 TOLERANCE = 0.02
 VARIANTS = ("Baseline", "Avx2")
 WORK = {"frame": "audio_frontend_invoke", "network run": "mobilenet_backend_invoke",
@@ -54,20 +54,20 @@ def count(program):
 
 def committed():
     """{(variant, work): instructions}"""
-    lines = FIGURES.read_text().splitlines() if FIGURES.exists() else []
+    lines = COUNTS.read_text().splitlines() if COUNTS.exists() else []
     rows = []
     for line in lines:
         if line.startswith("#"):
             continue
         rows.append(re.fullmatch(r"(\w+) +(.+?) +([\d,]+)", line))
         if not rows[-1]:
-            sys.exit(f"{FIGURES}: '{line}' should be a variant, what it does and a number")
+            sys.exit(f"{COUNTS}: '{line}' should be a variant, what it does and a number")
     return {(row[1], row[2]): int(row[3].replace(",", "")) for row in rows}
 
 
 def main():
     arguments = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
-    arguments.add_argument("--update", action="store_true", help="write what is counted as the committed figures")
+    arguments.add_argument("--update", action="store_true", help="write what is counted as the committed counts")
     arguments.add_argument("build", nargs="?", type=pathlib.Path, default=ROOT / "build/host")
     options = arguments.parse_args()
 
@@ -85,12 +85,12 @@ def main():
             print(f"{variant:9} {work:12} {instructions:12,}  committed {old:12,}{'  MOVED' if moved else ''}")
     if options.update:
         if not has_avx2:
-            sys.exit("instruction-counts.py: all figures are written together, which needs AVX2")
-        FIGURES.write_text("# Instructions on average, as scripts/instruction-counts.py counts and compares them.\n" +
+            sys.exit("instruction-counts.py: all counts are written together, which needs AVX2")
+        COUNTS.write_text("# Instructions on average, as scripts/instruction-counts.py counts and compares them.\n" +
                            "".join(f"{variant:9} {work:12} {instructions:12,}\n"
                                    for (variant, work), instructions in now.items()))
     elif faults:
-        sys.exit(f"instruction-counts.py: {faults} figures moved by more than {TOLERANCE:.0%}: find out why; "
+        sys.exit(f"instruction-counts.py: {faults} counts moved by more than {TOLERANCE:.0%}: find out why; "
                  "`make counts UPDATE=1` commits to them")
 
 

@@ -18,7 +18,7 @@ sounds=(
   $speech/Rear_Right.wav
 )
 pause_s=0.2
-least_s=20
+min_s=20
 
 for sound in "${sounds[@]}"; do
   [ -r "$sound" ] || {
@@ -43,8 +43,8 @@ done
 sox -D "${files[@]}" "$parts/whole.wav"
 
 length_s=$(soxi -D "$parts/whole.wav")
-awk -v have="$length_s" -v least="$least_s" 'BEGIN { exit !(have >= least) }' || {
-  echo "make-clip.sh: the clip lasts $length_s s, should be at least $least_s s" >&2
+awk -v have="$length_s" -v min="$min_s" 'BEGIN { exit !(have >= min) }' || {
+  echo "make-clip.sh: the clip lasts $length_s s, should be at least $min_s s" >&2
   exit 1
 }
 mv "$parts/whole.wav" "$out"

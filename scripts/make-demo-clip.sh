@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # Puts a clip of real recorded sounds together that the detector should and should not know, from Debian
-# packages, and beside it a table of what stands when in it. Prints the table.
+# packages, and beside it a table of its sounds and their times. Prints the table.
 # Usage: scripts/make-demo-clip.sh OUT.wav        (the table: OUT.txt)
 #
 # Where the sounds come from, and under which licence (/usr/share/doc/PACKAGE/copyright):

@@ -5,7 +5,7 @@ Usage: make-manifest.py DATA [--extra DIR]... [-o FILE]     (without -o: to stan
 
 DATA holds a folder for each class, and each folder sound files whose name begins with their fold: 3-142005-A.ogg.
 The files of DIR become the class "other" in fold 0, which is trained with and never measured. Each folder's files
-stand in the order of their bytes. Exit code: 0 fine, 3 a folder or a name that is not so.
+are sorted by the bytes of their names. Exit code: 0 fine, 3 a folder or a name that is not so.
 """
 
 import argparse
@@ -18,13 +18,13 @@ import sys
 FOLD = re.compile(r"([1-9])-")
 
 
-def fail(place, fault):
-    print(f"make-manifest.py: {place}: {fault}", file=sys.stderr)
+def fail(path, fault):
+    print(f"make-manifest.py: {path}: {fault}", file=sys.stderr)
     sys.exit(3)
 
 
 def entries(folder):
-    """What stands in a folder, hidden files aside."""
+    """The entries of a folder, hidden files aside."""
     try:
         names = sorted(filter(lambda name: not name.startswith("."), os.listdir(folder)), key=os.fsencode)
     except OSError as error:

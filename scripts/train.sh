@@ -5,7 +5,7 @@
 set -euo pipefail
 
 [ $# -eq 1 ] || { echo "usage: train.sh DATA" >&2; exit 2; }
-data=$(realpath -e -- "$1" 2>/dev/null) || data=$1  # what is no folder is told below
+data=$(realpath -e -- "$1" 2>/dev/null) || data=$1  # what is no folder is reported below
 cd "$(dirname "$0")/.."
 folder=build/train
 committed=model/demonstration.bin

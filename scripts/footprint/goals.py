@@ -1,9 +1,9 @@
-"""What the figures are held against, and where each limit comes from."""
+"""The limits of sizes and costs, and where each comes from."""
 
 import json
 import pathlib
 
-# Figures that are known to miss their goal, and why; any other that does is a failure.
+# Measurements that are known to miss their goal, and why; any other that does is a failure.
 MISSED = {}
 
 # Network: a multiply-accumulate unit of 4 lanes that did nothing else would take 0.93 million.
@@ -29,7 +29,7 @@ TABLE_BYTES = sum([
     CLASSES * (4 + 8 + 1),    # detection: thresholds, cooling times, categories
     56 + 31,                  # info record, unstable ID
 ])
-CONSTANTS_BYTES = TABLE_BYTES * 105 // 100  # and 5 % for texts, descriptors of messages and the like
+CONSTANTS_BYTES = TABLE_BYTES * 105 // 100  # and 5 % for strings, descriptors of messages and the like
 
 # AppManager: the listener's table, the audio's flag and handle, 8 host clients and their count, the
 # classifier (5 times, rings of 6 and 17 floats with two 16-bit counters, listener, flag), the list

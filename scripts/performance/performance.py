@@ -1,5 +1,5 @@
 #!/usr/bin/env python3
-"""Rewrites what docs/performance.md says of one `make bench-baselines`, and its picture.
+"""Rewrites the sections of docs/performance.md about one `make bench-baselines`, and its picture.
 
 Usage: performance.py FOLDER, which holds what bench-baselines.sh left there:
   table.md   the table of baselines       raw.txt    its raw lines
@@ -53,12 +53,13 @@ def machine(ghz):
 
 
 def gains(path):
-    """[(text, kernel, ns of plain, of plain for AVX2, of AVX2, of AVX512-VNNI)], 0 for what there is not.
+    """[(implementation, kernel, ns of the reference, of the reference compiled for AVX2, of AVX2, of AVX512-VNNI)],
+    0 for what there is not.
 
     The file holds several runs, one after another: the shortest time of each counts."""
     rows = {}
-    for text, kernel, *times in map(str.split, path.read_text().splitlines()):
-        rows.setdefault((text, kernel), []).append(list(map(float, times)))
+    for name, kernel, *times in map(str.split, path.read_text().splitlines()):
+        rows.setdefault((name, kernel), []).append(list(map(float, times)))
     return [(*names, *map(min, zip(*runs))) for names, runs in rows.items()]
 
 
@@ -95,9 +96,9 @@ def in_short(raw):
 def gains_table(rows):
     lines = ["| Source | Kernel | reference, SSE2 ns | reference, AVX2 ns | AVX2 ns | gain | AVX512-VNNI ns | gain | over AVX2 |",
              "|---|---|---|---|---|---|---|---|---|"]
-    for text, kernel, plain, compiled, avx2, vnni in rows:
+    for name, kernel, reference, compiled, avx2, vnni in rows:
         kernel = re.sub(r"^orra_|_ukernel.*", "", kernel)
-        lines.append(f"| {text} | {kernel} | {plain:.0f} | {compiled:.0f} | " +
+        lines.append(f"| {name} | {kernel} | {reference:.0f} | {compiled:.0f} | " +
                      (f"{avx2:.0f} | {compiled / avx2:.2f} | " if avx2 else " | | ") +
                      (f"{vnni:.0f} | {compiled / vnni:.2f} | {avx2 / vnni:.2f} |" if vnni else " | | |"))
     return lines
@@ -124,8 +125,8 @@ def picture(raw, parts, kernels, limits, ghz):
     for number, time in parts.items():
         kind = OPERATORS.get(number, ("max pools and the rest", 0))[0]
         groups[kind] = groups.get(kind, 0) + time * RUNS_A_PASS
-    steps = {text: avx2 / 1e3 for text, _, _, _, avx2, _ in kernels
-             if text in ("filterbank", "logarithm", "square_root")}
+    steps = {name: avx2 / 1e3 for name, _, _, _, avx2, _ in kernels
+             if name in ("filterbank", "logarithm", "square_root")}
     frame_parts = {"FFT": fft, **steps, "rest of the front end": frame - fft - sum(steps.values())}
     drawing.stack([(name, time * FRAMES_A_PASS) for name, time in frame_parts.items()] +
                   sorted(groups.items(), key=lambda item: -item[1]))

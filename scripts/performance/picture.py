@@ -23,7 +23,7 @@ class Drawing:
         self.y += 14
 
     def limit_bars(self, rows):
-        """rows: (name, part of the limit, note). A line stands at the limit."""
+        """rows: (name, part of the limit, note). A line marks the limit."""
         top = self.y
         for name, part, note in rows:
             self.text(LEFT - 8, self.y + 15, name, anchor="end")
