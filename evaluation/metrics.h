@@ -1,4 +1,4 @@
-// Figures of merit of a set of clips whose scores are known.
+// Metrics of a set of clips whose scores are known.
 #pragma once
 
 #include <array>
@@ -27,7 +27,7 @@ struct ScoredClip {
   Scores max{};          // over the network runs
 };
 
-// How well one output tells its class; each from 0 to 1, see ranking.h.
+// How well one output detects its class; each from 0 to 1, see ranking.h.
 struct Merit {
   double average_precision = 0;
   double roc_auc = 0;
@@ -47,7 +47,7 @@ struct Metrics {
   Merit mean;  // over the classes
 };
 
-// The outputs to whose class no clip belongs, in order: such clips have no figures.
+// The outputs to whose class no clip belongs, in order: such clips have no metrics.
 std::vector<int> EmptyClasses(const std::vector<ScoredClip>& clips);
 
 // Throws std::invalid_argument if there is an empty class.

@@ -1,4 +1,4 @@
-// Figures of sets of clips whose scores were made up.
+// Metrics of sets of clips whose scores were made up.
 
 #include "evaluation/metrics.h"
 
@@ -23,7 +23,7 @@ ScoredClip Clip(int output, const Scores& max, const std::string& class_name = "
   return clip;
 }
 
-// Output 4 hears its class no better than the negatives.
+// Output 4 scores its class no higher than the negatives.
 std::vector<ScoredClip> SixMinutes() {
   return {Clip(0, {0.9f, 0, 0, 0, 0.25f}),   Clip(1, {0.1f, 0.9f, 0, 0, 0.25f}),
           Clip(2, {0, 0, 0.9f, 0, 0.25f}),   Clip(3, {0, 0, 0, 0.9f, 0.25f}),

@@ -1,4 +1,4 @@
-// Figures of merit: values worked out by hand, and the definitions followed word by word.
+// Ranking metrics: values worked out by hand, and the definitions followed word by word.
 
 #include "evaluation/ranking.h"
 
