@@ -1,6 +1,6 @@
-// Our own lines of the table of peers (make bench-baselines): one run of the network, one FFT, one
-// frame of the front end, in the form that the peers' own programs print; `--parts` prints each
-// operator of the network instead.
+// Our own lines of the table of baselines (make bench-baselines): one run of the network, one FFT,
+// one frame of the front end, in the format that the baselines' programs print. `--parts` prints
+// each operator of the network instead.
 
 #include <array>
 #include <cstdio>
@@ -41,7 +41,7 @@ void Print(const char* group, const Times& t, double products) {
 
 void PrintBaselineLines() {
   Print("A", qz::bench::Measure(mobilenet_backend_invoke), kNetworkProducts);
-  // No front-end kernel has a text for more than AVX2.
+  // No front-end kernel has a variant for more than AVX2.
   if (qz::BestInstructionSet() == InstructionSet::kAvx512Vnni) return;
 
   constexpr size_t kFrames = 100;

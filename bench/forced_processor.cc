@@ -1,4 +1,4 @@
-// Takes the place of the library that asks the processor.
+// Replaces the library that asks the processor: the instruction set is fixed when this is compiled.
 
 #include "kernels/x86_64/processor.h"
 

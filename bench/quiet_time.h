@@ -1,5 +1,5 @@
 // How long a piece of work takes on a machine that others use too: many short samples, of which the
-// lowest tenth tells the work's own time.
+// 10th percentile is the work's own time.
 #pragma once
 
 #include <sched.h>

@@ -59,7 +59,7 @@ static inline const int8_t* TileRow(const int8_t* const* lists, size_t taps, siz
 }
 
 // All rows, tile by tile, from row_at(tap, row), the row of the input that a tap meets for a row of
-// the output. In a last tile of fewer rows the last one stands for those that are missing: a tile
+// the output. In a last tile of fewer rows the last one is repeated for the missing ones: a tile
 // is computed whole, and only those of its rows that exist are stored.
 template <typename RowAt>
 static inline void MultiplyTiles(size_t m, size_t n, size_t k, size_t taps, RowAt row_at,

@@ -18,7 +18,7 @@ static inline const int8_t* RowAt(uintptr_t address) {
   return reinterpret_cast<const int8_t*>(address);
 }
 
-// The row of an entry: `offset` bytes further, except for the entry that stands for a row of zeros.
+// The row of an entry: `offset` bytes further, except for the entry that means a row of zeros.
 static inline const int8_t* ListedRow(const int8_t* const* list, size_t index, size_t offset,
                                       const int8_t* zero) {
   const uintptr_t entry = ListEntry(list, index);

@@ -107,7 +107,7 @@ void orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a
 
 // Maximum over listed rows: for output position p < positions and channel c < channels,
 //   out[p][c] = clamp(max over e < pool_size of row(p, e)[c], output_min, output_max).
-// in_offset bytes are added to every entry, so that entries may be plain offsets from a base passed
+// in_offset bytes are added to every entry, so that entries may be offsets from a base passed
 // there. After each position the list advances by pool_size entries rounded up to an even count,
 // plus in_ptrs_gap bytes. out_gap bytes follow the `channels` bytes of each position.
 void orra_s8_maxpool_minmax_ukernel_2p2x__neon_c16(size_t positions, size_t pool_size,

@@ -40,7 +40,7 @@ struct Product {
   const uint8_t* Block(size_t block) const { return w + block * BlockBytes(); }
 };
 
-// Blocks from `first` to before `end`, of which a last one may stand alone in its pair.
+// Blocks from `first` to before `end`, of which the last one may be alone in its pair.
 struct Blocks {
   size_t first, end;
 };

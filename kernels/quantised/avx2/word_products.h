@@ -44,9 +44,9 @@ inline __m256i PairsOf(__m128i first, __m128i second) {
   return _mm256_cvtepi8_epi16(_mm_unpacklo_epi8(first, second));
 }
 
-// Where channels are missing, what stands behind the weights takes their place: rows are 0 there,
-// and what the columns start with makes up for the rest. It is of the same block, which ends in
-// scales.
+// Where channels are missing, the bytes behind the weights are read instead: rows are 0 there, and
+// what the columns start with makes up for the rest. These bytes are of the same block, which ends
+// in scales.
 inline StepPairs LoadStep(const uint8_t* weights) {
   const auto load = [=](size_t channel) {
     const uint8_t* from = weights + channel * kTileColumns;

@@ -27,8 +27,8 @@ struct ByteProducts {
     uint8_t* step = to + kPanelStart;
     for (size_t t = 0; t < taps; ++t, weights += k * kTileColumns) {
       for (size_t i = 0; i < k; i += kStepChannels, step += kPanelStep) {
-        // Where channels are missing, what stands behind the weights takes their place, in the same
-        // block, which ends in scales: rows are 128 there, and that comes off.
+        // Where channels are missing, the bytes behind the weights are read instead, in the same
+        // block, which ends in scales: rows are 128 there, and that is subtracted.
         const __m256i y = ByColumn(LoadInts(weights + i * kTileColumns));
         const __m256i none = _mm256_setzero_si256();
         added = _mm256_add_epi32(added, _mm256_dpbusd_epi32(none, _mm256_set1_epi8(INT8_MIN), y));
