@@ -189,7 +189,7 @@ TEST_F(HostClients, HostilePayloadsEndInALogLine) {
   EXPECT_THAT(TakeMessages(), ElementsAre("4@16", "7@16"));
 }
 
-// Nothing leaks, nothing is freed twice, the log says which work was dropped, and the next good
+// Nothing leaks, nothing is freed twice, the log reports which work was dropped, and the next good
 // request works.
 TEST_F(HostClients, EveryRefusedAllocationDropsItsWorkAlone) {
   std::set<std::string> errors;

@@ -64,7 +64,7 @@ TEST(AudioFrontend, StaysCloseToItsMathematics) {
 }
 
 // Frame n of an endless series: noise, near-silence, one sample around every power of two, square
-// waves, a constant at the lowest value, silence, sawteeth, and noise of every level.
+// waves, a constant at the minimum, silence, sawteeth, and noise of every level.
 Samples Frame(uint32_t n) {
   qz::test::Random random(n);
   Samples frame(kFrameSamples);

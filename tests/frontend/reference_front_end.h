@@ -1,4 +1,4 @@
-// The front end evaluated step by step, each written from its definition in plain arithmetic.
+// The front end evaluated step by step, each written from its definition in scalar arithmetic.
 #pragma once
 
 #include <cstdint>

@@ -36,7 +36,7 @@ std::vector<T> RandomValues(Random& random, size_t count) {
   return values;
 }
 
-// `count` values of [low, high] in one of six shapes: random, all lowest, all highest, both in
+// `count` values of [low, high] in one of six shapes: random, all minimum, all maximum, both in
 // turn, a ramp (that wraps around), or all the value nearest to 0 but one extreme.
 template <typename T>
 std::vector<T> ShapedFill(Random& random, size_t count, int64_t low = std::numeric_limits<T>::min(),

@@ -38,7 +38,7 @@ class ElfFile {
     }
   }
 
-  // The names in a symbol table, demangled, and what they stand for; unnamed ones are left out.
+  // The names in a symbol table, demangled, with their symbols; unnamed ones are left out.
   std::multimap<std::string, Symbol> Symbols(const std::string& table) const {
     const Section& section = sections.at(table);
     std::multimap<std::string, Symbol> symbols;
@@ -50,7 +50,7 @@ class ElfFile {
     return symbols;
   }
 
-  // What the loader is told under a tag such as DT_NEEDED, of those that name a file or folder.
+  // The values of a tag such as DT_NEEDED, of those that name a file or folder.
   std::set<std::string> Reported(int tag) const {
     const Section& section = sections.at(".dynamic");
     std::set<std::string> names;
@@ -87,8 +87,8 @@ class ElfFile {
     return string;
   }
 
-  // Where the pointer at a place points once its relocation has been applied, before the module's
-  // base is added; 0 when it has none.
+  // Where the pointer at a location points once its relocation has been applied, before the
+  // module's base is added; 0 when it has none.
   Address Pointer(Address location) const {
 #if __SIZEOF_POINTER__ == 4
     using Relocation = ElfW(Rel);
@@ -131,9 +131,9 @@ class ElfFile {
     return bytes_.c_str() + table.sh_offset + index;
   }
   static std::string Demangled(const std::string& name) {
-    const std::unique_ptr<char, decltype(&std::free)> plain(
+    const std::unique_ptr<char, decltype(&std::free)> demangled(
         abi::__cxa_demangle(name.c_str(), nullptr, nullptr, nullptr), std::free);
-    return plain ? plain.get() : name;
+    return demangled ? demangled.get() : name;
   }
 
   std::string bytes_;

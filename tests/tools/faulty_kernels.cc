@@ -1,6 +1,6 @@
-// Kernels that are wrong in a few places, if the environment's FAULTY_KERNEL names them: a
-// logarithm for one input, and a max pool in one place of operator 7, from the third network run
-// on, whatever the model. Each says where it first was wrong.
+// Kernels with a few faults, if the environment's FAULTY_KERNEL names them: a
+// logarithm for one input, and a max pool at one position of operator 7, from the third network run
+// on, whatever the model. Each prints where its first fault was.
 
 #include <cstdio>
 #include <cstdlib>
@@ -17,11 +17,11 @@ bool IsFaulty(std::string_view kernel) {
 }
 
 void SayOnce(const char* location, int call, size_t index, int good, int faulty) {
-  static bool said = false;
-  if (said) return;
+  static bool printed = false;
+  if (printed) return;
   std::fprintf(stderr, location, call, index);
   std::fprintf(stderr, ": %d in good, %d in faulty\n", good, faulty);
-  said = true;
+  printed = true;
 }
 
 }  // namespace

@@ -119,7 +119,7 @@ TEST(HostScoresFormat, MarksScoresAsTheToolsAndPaintsThemOnTerminals) {
   const std::string colours = MakeTextFormat({true, true}, names)->Scores(4 * kSecondNs, scores);
   EXPECT_THAT(colours, AllOf(HasSubstr("\x1b[90mdog bark"), HasSubstr("\x1b[33mbaby cry"),
                              HasSubstr("\x1b[1;32mrooster"), EndsWith("0.0000\x1b[0m")));
-  // The highest of the low ones stands out too.
+  // The maximum of the low ones is marked too.
   scores.confidences[2] = 0;
   EXPECT_THAT(MakeTextFormat({true, true}, names)->Scores(0, scores),
               AllOf(HasSubstr("\x1b[1;33mbaby cry"), HasSubstr("\x1b[90mrooster")));

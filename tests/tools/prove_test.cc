@@ -38,7 +38,7 @@ class Prove : public QzProgram {
     std::filesystem::create_symlink(QZ_BUILD "/lib/" + module, Path(name + "/lib/qz.so"));
     std::filesystem::copy(QZ_BUILD "/launcher", Path(name + "/launcher"));
   }
-  // The same with a shell script in its place, in which $GOOD is the good program.
+  // The same with a shell script as its qz-trace, in which $GOOD is the good program.
   void MakeScript(const std::string& name, const std::string& script) {
     MakeBuild(name, "qz-trace");
     std::filesystem::remove(Path(name + "/bin/qz-trace"));

@@ -38,7 +38,7 @@ constexpr int kNothingToCompareHere =
 std::vector<uint8_t*> ends_of_pages;
 size_t ends_in_use = 0;
 
-// What a fault's message says; filled in before each comparison.
+// The message of a fault; filled in before each comparison.
 char comparison[256];
 
 void OnFault(int signal) {
