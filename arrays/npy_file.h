@@ -34,7 +34,7 @@ constexpr ElementType ElementTypeOf() {
   if constexpr (std::is_same_v<T, float>) return ElementType::kFloat32;
 }
 
-// `values` are as many as the shape says.
+// `values` has as many elements as the shape.
 template <typename T>
 NpyArray MakeArray(std::vector<size_t> shape, const std::vector<T>& values) {
   NpyArray array{ElementTypeOf<T>(), std::move(shape), std::string(values.size() * sizeof(T), 0)};

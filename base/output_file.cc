@@ -34,7 +34,7 @@ struct Target {
 };
 
 // Names of descriptors of this process. They are written through even where they are regular files:
-// whoever opened them, to redirect a stream say, goes on with the same file.
+// whoever opened them, for example to redirect a stream, goes on with the same file.
 bool IsDescriptor(const fs::path& path) {
   const std::string folder = path.parent_path().string();
   return path == "/dev/stdout" || path == "/dev/stderr" || folder == "/dev/fd" ||
@@ -165,7 +165,7 @@ bool IsSameFile(const std::string& path, const std::string& other) {
 void CheckOutputFile(const std::string& path, const std::vector<std::string>& inputs) {
   const Target target = TargetOf(path);
   for (const std::string& input : inputs) {
-    // A terminal, say, may well be both.
+    // A terminal may be both.
     const bool both = target.exists && !S_ISCHR(target.status.st_mode) && IsSameFile(path, input);
     if (both) Refuse(path, "it is the input " + input + " too, should be another file");
   }

@@ -23,7 +23,7 @@ Four Load(const int16_t* values) {
 void Store(int16_t* entries, Four four) { std::memcpy(entries, &four, sizeof(four)); }
 
 // FFT entry i receives complex value r of the frame, the four base-4 digits of i in reverse order,
-// and 0 where r lies past the frame's 200 values. The middle digits say which values go where; then
+// and 0 where r lies past the frame's 200 values. The middle digits select the values; then
 // the outer ones make a transposition of 4 x 4: r = 64 d + low + a goes to i = 64 a + middle + d.
 void LoadDigitReversed(const int16_t* frame, int16_t* entries) {
   constexpr size_t kValues = kFrameSamples / 2;

@@ -251,7 +251,7 @@ bool Hub::RequestClockRate(uint32_t request) {
 }
 
 void Hub::RunQueue() {
-  // One event at a time: a log handler, say, runs inside the nanoapp and must not send.
+  // One event at a time: a log handler runs inside the nanoapp and must not send.
   QZ_HUB_REQUIRE(!in_nanoapp_);
   while (!queue_.empty()) {
     const QueuedEvent queued = std::move(queue_.front());

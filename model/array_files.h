@@ -7,7 +7,7 @@
 
 namespace qz::model {
 
-// An .npz archive that holds for every table, w6 say:
+// An .npz archive that holds for every table, for example w6:
 //   w6.weight  int8 [taps][inputs][outputs]; without taps where there is one; depthwise
 //              [taps][channels]
 //   w6.bias    int32 [outputs], as in LayerArrays

@@ -1,6 +1,6 @@
 // The runtime as a nanoapp sees it: API 1.9, the subset that this nanoapp uses. Declarations only;
-// a hub implements the functions, and a device vendor's own header of the same name can stand in
-// for this one.
+// a hub implements the functions, and a device vendor's own header of the same name can replace
+// this one.
 //
 // The runtime calls a nanoapp's entry points and free callbacks on one thread, one at a time. Times
 // are unsigned nanoseconds. Strings are NUL-terminated.

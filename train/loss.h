@@ -22,7 +22,7 @@ double ClipLoss(const Batch& logits, const Matrix& targets, const LossShape& sha
 
 // Half the square of every logit's distance from the teachers' mean logit, which is clamped to -6
 // to 6: sum over windows and classes, divided by `divisor` and the windows of a sequence, and its
-// gradient. The cross-entropy of the logistics would hardly tell confident scores apart, whose
+// gradient. The cross-entropy of the logistics would hardly separate confident scores, whose
 // order matters.
 double DistillationLoss(const Batch& logits, const Batch& distillation_targets, float divisor,
                         Batch* dlogits);

@@ -1,6 +1,5 @@
 // What the compiler and nanopb's library expect of a C and C++ run-time library and a nanoapp does
-// not have. Part of the module alone: linked into a program, these would take the place of the real
-// ones.
+// not have. Part of the module alone: linked into a program, these would replace the real ones.
 
 #include <cstddef>
 #include <cstdint>

@@ -69,7 +69,8 @@ class DynamicVectorBase {
   size_t capacity_ = 0;
 };
 
-// A growing array of plain values on the runtime's heap. Storage never shrinks before destruction.
+// A growing array of trivially copyable values on the runtime's heap. Storage never shrinks
+// before destruction.
 template <typename T>
 class DynamicVector : public DynamicVectorBase {
   static_assert(std::is_trivially_copyable_v<T> && std::is_trivially_destructible_v<T>);

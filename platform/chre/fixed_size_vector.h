@@ -5,8 +5,8 @@
 
 namespace chre {
 
-// A vector of at most `kCapacity` elements that lie in the object itself. Elements are plain
-// values: trivially copyable, so that nothing runs when they are moved or dropped. Indices must be
+// A vector of at most `kCapacity` elements that lie in the object itself. Elements are
+// trivially copyable, so that nothing runs when they are moved or dropped. Indices must be
 // below size().
 template <typename T, size_t kCapacity>
 class FixedSizeVector {

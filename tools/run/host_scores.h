@@ -29,7 +29,7 @@ class HostScores {
   void Pass(const int16_t* samples, size_t count, uint64_t now_ns,
             const std::optional<hub::SoundReport>& report);
 
-  // At most one sentence.
+  // At most one message.
   const std::vector<std::string>& faults() const { return faults_; }
 
  private:
