@@ -81,6 +81,9 @@ endif
 	cmake --preset host-asan
 	cmake --build --preset host-asan --parallel $(JOBS)
 	ctest --preset host-asan
+	cmake --preset other-detector
+	cmake --build --preset other-detector --parallel $(JOBS)
+	ctest --preset other-detector
 
 # What a developer runs after every change, on a build with asserts.
 check:

@@ -18,7 +18,9 @@ namespace qz::detector {
 namespace {
 
 constexpr size_t kDetectors = 8;
-constexpr size_t kSamples = 100000;  // 622 frames, 4 network runs
+constexpr size_t kSamples = 100000;
+constexpr size_t kFrames = 1 + (kSamples - config::kFrameSamples) / config::kHopSamples;
+constexpr int kRuns = 1 + (kFrames - config::kWindowFrames) / config::kFramesBetweenRuns;
 
 const model::PackedModel& Model(size_t number) {
   static const model::PackedModel models[] = {model::MakeSyntheticModel(1),
@@ -71,7 +73,7 @@ class ManyDetectors : public testing::Test {
       streams_.emplace_back(i);
       Stream alone(i);
       alone.PlayAll();
-      EXPECT_EQ(alone.runs, 4);
+      EXPECT_EQ(alone.runs, kRuns);
       expected_.push_back(alone.output);
     }
     EXPECT_EQ(std::set(expected_.begin(), expected_.end()).size(), kDetectors);

@@ -55,10 +55,13 @@ TEST(ClipScores, EqualTheReferenceOfEachWindow) {
     const std::vector<uint16_t> features = dataset::FeaturesOf(sound.data(), sound.size());
     uint64_t digest = base::kEmptyDigest;
     Scores max{};
-    ASSERT_EQ(scores.runs.size(), 4u);
-    for (size_t run = 0; run < 4; ++run) {
-      const Scores expected =
-          ReferenceRun(*packed, features.data() + run * 64 * config::kFeatureChannels, &digest);
+    const size_t frames = features.size() / config::kFeatureChannels;
+    ASSERT_EQ(scores.runs.size(),
+              1 + (frames - config::kWindowFrames) / config::kFramesBetweenRuns);
+    for (size_t run = 0; run < scores.runs.size(); ++run) {
+      const Scores expected = ReferenceRun(
+          *packed, features.data() + run * config::kFramesBetweenRuns * config::kFeatureChannels,
+          &digest);
       EXPECT_EQ(scores.runs[run], expected) << "run " << run;
       for (size_t i = 0; i < max.size(); ++i) max[i] = std::max(max[i], expected[i]);
     }
@@ -85,7 +88,8 @@ TEST(ClipScores, TwoRunsOrMoreSeeTheLastSample) {
     ASSERT_GE(played, samples);
     size_t seeing = 0;
     size_t before_last_buffer = 0;
-    for (size_t frames = 382; detector::SamplesOf(frames) <= played; frames += 64) {
+    for (size_t frames = config::kWindowFrames; detector::SamplesOf(frames) <= played;
+         frames += config::kFramesBetweenRuns) {
       seeing += detector::SamplesOf(frames) >= samples;
       before_last_buffer +=
           detector::SamplesOf(frames) >= samples && detector::SamplesOf(frames) <= played - 32000;

@@ -83,7 +83,7 @@ TEST(FloatNetwork, GradientOfEveryLayerIsItsSlope) {
     MatrixView direction = WeightOf(gradient, i);
     const double square = Dot(direction, direction);
     ASSERT_GT(square, 0) << "layer " << i;
-    const float step = static_cast<float>(2e-3 / std::sqrt(square));
+    const float step = static_cast<float>(1e-3 / std::sqrt(square));
     const double slope = (loss_at(direction, WeightOf(parameters, i), step) -
                           loss_at(direction, WeightOf(parameters, i), -step)) /
                          static_cast<double>(2 * step);
