@@ -30,7 +30,7 @@ void CatchInterrupt() {
   action.sa_flags = SA_RESETHAND;
   sigaction(SIGINT, &action, nullptr);
   sigaction(SIGTERM, &action, nullptr);
-  // Who had it ignored wants the program to outlive its terminal.
+  // If it was ignored at the start, the program is to outlive its terminal.
   struct sigaction before = {};
   sigaction(SIGHUP, nullptr, &before);
   if (before.sa_handler != SIG_IGN) sigaction(SIGHUP, &action, nullptr);

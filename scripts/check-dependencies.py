@@ -27,7 +27,7 @@ GENERATED = {
 # The runtime's headers keep the runtime's names: a vendor's own can replace them.
 PLATFORM = "platform"
 ANYTHING = "anything"
-# Below these numbers the check has not seen the tree that it is made for.
+# With fewer, the check was given something else than the whole tree.
 MIN_FILES = 100
 MIN_INCLUDES = 300
 

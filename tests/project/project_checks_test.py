@@ -27,7 +27,7 @@ class Dependencies(unittest.TestCase):
         with tempfile.TemporaryDirectory() as folder:
             root = pathlib.Path(folder)
             (root / "ARCHITECTURE.md").write_text(page)
-            # Many enough for the check to believe that it has seen a tree.
+            # Above the check's minimum of files and includes.
             many = {f"low/{i}.cc": '#include "low/a.h"\n' * 3 for i in range(100)}
             for name, content in {**many, "low/a.h": "", "other/a.h": "", "platform/chre.h": "", **files}.items():
                 (root / name).parent.mkdir(parents=True, exist_ok=True)

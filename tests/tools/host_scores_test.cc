@@ -73,7 +73,7 @@ TEST_F(RulesFile, GivesEachClassItsLineInAnyOrder) {
   }
 }
 
-TEST_F(RulesFile, WhatIsWrongIsOneLineWithItsPlace) {
+TEST_F(RulesFile, RefusesWithFileAndLine) {
   const std::pair<std::string, std::string> cases[] = {
       {"", "t: no line for the class 'dog_bark'"},
       {"class threshold cooling_s\n", "t: line 1: the first line should be: class, threshold"},
@@ -125,7 +125,7 @@ TEST(HostScoresFormat, MarksScoresAsTheToolsAndPaintsThemOnTerminals) {
               AllOf(HasSubstr("\x1b[1;33mbaby cry"), HasSubstr("\x1b[90mrooster")));
 }
 
-TEST(HostScoresFormat, NamesStandBesideCodesWhereThereAreAny) {
+TEST(HostScoresFormat, PrintsNamesBesideKnownCodes) {
   hub::SoundReport report;
   report.results = {{6, 0.5f}, {7, 0.5f}};
   EXPECT_THAT(MakeTextFormat({}, kLabels)->Report(257, report),

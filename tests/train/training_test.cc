@@ -168,7 +168,7 @@ TEST(Augmentation, JoinsLabelsAndStaysInRange) {
 }
 
 // As a clip is measured: from a fresh start, with its first sample.
-TEST(Augmentation, BeginsWithTheClipWhereTheRecipeSaysSo) {
+TEST(Augmentation, StartsAtTheClipIfTheRecipeSetsIt) {
   Recipe recipe = ShortRecipe();
   recipe.start_share = 1;
   recipe.min_gain = recipe.max_gain = 0;

@@ -1,4 +1,4 @@
-// Which implementations are chosen, compared with what the compiler's own library knows of the
+// Which implementations are chosen, compared with what the compiler's own library detects of the
 // processor.
 
 #include "kernels/x86_64/choice.h"
