@@ -14,6 +14,7 @@
 ROW(window,            "windowing",               neon,      avx2,           avx2,           orra_s16_window_shift12_ukernel__neon_x32) \
 ROW(peak,              "peak of magnitudes",      reference, reference_avx2, reference_avx2, orra_s16_rmaxabs_ukernel__neon_x32) \
 ROW(left_shift,        "left shift",              reference, reference_avx2, reference_avx2, orra_i16_vlshift_ukernel__neon_x32) \
+ROW(fft_load,          "FFT, input order",       neon,      avx2,           avx2,           orra_cs16_digitreverse_ukernel__neon_x16) \
 ROW(fft_butterflies,   "FFT, first stage",        neon,      avx2,           avx2,           orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4) \
 ROW(fft_butterflies,   "FFT, second stage",       neon,      avx2,           avx2,           orra_cs16_bfly4_samples4_ukernel__neon) \
 ROW(fft_butterflies,   "FFT, later stages",       neon,      avx2,           avx2,           orra_cs16_bfly4_ukernel__neon_x4) \

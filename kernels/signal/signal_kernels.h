@@ -37,6 +37,11 @@ void orra_s16_rmaxabs_ukernel__neon_x32(size_t bytes, const int16_t* input, uint
 void orra_i16_vlshift_ukernel__neon_x32(size_t count, const int16_t* input, int16_t* output,
                                         uint32_t shift);
 
+// Input order of a radix-4 FFT of 256 complex entries. Entry i of output receives value r of input,
+// the four base-4 digits of i in reverse order, or 0 where r is `count` or more. count is a
+// multiple of 4 from 192 to 256.
+void orra_cs16_digitreverse_ukernel__neon_x16(size_t count, const int16_t* input, int16_t* output);
+
 // Radix-4 butterflies of a forward decimation-in-time FFT, in place. Inputs x0 to x3 and twiddles
 // w1 to w3 (Q15, 32767 = 1.0) become, with xm' = (xm * 8191 + 16384) >> 15 (about xm/4) on each
 // part and am = xm' * wm, each part (... + 16384) >> 15,

@@ -42,6 +42,11 @@ void orra_i16_vlshift_ukernel__neon_x32(size_t count, const int16_t* input, int1
   choice.Get().orra_i16_vlshift_ukernel__neon_x32(count, input, output, shift);
 }
 
+void orra_cs16_digitreverse_ukernel__neon_x16(size_t count, const int16_t* input, int16_t* output) {
+  qz::Require(count >= 192 && count <= 256 && count % 4 == 0);
+  choice.Get().orra_cs16_digitreverse_ukernel__neon_x16(count, input, output);
+}
+
 void orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4(size_t butterflies, size_t quarter_bytes,
                                                            int16_t* data, const int16_t* twiddles,
                                                            size_t twiddle_stride) {

@@ -8,6 +8,7 @@ namespace qz::test {
 namespace {
 
 QZ_IMPLEMENTATIONS(kWindow, Signal, orra_s16_window_shift12_ukernel__neon_x32);
+QZ_IMPLEMENTATIONS(kDigitReverse, Signal, orra_cs16_digitreverse_ukernel__neon_x16);
 QZ_IMPLEMENTATIONS(kFirstStage, Signal, orra_cs16_bfly4_samples1_ukernel__asm_aarch32_neon_x4);
 QZ_IMPLEMENTATIONS(kSecondStage, Signal, orra_cs16_bfly4_samples4_ukernel__neon);
 QZ_IMPLEMENTATIONS(kLaterStage, Signal, orra_cs16_bfly4_ukernel__neon_x4);
@@ -39,6 +40,13 @@ std::string CompareWindow(CaseRandom& random) {
   return Difference(random, kWindow, out_contents, [&](auto window, int16_t* out) {
     window(rows, 2 * count, in, weights, out, shift);
   });
+}
+
+std::string CompareDigitReverse(CaseRandom& random) {
+  const size_t count = 4 * random.Pick("count / 4", 48, 64);
+  const int16_t* in = Location(random, Samples(random, 2 * count));
+  return Difference(random, kDigitReverse, RandomValues<int16_t>(random, 512),
+                    [&](auto load, int16_t* out) { load(count, in, out); });
 }
 
 std::string CompareFirstStage(CaseRandom& random) {
@@ -159,6 +167,7 @@ constexpr std::array<T, 48> Scattered(int bits) {
 // widths, which are the front end's, and for channels of 0, for which the references have less
 // to do.
 int16_t samples[514];
+int16_t spectrum[2 * 256];
 int16_t table[2 * 256];
 uint16_t weights[2 * 237];
 uint32_t levels[237], noise[48], roots[48];
@@ -178,6 +187,8 @@ std::vector<Kernel> SignalKernels() {
        [](Side side) { kWindow.of[side](1, 800, samples, table, samples, 12); }},
       {"orra_s16_rmaxabs_ukernel__neon_x32"},
       {"orra_i16_vlshift_ukernel__neon_x32"},
+      {kDigitReverse.name, CompareDigitReverse,
+       [](Side side) { kDigitReverse.of[side](200, samples, spectrum); }},
       {kFirstStage.name, CompareFirstStage,
        [](Side side) { kFirstStage.of[side](64, 0, samples, nullptr, 0); }},
       {kSecondStage.name, CompareSecondStage,

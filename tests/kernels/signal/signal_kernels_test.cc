@@ -51,6 +51,18 @@ TEST(LeftShift, WrapsAndWorksDownwardsInItsOwnInput) {
   }
 }
 
+TEST(FftLoad, ReversesTheDigitsOfTheIndexAndPadsWithZeros) {
+  Samples input(2 * 200), output(2 * 256 + 1, 99);
+  std::iota(input.begin(), input.end(), int16_t{1});
+  orra_cs16_digitreverse_ukernel__neon_x16(200, input.data(), output.data());
+  for (int i = 0; i < 256; ++i) {
+    const int r = i % 4 * 64 + i / 4 % 4 * 16 + i / 16 % 4 * 4 + i / 64;
+    EXPECT_EQ(output[2 * i], r < 200 ? 2 * r + 1 : 0) << i;
+    EXPECT_EQ(output[2 * i + 1], r < 200 ? 2 * r + 2 : 0) << i;
+  }
+  EXPECT_EQ(output[512], 99);
+}
+
 using Step = decltype(orra_cs16_bfly4_ukernel__neon_x4);
 
 void Split(size_t units, size_t, int16_t* data, const int16_t* twiddles, size_t) {
