@@ -14,7 +14,7 @@ namespace qz::audio {
 // nearest (ties to even) and saturated. A frame at 16 kHz, mono, with n / 32768 gives exactly n.
 class SampleConverter {
  public:
-  // Both as a sound file may have them: 1000 to 768000 Hz, 1 to 64 channels.
+  // Both within the limits of pcm_format.h.
   SampleConverter(int rate_hz, int channels);
 
   // Appends to `*samples` what `count` interleaved frames (finite, full scale ±1) give so far.

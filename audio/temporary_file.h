@@ -2,6 +2,7 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
 #include <string>
 
 #include "base/file_descriptor.h"
@@ -31,7 +32,13 @@ class NamedTemporaryFile {
 
 void WriteToTemporaryFile(const base::FileDescriptor& file, const void* bytes, size_t count);
 
-// Throws AudioError with what errno says: "NAME: WHAT: Reason".
+// A file without a name, at its beginning, with the bytes `head` and all that can still be read
+// from `source`, whose name in messages is `name`: `max_bytes` at most.
+base::FileDescriptor CopyToTemporaryFile(const std::string& name,
+                                         const base::FileDescriptor& source,
+                                         const std::string& head, uint64_t max_bytes);
+
+// Throws AudioError with the meaning of errno: "NAME: WHAT: Reason".
 [[noreturn]] void ThrowSystemError(const std::string& name, const char* what);
 
 }  // namespace qz::audio

@@ -7,12 +7,10 @@
 #include <cstdint>
 
 #include "audio/mpeg_frames.h"
+#include "audio/stream_header.h"
 
 namespace qz::audio {
 namespace {
-
-// Programs that write to a pipe state a size near 2^31 or 2^32 for "until the end".
-constexpr uint32_t kUntilTheEnd = 0x7FFF0000;
 
 // More chunks than any real file has before its audio.
 constexpr int kMaxChunks = 10000;

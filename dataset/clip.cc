@@ -8,7 +8,7 @@ namespace qz::dataset {
 
 std::vector<int16_t> ReadClip(const std::string& path) {
   constexpr size_t kBlockSamples = 32000;
-  const std::unique_ptr<audio::AudioInput> input = audio::OpenAudio(path, /*raw=*/false);
+  const std::unique_ptr<audio::AudioInput> input = audio::OpenAudio(path);
   std::vector<int16_t> samples;
   size_t held = 0;
   size_t got = 0;

@@ -3,14 +3,17 @@
 
 #include "audio/audio_input.h"
 
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <cmath>
 #include <limits>
+#include <utility>
 #include <vector>
 
+#include "audio/temporary_file.h"
 #include "tests/support/random.h"
 #include "tests/support/sound_folder.h"
 
@@ -20,6 +23,7 @@ namespace {
 using testing::AllOf;
 using testing::HasSubstr;
 using testing::Not;
+using testing::StartsWith;
 
 constexpr int kWav16 = SF_FORMAT_WAV | SF_FORMAT_PCM_16;
 constexpr int kWavFloat = SF_FORMAT_WAV | SF_FORMAT_FLOAT;
@@ -28,7 +32,8 @@ constexpr int kOgg = SF_FORMAT_OGG | SF_FORMAT_VORBIS;
 constexpr int kMp3 = SF_FORMAT_MPEG | SF_FORMAT_MPEG_LAYER_III;
 
 // In odd amounts, so that block borders fall anywhere.
-std::vector<int16_t> ReadFile(const std::string& path, bool raw = false) {
+std::vector<int16_t> ReadFile(const std::string& path,
+                              const std::optional<PcmFormat>& raw = std::nullopt) {
   const auto input = OpenAudio(path, raw);
   std::vector<int16_t> all;
   std::vector<int16_t> part(1237);
@@ -38,7 +43,7 @@ std::vector<int16_t> ReadFile(const std::string& path, bool raw = false) {
   return all;
 }
 
-std::string ErrorOf(const std::string& path, bool raw = false) {
+std::string ErrorOf(const std::string& path, const std::optional<PcmFormat>& raw = std::nullopt) {
   try {
     ReadFile(path, raw);
   } catch (const AudioError& error) {
@@ -69,8 +74,8 @@ TEST_F(AudioInputTest, Mono16BitAt16KhzPassesThroughBitForBit) {
   auto samples = test::Random(1).Fill<int16_t>(20001, -32768, 32767);
   EXPECT_EQ(ReadFile(WriteSound("a.wav", kWav16, 16000, 1, samples)), samples);
   EXPECT_EQ(ReadFile(WriteSound("a.flac", kFlac16, 16000, 1, samples)), samples);
-  EXPECT_EQ(ReadFile(WriteRaw("a.raw", samples), true), samples);
-  EXPECT_EQ(OpenAudio(Path("a.wav"), false)->Description(),
+  EXPECT_EQ(ReadFile(WriteRaw("a.raw", samples), PcmFormat()), samples);
+  EXPECT_EQ(OpenAudio(Path("a.wav"))->Description(),
             Path("a.wav") + ": 16000 Hz, 1 channel, 16 bits, taken as it is");
 }
 
@@ -82,7 +87,7 @@ TEST_F(AudioInputTest, ChannelsAreAveraged) {
   const std::vector<int16_t> three = {32767, 32767, 32767, 3, 0, 0, -32768, -32768, -32765};
   const std::string path = WriteSound("three.wav", kWav16, 16000, 3, three);
   EXPECT_EQ(ReadFile(path), (std::vector<int16_t>{32767, 1, -32767}));
-  EXPECT_THAT(OpenAudio(path, false)->Description(), HasSubstr("3 channels, mixed down to mono"));
+  EXPECT_THAT(OpenAudio(path)->Description(), HasSubstr("3 channels, mixed down to mono"));
 }
 
 TEST_F(AudioInputTest, FloatsSaturateAndRoundToEven) {
@@ -91,7 +96,7 @@ TEST_F(AudioInputTest, FloatsSaturateAndRoundToEven) {
   const std::string path = WriteSound("f.wav", kWavFloat, 16000, 1, values);
   EXPECT_EQ(ReadFile(path),
             (std::vector<int16_t>{32767, 32767, -32768, -32768, 0, 2, -1, 32766, -2}));
-  EXPECT_THAT(OpenAudio(path, false)->Description(), HasSubstr("rounded to 16 bits"));
+  EXPECT_THAT(OpenAudio(path)->Description(), HasSubstr("rounded to 16 bits"));
 }
 
 TEST_F(AudioInputTest, ResamplingKeepsToneLevelAndLength) {
@@ -99,7 +104,7 @@ TEST_F(AudioInputTest, ResamplingKeepsToneLevelAndLength) {
     SCOPED_TRACE(rate_hz);
     const auto tone = Tone(1000, rate_hz, 3, 12000);
     const std::string path = WriteSound("tone.wav", kWav16, rate_hz, 1, tone);
-    const auto input = OpenAudio(path, false);
+    const auto input = OpenAudio(path);
     EXPECT_EQ(input->ExpectedSamples(), 48000u);
     EXPECT_THAT(input->Description(), HasSubstr(" Hz, 1 channel, resampled to 16000 Hz mono"));
     const auto samples = ReadFile(path);
@@ -128,8 +133,8 @@ TEST_F(AudioInputTest, UnusableFilesAreNamedInOneLine) {
       {WriteBytes("text.wav", std::string(5000, 'x')), "not a readable sound file: "},
       {cut("head.wav", kWav16, 44), "no audio: truncated: the header promises 60000 bytes"},
       {cut("head.ogg", kOgg, 3000), "no audio: truncated: its last Ogg page is cut off"},
-      {WriteSound("slow.wav", kWav16, 999, 1, noise), "999 Hz, should be 1000 to 768000"},
-      {WriteSound<int16_t>("wide.wav", kWav16, 16000, 65, {}), "65 channels, should be 1 "},
+      {WriteSound("slow.wav", kWav16, 999, 1, noise), "999 Hz, expected 1000 to 768000"},
+      {WriteSound<int16_t>("wide.wav", kWav16, 16000, 65, {}), "65 channels, expected 1 "},
       {WriteSound("nan.wav", kWavFloat, 16000, 2, frames),
        "frame 9000, channel 1: the sample is not a number"},
       {WriteSound<float>("infinite.wav", kWavFloat, 16000, 1, {0, 0, 0, 0, -HUGE_VALF}),
@@ -139,13 +144,13 @@ TEST_F(AudioInputTest, UnusableFilesAreNamedInOneLine) {
     EXPECT_THAT(ErrorOf(path),
                 AllOf(HasSubstr(path + ": "), HasSubstr(wrong), Not(HasSubstr("\n"))));
   }
-  EXPECT_EQ(ErrorOf(WriteBytes("odd.raw", "abcde"), true),
+  EXPECT_EQ(ErrorOf(WriteBytes("odd.raw", "abcde"), PcmFormat()),
             Path("odd.raw") + ": ends after 5 bytes, in the middle of a 16-bit sample");
 }
 
 // What a file gives before its error, and the error.
 std::pair<size_t, std::string> ReadToError(const std::string& path) {
-  const auto input = OpenAudio(path, false);
+  const auto input = OpenAudio(path);
   std::vector<int16_t> part(1000);
   size_t total = 0;
   try {
@@ -213,29 +218,160 @@ TEST_F(AudioInputTest, OggPagesAndMpegFramesShowWhereAFileWasCut) {
               HasSubstr("truncated: its last MPEG frame is cut off"));
 }
 
-TEST_F(AudioInputTest, WavOfUnknownLengthGoesToTheEnd) {
-  // As written to a pipe: the size of the audio is a guess near 2^31 or 2^32.
-  const char bytes[] =
-      "RIFF\xFF\xFF\xFF\xFFWAVEfmt \x10\0\0\0\x01\0\x01\0\x80\x3E\0\0\0\x7D\0\0\x02\0\x10\0"
-      "data\xFF\xFF\xFF\xFF\x01\0\xFE\xFF\x03\0";
-  const std::string path = WriteBytes("pipe.wav", {bytes, sizeof(bytes) - 1});
-  EXPECT_EQ(ReadFile(path), (std::vector<int16_t>{1, -2, 3}));
+// A stream that is written while it is read.
+class Pipe {
+ public:
+  Pipe() { EXPECT_EQ(pipe(ends_), 0); }
+  Pipe(const Pipe&) = delete;
+  Pipe& operator=(const Pipe&) = delete;
+  ~Pipe() {
+    close(ends_[0]);
+    End();
+  }
+
+  std::string path() const { return "/dev/fd/" + std::to_string(ends_[0]); }
+  void Write(const std::string& bytes) const {
+    ASSERT_EQ(write(ends_[1], bytes.data(), bytes.size()), static_cast<ssize_t>(bytes.size()));
+  }
+  void End() {
+    if (ends_[1] >= 0) close(std::exchange(ends_[1], -1));
+  }
+
+ private:
+  int ends_[2] = {-1, -1};
+};
+
+// What a program writes to a pipe, in which all of `bytes` have room.
+std::string StreamOf(Pipe* pipe, const std::string& bytes) {
+  pipe->Write(bytes);
+  pipe->End();
+  return pipe->path();
 }
 
-TEST_F(AudioInputTest, RawStreamsArriveInAnyPiecesOfWholeSamples) {
-  int ends[2];
-  ASSERT_EQ(pipe(ends), 0);
-  const auto input = OpenAudio("/dev/fd/" + std::to_string(ends[0]), true);
+// A WAV of 16 bits, mono at 16 kHz, that states `size` as that of its audio, little-endian.
+std::string Wav(const std::string& size, const std::string& audio) {
+  const char head[] =
+      "RIFF\xFF\xFF\xFF\xFFWAVELIST\x03\0\0\0abc\0fmt \x10\0\0\0\x01\0\x01\0\x80\x3E\0\0\0\x7D\0\0"
+      "\x02\0\x10\0data";
+  return std::string(head, sizeof(head) - 1) + size + audio;
+}
+
+TEST_F(AudioInputTest, WavOfUnknownLengthGoesToTheEndAndAStreamPlaysAsItComes) {
+  // As written to a pipe: the size of the audio is a guess near 2^31 or 2^32, or 0.
+  const std::string audio("\x01\0\xFE\xFF\x03\0", 6);
+  for (const uint32_t size : {0xFFFFFFFFu, 0x7FFFF000u, 0u, 6u}) {
+    SCOPED_TRACE(size);
+    const std::string wav = Wav({reinterpret_cast<const char*>(&size), 4}, audio);
+    if (size != 0) {
+      EXPECT_EQ(ReadFile(WriteBytes("pipe.wav", wav)), (std::vector<int16_t>{1, -2, 3}));
+    }
+    Pipe pipe;
+    pipe.Write(wav);
+    const auto input = OpenAudio(pipe.path());  // whose end is still to come
+    std::vector<int16_t> samples(10);
+    EXPECT_EQ(input->Read(samples.data(), 10), 3u);
+    EXPECT_THAT(samples, testing::ElementsAre(1, -2, 3, 0, 0, 0, 0, 0, 0, 0));
+    EXPECT_EQ(input->ExpectedSamples(), size == 6 ? 3u : 0u);
+    if (size != 6) pipe.End();
+    EXPECT_EQ(input->Read(samples.data(), 10), 0u);
+  }
+}
+
+TEST_F(AudioInputTest, RawSamplesArriveInAnyPiecesOfWholeOnes) {
+  Pipe pipe;
+  pipe.Write("abcdefghijklmnopq");
+  const auto input = OpenAudio(pipe.path(), PcmFormat());
   std::vector<int16_t> samples(100);
-  ASSERT_EQ(write(ends[1], "\x01\x02\x03", 3), 3);
+  EXPECT_EQ(input->Read(samples.data(), 100), 8u);
+  pipe.Write("r");
   EXPECT_EQ(input->Read(samples.data(), 100), 1u);
-  ASSERT_EQ(write(ends[1], "\x04\x05\x06", 3), 3);
-  EXPECT_EQ(input->Read(samples.data() + 1, 99), 2u);
-  close(ends[1]);
-  EXPECT_EQ(input->Read(samples.data() + 3, 97), 0u);
-  close(ends[0]);
-  samples.resize(3);
-  EXPECT_EQ(samples, (std::vector<int16_t>{0x0201, 0x0403, 0x0605}));
+  EXPECT_EQ(samples[0], 'q' + 256 * 'r');
+  pipe.End();
+  EXPECT_EQ(input->Read(samples.data(), 100), 0u);
+}
+
+TEST_F(AudioInputTest, StreamsAndHeaderlessSamplesGiveWhatFilesGive) {
+  const auto noise = test::Random(6).Fill<int16_t>(2 * 1000, -32768, 32767);
+  const struct {
+    std::string name;
+    int format;
+  } encodings[] = {{"u8", SF_FORMAT_PCM_U8},  {"s8", SF_FORMAT_PCM_S8},  {"s16", SF_FORMAT_PCM_16},
+                   {"s24", SF_FORMAT_PCM_24}, {"s32", SF_FORMAT_PCM_32}, {"f32", SF_FORMAT_FLOAT},
+                   {"f64", SF_FORMAT_DOUBLE}};
+  size_t raw_encodings = 0;
+  for (const auto& [name, format] : encodings) {
+    for (const int container : {SF_FORMAT_WAV, SF_FORMAT_WAVEX, SF_FORMAT_AU}) {
+      SF_INFO info = {0, 44100, 2, container | format, 0, 0};
+      if (sf_format_check(&info) == 0) continue;
+      const std::string path = WriteSound("a", container | format, 44100, 2, noise);
+      Pipe pipe;
+      const auto streamed = ReadFile(StreamOf(&pipe, Contents("a")));
+      EXPECT_GT(streamed.size(), 360u);
+      EXPECT_EQ(streamed, ReadFile(path)) << name << " " << container;
+    }
+    for (const bool big : {false, true}) {
+      PcmFormat raw;
+      raw.rate_hz = 44100;
+      raw.channels = 2;
+      if (!SetPcmEncoding(name + (name.size() == 2 ? "" : big ? "be" : "le"), &raw)) continue;
+      ++raw_encodings;
+      const int endian = big ? SF_ENDIAN_BIG : SF_ENDIAN_LITTLE;
+      const auto path = WriteSound("raw", SF_FORMAT_RAW | format | endian, 44100, 2, noise);
+      const int file_format = SF_FORMAT_AIFF | format;
+      EXPECT_EQ(ReadFile(path, raw), ReadFile(WriteSound("a", file_format, 44100, 2, noise)))
+          << PcmEncodingName(raw);
+    }
+  }
+  EXPECT_EQ(raw_encodings, PcmEncodingNames().size() + 2);  // two of them have no byte order
+
+  // What needs seeking is copied first.
+  for (const int format : {kFlac16, kOgg, SF_FORMAT_WAV | SF_FORMAT_ULAW}) {
+    const std::string path = WriteSound("a", format, 44100, 2, noise);
+    Pipe pipe;
+    EXPECT_EQ(ReadFile(StreamOf(&pipe, Contents("a"))), ReadFile(path)) << format;
+  }
+}
+
+TEST_F(AudioInputTest, UnusableStreamsAndFormatsAreNamedInOneLine) {
+  const std::string m4a(
+      "\0\0\0\x20"
+      "ftypM4A \0\0\0\0",
+      16);
+  const std::string aac("\xFF\xF1\x50\x80\x02\x1F\xFC\xDE\x02\0Lavc60", 16);
+  const std::pair<std::string, std::string> streams[] = {
+      {"", "empty: 0 bytes"},
+      {std::string(5000, 'x'),
+       "no header that is known in a stream; headerless samples need --raw"},
+      {Wav({"\x80\0\0\0", 4}, "1234567"),
+       "frame 3: truncated: the header promises 128 bytes of audio, the stream held 7"},
+      {Wav({"\x80\0\0\0", 4}, ""), "truncated: the header promises 128 bytes"},
+      {Wav({"\0\0\0\0", 4}, ""), "no audio: 0 frames"},
+      {"RIFF1234WAVEfmt \xFF\xFF\xFF\xFF", "not a readable sound file: "},
+      {m4a, "is MPEG-4 audio (m4a, mp4), which qz does not read; convert it: ffmpeg -i "},
+      {aac, "is AAC, which qz does not read; convert it: ffmpeg -i "},
+  };
+  for (const auto& [bytes, error] : streams) {
+    Pipe pipe;
+    EXPECT_THAT(ErrorOf(StreamOf(&pipe, bytes)),
+                AllOf(StartsWith("/dev/fd/"), HasSubstr(error), Not(HasSubstr("\n"))));
+  }
+  EXPECT_THAT(ErrorOf(WriteBytes("a 'b'.m4a", m4a)),
+              HasSubstr("ffmpeg -i '" + Path("a '\\''b'\\''.m4a") + "' -ac 1 -ar 16000 audio.wav"));
+  for (const std::string& head : {Wav("1234", ""), "fLaC" + m4a, "ID3\x04" + m4a, m4a}) {
+    EXPECT_THAT(ErrorOf(WriteBytes("a.raw", head), PcmFormat()),
+                HasSubstr("; --raw expects headerless samples"));
+  }
+  // A sample of -1 is no sync word of MPEG audio.
+  EXPECT_EQ(ErrorOf(WriteBytes("a.raw", "\xFF\xFF\xFF\xFB"), PcmFormat()), "no error");
+
+  Pipe pipe;
+  pipe.Write("abcdef");
+  EXPECT_THAT(
+      [&] {
+        CopyToTemporaryFile("a", base::FileDescriptor(open(pipe.path().c_str(), O_RDONLY)), "head",
+                            9);
+      },
+      testing::ThrowsMessage<AudioError>(HasSubstr("a: exceeds the 9 bytes")));
 }
 
 }  // namespace

@@ -46,6 +46,24 @@ TEST_F(QzProgram, ContainersComeThroughStandardInputToo) {
   EXPECT_THAT(out_, HasSubstr("1 passes, 1 reports"));
 }
 
+TEST_F(QzProgram, AStreamOfAnyFormatPlaysAsItComes) {
+  // 4 s of 8 kHz stereo, headerless and behind a header; the input stays open.
+  const std::string audio = "head -c 128000 " + Noise(8 * kSecond);
+  const std::string header =
+      R"(printf 'RIFF\xff\xff\xff\xffWAVEfmt \x10\0\0\0\1\0\2\0\x40\x1f\0\0\0\x7d\0\0\4\0\x10\0data\xff\xff\xff\xff')";
+  const std::string interrupted = "timeout --foreground -s INT 2 $QZ run --json ";
+  Run(interrupted + "--raw --rate 8000 --channels 2 --format s16le - < <(" + audio +
+      "; exec sleep 60) >" + Path("raw") + " & " + interrupted + "- < <(" + header + "; " + audio +
+      "; exec sleep 60) >" + Path("wav") + "; wait $!");
+  const std::string raw = Contents("raw");
+  EXPECT_THAT(raw, HasSubstr(R"("audio_s":4.0,"silence_appended_s":0.0)")) << err_;
+  const auto reports = [](const std::string& text) { return text.substr(0, text.find("speed")); };
+  EXPECT_EQ(reports(Contents("wav")), reports(raw));
+  EXPECT_EQ(Run("$QZ run --rate 8000 " + Path("raw")), 2);
+  EXPECT_EQ(Run("$QZ run --raw --format s17 " + Path("raw")), 2);
+  EXPECT_THAT(err_, HasSubstr("u8,s8,s16le,"));
+}
+
 TEST_F(QzProgram, NobodyNeedsToListen) {
   EXPECT_EQ(Run("$QZ --version && $QZ run --raw --host-clients 0 --client-nanoapps 0 " + Noise(1)),
             0);

@@ -136,7 +136,7 @@ base::ExitCode ProveCommand(const ProveOptions& options) {
     return base::kUsage;
   }
   try {
-    const std::unique_ptr<audio::AudioInput> input = audio::OpenAudio(options.file, /*raw=*/false);
+    const std::unique_ptr<audio::AudioInput> input = audio::OpenAudio(options.file);
     console.Message(input->Description());
     RawAudio audio;
     Decode(input.get(), &audio);

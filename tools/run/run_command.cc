@@ -92,7 +92,8 @@ base::ExitCode Run::Execute() {
   std::unique_ptr<audio::AudioInput> input;
   size_t first_samples = 0;
   try {
-    input = audio::OpenAudio(options_.file, options_.raw);
+    input = audio::OpenAudio(options_.file, options_.raw,
+                             [this](const std::string& line) { console_.Message(line); });
     // Before anything starts: audio that is bad from its beginning costs one line.
     first_samples = input->Read(chunker_.space(), chunker_.space_samples());
   } catch (const audio::AudioError& error) {
@@ -197,7 +198,7 @@ RunSummary Run::Summarise() const {
   return summary;
 }
 
-// The labels' codes must be those that the module tells, output by output.
+// The labels' codes must be those that the module reports, output by output.
 std::string Run::WrongLabels() const {
   const std::vector<uint32_t>& reported = printer_.categories();
   for (size_t i = 0; names_ && i < reported.size() && i < names_->size(); ++i) {
@@ -219,7 +220,7 @@ base::ExitCode Run::Conclude() {
   RunSummary summary = Summarise();
   summary.heap_blocks_held = hub_.heap().live_blocks();
   summary.faults = faults.size();
-  // The pace of the clock on the wall says nothing about speed.
+  // In real time, the wall clock decides the speed.
   if (!options_.real_time && wall_seconds_ > 0) {
     summary.speed = static_cast<double>(delivered_samples_) / audio::kSampleRateHz / wall_seconds_;
   }

@@ -1,8 +1,10 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 #include <string>
 
+#include "audio/pcm_format.h"
 #include "base/exit_code.h"
 #include "chre.h"
 #include "tools/run/report_format.h"
@@ -10,8 +12,8 @@
 namespace qz::tools {
 
 struct RunOptions {
-  std::string file;  // "-": standard input
-  bool raw = false;
+  std::string file;                     // "-": standard input
+  std::optional<audio::PcmFormat> raw;  // of headerless samples; none: the file has a header
   uint32_t host_clients = 1;
   uint32_t client_nanoapps = 1;
   chreLogLevel log_level = CHRE_LOG_WARN;
