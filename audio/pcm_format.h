@@ -22,7 +22,9 @@ struct PcmFormat {
   int sample_bytes = 2;  // 1 (the only size of kUnsigned) to 4; of kFloat 4 or 8
   bool big_endian = false;
 
-  size_t frame_bytes() const { return static_cast<size_t>(channels * sample_bytes); }
+  size_t frame_bytes() const {
+    return static_cast<size_t>(channels) * static_cast<size_t>(sample_bytes);
+  }
 };
 
 // "s16le" and the like: kind (u, s, f), bits, byte order. The names of all encodings.
