@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 # The commands of this project; CMake and its presets do the work.
 
 JOBS ?= $(shell nproc)

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "app/app_manager.h"
 
 #include "classifier/types/log_prefix.h"

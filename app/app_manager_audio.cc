@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The AppManager's microphone: found, requested while a client needs it, released with the last
 // one.
 

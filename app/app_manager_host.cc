@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The AppManager's host clients: requests, the map of clients, and what is broadcast to them.
 
 #include <cstring>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The module's own definitions of the two audio functions: bound to the runtime's at first use, so
 // that the module loads, and merely gets no audio, where the runtime has none.
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Arrays in NumPy's file format .npy, version 1.0: little-endian, C order, any rank.
 #pragma once
 

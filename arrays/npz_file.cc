@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "arrays/npz_file.h"
 
 #include <unzip.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Archives of named arrays, NumPy's .npz: a zip file that holds NAME.npy for every array.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What kind of sound file its first bytes are those of.
 #pragma once
 

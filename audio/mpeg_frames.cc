@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The frame header of MPEG audio is that of ISO/IEC 11172-3, its extension to lower rates that of
 // 13818-3; the information frame is a habit of encoders.
 

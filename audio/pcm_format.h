@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Samples without compression, as headerless files, WAV and AU hold them.
 #pragma once
 

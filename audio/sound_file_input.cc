@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "audio/sound_file_input.h"
 
 #include <algorithm>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The header of a stream that can't seek.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Temporary files, in the folder $TMPDIR or else /tmp.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // 64-bit FNV-1a, by which outputs are compared over builds and machines.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The errors that end a command. Each holds one line for the user, which names the file or value,
 // the location and what is expected; its type decides the exit code.
 #pragma once

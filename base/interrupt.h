@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Ctrl-C, a request to terminate and the loss of the terminal, as requests to end: the first of
 // each asks, a second one kills.
 #pragma once

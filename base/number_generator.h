@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Reproducible random numbers: integers and +, -, x only, so that a seed gives the same sequence on
 // every machine.
 #pragma once

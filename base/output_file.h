@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The one way in which programs write their output files.
 //
 // A regular or new file is written whole or not at all: into a temporary file of a unique name

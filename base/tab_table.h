@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Tables as text files: a line a row, fields with tabs between, headed by a line of column names.
 // Empty lines and lines that begin with # are skipped; line ends may be CRLF, and a byte-order mark
 // may come first.

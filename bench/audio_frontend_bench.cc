@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // One frame of the audio front end, from samples to features.
 
 #include <benchmark/benchmark.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Our own lines of the table of baselines (make bench-baselines): one run of the network, one FFT,
 // one frame of the front end, in the format that the baselines' programs print. `--parts` prints
 // each operator of the network instead.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Runs a frame, a run of the network, a pass and a whole audio event, each between two marks, for
 // the emulator's instruction counter on the device's processor; scripts/footprint makes averages of
 // them. Prints a line for each kind, in the order of the marks: its name and how many pairs of

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Replaces the library that asks the processor: the instruction set is fixed when this is compiled.
 
 #include "kernels/x86_64/processor.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A plug-in for qemu-arm that counts the instructions a program executes. The count is the same on
 // every machine and in every run.
 //

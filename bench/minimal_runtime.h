@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A runtime that does next to nothing, so that its own instructions and stack hardly count: for
 // programs that measure the module's components linked into them.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // One run of the network, input included: a run overwrites its input, so that every run needs it
 // anew.
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // One classification pass: two seconds of audio through the front end and the network.
 
 #include <benchmark/benchmark.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Every quantised kernel with the network's shapes. One iteration is one call as the network makes
 // it; the rate counts multiply-adds, or outputs where a kernel has none.
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // How long a piece of work takes on a machine that others use too: many short samples, of which the
 // 10th percentile is the work's own time.
 #pragma once

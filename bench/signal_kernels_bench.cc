@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Each signal kernel with the arguments of the audio front end.
 
 #include <benchmark/benchmark.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Measures what the module's entry points use of the stack: every call runs on a stack of its own
 // that was filled with a pattern before; the deepest byte that changed is how far it went. Prints a
 // line for each kind of call: its name, a tab, the most bytes that one of them used.

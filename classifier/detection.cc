@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The second half of AudioClassifier: from the network's scores to detections and the periodic
 // report.
 

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 # Toolchain of the device: ARMv8-A in AArch32 state with NEON, tuned for the Cortex-A35. Debian's cross
 # compiler, with the libraries that scripts/make-sysroot.sh has unpacked; what is built runs on this machine
 # under qemu-arm.

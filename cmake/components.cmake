@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 # How components are compiled: one target each. scripts/check-dependencies.py checks what they include.
 
 find_package(Python3 REQUIRED COMPONENTS Interpreter)

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What follows from the description of the detector, and what must hold of any.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The one description of this detector: timing, classes, versions and the network's operators. All
 // else follows from it (config/detector.h, config/network.h). A build of another detector puts
 // another file of this name in its place (QZ_DESCRIPTION_DIR).

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What follows from the description's rows of operators: shapes, offsets in the arena, receptive
 // fields, tiles of the matrix kernels.
 //

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What the description of a detector says of each operator of its network.
 #pragma once
 

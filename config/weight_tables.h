@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Where every bias, weight and scale of the packed model lies, as it follows from the description.
 //
 // A packed model is the tables of kTables one after the other, little-endian. A table is a row of

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "dataset/clip_features.h"
 
 #include "detector/feature_stream.h"

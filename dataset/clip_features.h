@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Features of recordings, as the module's front end makes them of its classifier's frames.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Lists of labelled recordings: tables of the columns file, class, fold (see base/tab_table.h).
 #pragma once
 

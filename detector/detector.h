@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A whole detector, as in the module: any number of them run in one program, on threads of their
 // own.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // From the network's scores to confidences and detections.
 #pragma once
 

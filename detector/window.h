@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The network's window out of frames of features, and its cadence.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A model's scores of a clip, by the module's own front end and network and at its classifier's
 // cadence. Each clip begins with a fresh start. May be called on any number of threads.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Metrics of a set of clips whose scores are known.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // How well scores separate the clips of a class from the others, for every threshold at once.
 //
 // `scores` and `positives` have one entry a clip: the score of the class, and whether the clip is

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What an evaluation comes to, in words and numbers.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The one static instance of the audio front end (frontend/frontend.h), as the module uses it.
 // Single-threaded.
 #pragma once

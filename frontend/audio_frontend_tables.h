@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Constant tables of the audio front end, generated from their rules by
 // make_audio_frontend_tables.py. They are named by the step of the graph that reads them.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The audio front end: turns a frame of 25 ms (400 samples at 16 kHz) into 48 log mel-filterbank
 // features with running noise suppression. A pure function over memory that the caller owns: any
 // number of streams, each with noise estimates and an arena of its own, on any threads. No

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Writes the constant tables of the audio front end: make_audio_frontend_tables.py OUTPUT.cc"""
 
 import math

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "frontend/real_fft.h"
 
 #include "frontend/audio_frontend.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The real FFT of the audio front end.
 #pragma once
 

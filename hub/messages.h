@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The messages between host or client nanoapps and the detector, encoded and decoded by the
 // official protobuf library: a second implementation beside the module's own.
 #pragma once

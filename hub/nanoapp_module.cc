@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "hub/nanoapp_module.h"
 
 #include <dlfcn.h>

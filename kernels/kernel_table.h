@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Every kernel, and which of its implementations runs on which processor.
 //
 //   reference       SOURCE.cc in the component's folder: plain C++, which defines the results

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Preconditions of kernels, checked in every build but the device's. A failure ends the program
 // without a call, so that the module needs no import for it.
 #pragma once

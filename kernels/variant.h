@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The names of a kernel's implementations.
 //
 // A kernel is called by the name that its component's header declares. Where the build compiles an

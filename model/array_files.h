@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A model's arrays as a file: the form in which models go to and come from elsewhere.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The checker of packed models: what it passes drives the network within its contracts.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The detector's description for scripts, as JSON.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The classes of the five outputs. The module has only their codes; the names are in a small file
 // beside the model.
 #pragma once

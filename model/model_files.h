@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Packed models on disk and as a C++ header.
 #pragma once
 

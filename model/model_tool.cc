@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // qz-model-tool: makes, checks and embeds packed models.
 
 #include "base/program.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Between a model's plain arrays, as a trainer holds them, and its packed tables.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A reference evaluation of the network from a packed model: bit-exact with the module's graph,
 // sharing the description's operators with it but no arithmetic. Clear rather than fast (some
 // milliseconds a run).

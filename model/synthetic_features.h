@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Feature windows that look like audio, without any: what the synthetic model is calibrated on.
 #pragma once
 

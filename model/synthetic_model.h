@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A synthetic model in place of a trained one: valid, and with scores that follow the features, but
 // trained for nothing.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A packed model in memory: its bytes, and where in them the description's tables have their values
 // (config/weight_tables.h).
 #pragma once

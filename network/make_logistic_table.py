@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """Writes w19, the network's logistic function as a table over int8.
 
 Usage: make_logistic_table.py DESCRIPTION OUTPUT

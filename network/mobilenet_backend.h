@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The network over the module's one static arena and the weights that were built in: a shell with C
 // linkage over network/network.h. Not reentrant.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The classifier's network: feature frames in, a score a class out. One-dimensional convolutions
 // over time shrink the window to one row; two fully connected layers and a logistic function make
 // scores of it. Its operators are those of the detector's description (config/network.h).

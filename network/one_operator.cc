@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Apart from the run of all operators, which is all that the module needs.
 
 #include <cassert>

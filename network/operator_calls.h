@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // One operator of the network as calls of a kernel, and the lists by which kernels find their rows.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The runtime as a nanoapp sees it: API 1.9, the subset that this nanoapp uses. Declarations only;
 // a hub implements the functions, and a device vendor's own header of the same name can replace
 // this one.

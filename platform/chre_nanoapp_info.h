@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The record by which a runtime's loader recognises a nanoapp: read from the module's exported
 // symbol
 // `_chreNslDsoNanoappInfo`. Little-endian; 56 bytes where pointers have 32 bits.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The vendor extension of the runtime that raises the processor clock while a nanoapp has work to
 // do.
 #ifndef QZ_PLATFORM_CHREX_H_

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "proto/sound_detection_proto_helper.h"
 
 #include <pb_decode.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Builds, encodes and decodes the messages of sound_detection.proto. No state; failures are logged
 // and reported as a null buffer or false.
 #pragma once

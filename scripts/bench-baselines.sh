@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Times our kernels and the libraries that others would use instead, in interleaved rounds, and prints one
 # table; then our operators and kernels one by one. All of it stays in build/host/baselines.
 #   bench-baselines.sh BASELINES      the folder with the programs of the baselines' setup.sh and run.sh

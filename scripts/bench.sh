@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Runs every benchmark of build/host, then measures `qz run` on an hour of recorded sound: as the
 # detector takes it, and as it must be decoded, mixed down and resampled.
 set -euo pipefail

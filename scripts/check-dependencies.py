@@ -1,4 +1,5 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
 """Compares every #include "..." of the tree with the table of dependencies in ARCHITECTURE.md.
 
 Usage: check-dependencies.py [--root FOLDER]

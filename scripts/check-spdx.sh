@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Checks that every source file names its licence in one line at its top.
 # Usage: scripts/check-spdx.sh [--fix]     --fix adds the line where it is missing
 set -euo pipefail

@@ -1,4 +1,5 @@
 #!/usr/bin/python3
+# SPDX-License-Identifier: Apache-2.0
 """Measures a random forest on averaged features by cross-validation: what the network's metrics are compared with.
 
 Usage: compare-with-forest.py FEATURES [LABELS]     (default model/labels.tsv)

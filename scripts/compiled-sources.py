@@ -1,4 +1,5 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
 """Lists the sources that builds compile, and writes their compile commands for clang-tidy.
 
 Usage: compiled-sources.py OUT BUILD...     writes OUT/compile_commands.json, prints the sources' absolute paths

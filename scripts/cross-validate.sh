@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Validates the recipe of the demonstration model: for each of the four folds of DATA a model trained on
 # the other three, all measured on the fold they were not trained on; then a simple reference on the same folds.
 # Usage: scripts/cross-validate.sh DATA

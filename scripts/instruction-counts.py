@@ -1,4 +1,5 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
 """Counts the instructions of a frame, a network run and a pass on a PC and compares them with the committed ones.
 
 Usage: instruction-counts.py [--update] [BUILD]     (default build/host)

@@ -1,4 +1,5 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
 """Prints how many instructions one call of each kernel takes, by the reference and by its variants.
 
 kernel-gains.py [BUILD [HOST_BUILD]], by default build/target and build/host: the former holds kernel_comparison_test,

@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Checks the formatting of all sources, and the rules of .clang-tidy on what is compiled.
 # Usage: scripts/lint.sh [--changed] BUILD...     the folders of builds, each configured and built
 # A file is checked as the first of the builds compiles it. --changed: only files that differ from the main branch,

@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Puts a clip of real recorded sound together from the sounds of two Debian packages: spoken words
 # among alarm, telephone, bell and camera sounds, 48 kHz stereo.
 # Usage: scripts/make-clip.sh OUT.wav

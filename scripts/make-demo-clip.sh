@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Puts a clip of real recorded sounds together that the detector should and should not know, from Debian
 # packages, and beside it a table of its sounds and their times. Prints the table.
 # Usage: scripts/make-demo-clip.sh OUT.wav        (the table: OUT.txt)

@@ -1,4 +1,5 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
 """Lists recordings, with their classes and folds, for qz eval, qz features and qz-train.
 
 Usage: make-manifest.py DATA [--extra DIR]... [-o FILE]     (without -o: to standard output)

@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Makes sounds that none of the classes answers to, out of what Debian packages offer: synthetic speech in
 # several voices (espeak-ng), the sounds and spoken words of a desktop (sound-theme-freedesktop), and recordings
 # of people, animals and things (scratch), as 16-bit mono WAV of 44.1 kHz. The same files each time. Left out is

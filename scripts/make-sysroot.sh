@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Unpacks the libraries that programs for the device's processor are built and run with, Debian's for
 # armhf, into a folder of their own. Nothing is installed on the machine, no root is needed, and what
 # else is installed does not matter.

@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Installs what is missing of the Debian packages that this project needs; silent when nothing is.
 # Usage: scripts/setup-debian.sh [build] [test] [sanitize] [clip] [demo] [train] [validation] [counts] [lint] [target]
 # No argument: all groups.

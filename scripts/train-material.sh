@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Lists what the demonstration model is trained on: the recordings of DATA, a folder of class folders whose
 # files begin with their fold, and sounds out of Debian packages as negatives.
 # Usage: scripts/train-material.sh DATA FOLDER     writes FOLDER/negatives/ and FOLDER/manifest.tsv

@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Makes the demonstration model out of the recordings of DATA and compares it with the committed one, which
 # it replaces only where UPDATE=1. A run that was stopped goes on where it was.
 # Usage: scripts/train.sh DATA

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The subcommands of qz. Each adds itself to the program: its name, its options, and what runs once
 // the command line is understood, whose exit code is then in *exit_code.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "tools/kernel_versions.h"
 
 #include "kernels/kernel_table.h"

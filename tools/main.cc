@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // qz: runs the sound event detector on a PC.
 
 #include <CLI/CLI.hpp>

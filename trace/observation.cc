@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The front end and the network of the linked nanoapp, observed: the linker hands the nanoapp's
 // calls of NAME to __wrap_NAME, and __real_NAME is the function itself.
 

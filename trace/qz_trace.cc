@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // qz-trace: plays a recording to the module and then to the same nanoapp linked into this program,
 // and writes a trace of both to standard output. Of both it shows what they log and send, and their
 // memory after each buffer; only of the linked one each frame and each operator.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A trace: what a nanoapp did with a recording, as a stream of records that ends in an end record.
 // A record is its kind (1 byte), number (4), type (4), time (8) and count of bytes (4), then the
 // bytes; all numbers are little-endian, whichever processor writes them.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Data augmentation: the same recording at another time, loudness and speed, mixed with others and
 // with noise; and features with another spectral tilt and with masks.
 #pragma once

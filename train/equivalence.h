@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The check that what was trained is what the device computes: the trainer's integer network and
 // the module's network give the same tensors, byte for byte.
 #pragma once

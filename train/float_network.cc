@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "train/float_network.h"
 
 #include "base/number_generator.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The network over float, in real units: what training begins with.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The network's operators over float, forwards and backwards. A backward function gets the gradient
 // of the loss by the operator's output and gives those by its weights (added to *dw) and its input
 // (written to *dx, unless null). Convolutions are valid: `taps` - 1 steps fewer come out.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // qz-train: trains models for the sound event detector from labelled recordings.
 //
 // Compiled for any processor, unlike the rest of the trainer: the options and the check of the

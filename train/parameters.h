@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // All parameters of a network in one vector, so that steps, averages and files treat them alike,
 // and views of a layer's share.
 #pragma once

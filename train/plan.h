@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The network as the trainer sees it: the description's operators with weights, in their order, and
 // the real units that the fixed factors of the device's arithmetic leave.
 //

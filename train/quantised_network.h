@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The network in the device's own arithmetic, bit for bit: all values are integers, held in floats
 // that are exact below 2^24, so that the same matrix products serve training and the equivalence
 // check.

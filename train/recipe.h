@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The settings of a training run, beside its recordings and its seed. A small text file.
 #pragma once
 

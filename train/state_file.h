@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A training run on disk, so that a stopped one continues as if it had not been stopped.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A training run: some networks over float, the teachers; then the model, which starts from the
 // first of them and is trained in the device's arithmetic on the mean of their logits
 // (distillation).

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The recordings that a model is trained and validated on.
 #pragma once
 

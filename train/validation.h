@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Scores and metrics of parameters on clips.
 #pragma once
 

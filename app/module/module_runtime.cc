@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What the compiler and nanopb's library expect of a C and C++ run-time library and a nanoapp does
 // not have. Part of the module alone: linked into a program, these would replace the real ones.
 

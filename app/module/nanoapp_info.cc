@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What a loader sees of the module: the record and the string that name it, its only exports.
 
 #include "app/nanoapp.h"

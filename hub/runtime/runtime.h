@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The implementation of the runtime's C functions on a PC. The functions are in a shared library,
 // as the module's loader expects, and forward to the one installed Runtime.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The runtime's two audio functions: a runtime may lack either.
 
 #include "chre.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The runtime's functions except audio: C linkage, looked up by the module at load.
 
 #include <cstdarg>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "kernels/precondition.h"
 #include "kernels/quantised/quantised_kernels.h"
 #include "kernels/variant.h"

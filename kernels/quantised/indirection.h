@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Row lists: arrays of row addresses, or of offsets that a call turns into addresses. Entries are
 // read as numbers, since an offset is no pointer until the base has been added.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The seven kernels of the int8 network. Every kernel is a pure function of its arguments and of
 // the memory they point to; none allocates or fails. Results are exact to the byte: the reference
 // implementations define them, and a variant for one processor has to equal them.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // From an int32 accumulator to an int8 output, in the two ways of the kernels. Internal linkage
 // throughout these helper headers: a kernel's source may be compiled again for another processor.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The three radix-4 butterfly stages of the complex FFT: they differ in where the entries and the
 // twiddles of a butterfly lie.
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The complex FFT's input in the order in which its first stage takes it.
 
 #include <cstring>

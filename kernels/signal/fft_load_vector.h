@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The digit-reversed load with vectors of four complex values, in the compiler's own vector types:
 // the variants for NEON and AVX2 are this code. Internal linkage: what is compiled for AVX2 must
 // not be linked to others.

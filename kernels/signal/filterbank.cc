@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Energies of overlapping triangular channels.
 
 #include "kernels/precondition.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Block normalisation of a frame.
 
 #include "kernels/precondition.h"

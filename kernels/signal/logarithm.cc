@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Table-driven natural logarithm in Q16.
 
 #include "kernels/signal/signal_kernels.h"

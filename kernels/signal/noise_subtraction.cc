@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Spectral subtraction of a slowly followed noise level, with a floor.
 
 #include <algorithm>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Squared magnitudes of complex bins.
 
 #include "kernels/precondition.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Fixed-point steps that several signal kernels share.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Fixed-point building blocks of the audio front end. The reference implementations define the
 // results: a variant for one processor equals them bit for bit.
 //

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Constant tables of the signal kernels, generated from their rules by make_signal_tables.py.
 #pragma once
 

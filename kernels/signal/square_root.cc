@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Integer square root of 64-bit values through the double-precision instruction.
 
 #include <cmath>

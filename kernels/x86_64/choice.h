@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The choice among implementations, made at the first call of any kernel of a component.
 #pragma once
 

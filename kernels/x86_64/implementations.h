@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The kernels' implementations on a PC: a struct of function pointers for each kind of processor,
 // as kernels/kernel_table.h has them.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "kernels/x86_64/processor.h"
 
 #include <cpuid.h>

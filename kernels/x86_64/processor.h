@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What the PC's processor can do, of what kernels have implementations for.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The signal kernels under their own names: each calls the implementation for this processor.
 
 #include "kernels/signal/signal_kernels.h"

@@ -1,4 +1,5 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
 """Measures what the module takes of the device and compares it with the committed page.
 
 Usage: footprint.py [--update] [--build FOLDER] [--counter FILE] [--page FILE]

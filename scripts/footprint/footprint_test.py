@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """The budget fails on what grows or cannot be measured, and names it."""
 
 import pathlib

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """The limits of sizes and costs, and where each comes from."""
 
 import json

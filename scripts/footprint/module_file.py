@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """The linked module as the binary tools and the linker's map show it: sections, and how many bytes
 each component adds."""
 

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """The page of committed values: written, read back and compared here."""
 
 import re

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """What the module uses of the stack: measured under emulation by bench/stack_depth.cc, and the largest
 frame of each component as the compiler reports it (-fstack-usage)."""
 

@@ -1,4 +1,5 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
 """Rewrites the sections of docs/performance.md about one `make bench-baselines`, and its picture.
 
 Usage: performance.py FOLDER, which holds what bench-baselines.sh left there:

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 """The picture of docs/performance.md: which part of the processor's limit each kernel reaches, and where a pass goes."""
 
 from xml.sax.saxutils import escape

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The binding of the audio functions, against a dlsym of the suite's own (see CMakeLists.txt).
 
 #include <gtest/gtest.h>

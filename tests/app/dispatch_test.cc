@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Entry points, dispatch, the microphone and the client nanoapps.
 
 #include "tests/app/linked_nanoapp.h"

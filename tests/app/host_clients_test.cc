@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Host clients: requests, answers, the map of clients, and broadcasts.
 
 #include <set>

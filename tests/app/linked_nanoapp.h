@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The application on a hub, linked into the suite: with a network whose scores are chosen,
 // detection tables with low thresholds, and the hub's own audio functions.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Arrays and archives of arrays: what NumPy wrote comes back, what is written is what NumPy writes,
 // and what is damaged or not for us is refused.
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What comes out of sound files of all kinds, and the errors of those that can't be used or were
 // cut off.
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Output files: written whole or not at all, through links, into pipes, never over an input.
 
 #include "base/output_file.h"

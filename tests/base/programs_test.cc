@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What the programs share, run from a shell: their outputs, exit codes, --help and --version.
 
 #include <gmock/gmock.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Tables of text: what editors make of them, and what is refused.
 
 #include "base/tab_table.h"

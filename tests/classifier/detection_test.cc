@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // From scores to reports and detections: a network with chosen scores, tables with low thresholds.
 
 #include <cmath>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // How samples become frames and frames become windows: with a front end and a network that only
 // look on, and with the tables that the module ships with. One suite, one test: the streaming state
 // is set at load and never again.

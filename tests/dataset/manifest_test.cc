@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Lists of recordings: what they hold, and the messages about lists that can't be used.
 
 #include "dataset/manifest.h"

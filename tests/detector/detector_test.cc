@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Many detectors in one program, each with state and a model of its own, and the preconditions of
 // the framing.
 

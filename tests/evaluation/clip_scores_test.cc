@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Scores of clips against the reference network over windows of the clip's features.
 
 #include "evaluation/clip_scores.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // qz eval as a whole, run from a shell on a small set of noises.
 
 #include <gmock/gmock.h>

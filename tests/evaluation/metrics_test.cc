@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Metrics of sets of clips whose scores were made up.
 
 #include "evaluation/metrics.h"

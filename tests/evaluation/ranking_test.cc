@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Ranking metrics: values worked out by hand, and the definitions followed word by word.
 
 #include "evaluation/ranking.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The front end's features against the same analysis in double precision and against recorded ones,
 // its steps against a reference, and its noise estimates.
 

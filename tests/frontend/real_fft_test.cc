@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The real FFT against a DFT in double precision.
 
 #include "frontend/real_fft.h"

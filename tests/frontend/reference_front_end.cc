@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "tests/frontend/reference_front_end.h"
 
 #include <algorithm>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The front end evaluated step by step, each written from its definition in scalar arithmetic.
 #pragma once
 

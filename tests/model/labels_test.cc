@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The table of the classes that the outputs of a model detect.
 
 #include "model/labels.h"

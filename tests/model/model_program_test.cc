@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // qz model, run from a shell, and what it shows of tensors.
 
 #include <gmock/gmock.h>

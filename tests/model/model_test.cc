@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The checker's findings, the model tool's commands, the synthetic model, and the reference network
 // at the ends of its ranges; its ordinary results are compared with the module's network.
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Arrays without padding, packed and unpacked; and what they mean to the module's network.
 
 #include <gmock/gmock.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The network against its reference evaluation from the packed model, operator by operator.
 
 #include "network/mobilenet_backend.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The other detector's tables: one more class than the usual.
 
 #include "classifier/detection_tables.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Another detector, for tests: six classes over a shorter window. What the build takes in place of
 // config/detector_description.h (preset other-detector) shows that nothing else states these facts.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "chre/dynamic_vector.h"
 #include "tests/support/test_hub.h"
 

@@ -1,4 +1,5 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
 """Planted faults that the checks of the tree must find."""
 
 import pathlib

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "hub/messages.h"
 #include "proto/sound_detection_proto_helper.h"
 #include "tests/support/test_hub.h"

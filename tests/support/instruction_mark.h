@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Marks in a program's run, at which the emulator's instruction counter writes its count.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Detection tables with which things are detected; a suite that links them uses them instead of
 // the default.
 

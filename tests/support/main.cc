@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The main program of every suite: a suite that ran nothing has failed.
 
 #include <gtest/gtest.h>

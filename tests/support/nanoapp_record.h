@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The record of a nanoapp that a hub runs.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Reproducible fills for tests: the same numbers on every machine and library.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Random layers for the kernels of the network, which bring out their roundings and saturations.
 #pragma once
 

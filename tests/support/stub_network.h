@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A stub of the network: keeps the windows that it was given and returns chosen scores. A suite
 // that links it runs it instead of the real one.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A folder of one test's own, removed with it.
 #pragma once
 

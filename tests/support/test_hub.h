@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A hub with a record of its log and of what its clients receive; faults found at its end fail the
 // test.
 #pragma once

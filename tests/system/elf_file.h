@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A shared library as its loader reads it, of the processor and class that this program runs on.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The module as a loader sees it, read back from the file: what it exports and imports, its
 // record, what of it is constant, and that nothing runs at load.
 

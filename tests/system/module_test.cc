@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The whole system: the module, loaded as on a device, on a hub with several clients of both kinds.
 
 #include <set>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Kernels with a few faults, if the environment's FAULTY_KERNEL names them: a
 // logarithm for one input, and a max pool at one position of operator 7, from the third network run
 // on, whatever the model. Each prints where its first fault was.

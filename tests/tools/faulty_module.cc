@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A nanoapp that a hub must complain about. FAULTY_MAGIC is that of its record; it leaks a block at
 // its start, frees a block twice, and answers a client's registration with a broken report.
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A network that loses three of its five scores: those that no client is ever told.
 
 #include "network/mobilenet_backend.h"

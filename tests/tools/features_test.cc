@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What qz features writes is what the nanoapp itself computes; and its dealings with files.
 
 #include <gmock/gmock.h>

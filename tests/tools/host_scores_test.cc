@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Host-side scores: tables of thresholds, the detection rules, the output.
 
 #include <gmock/gmock.h>

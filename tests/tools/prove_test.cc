@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // qz prove on builds that are alike, on builds with deliberately faulty kernels, and on what is no
 // working build.
 

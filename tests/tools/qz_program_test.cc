@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The program qz as a whole, run from a shell: its output, its messages, its exit codes.
 
 #include "tests/tools/qz_program.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Traces of a few records: written, read, cut short, and compared with others that differ in one
 // value.
 

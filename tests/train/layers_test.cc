@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Every backward function against differences of its forward function.
 
 #include "train/layers.h"

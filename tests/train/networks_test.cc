@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The two networks as wholes: gradients, the folding between them, and the device's arithmetic.
 
 #include <gtest/gtest.h>

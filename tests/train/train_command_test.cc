@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // qz-train's two commands on files: what they write, what they skip, what they refuse.
 
 #include "train/train_command.h"

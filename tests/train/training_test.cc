@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Runs on a few synthetic sounds: the same seed gives the same model, stops don't matter, tones are
 // recognised after training, and which recipes are refused.
 

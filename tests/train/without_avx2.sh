@@ -1,4 +1,5 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
 # without_avx2.sh QZ_TRAIN: qz-train on an emulated processor without AVX2 shows its help and refuses to
 # train with one line; an illegal instruction anywhere ends it by a signal.
 expect() {

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The subcommands of qz model. All return kFaultFound for a model that is not valid, whose findings
 // they print, and throw base::InputError and base::OutputError.
 #pragma once

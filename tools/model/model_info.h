@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What is in a packed model and in the tensors of its network, as tables for people.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The command lines of qz model.
 
 #include <memory>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "tools/prove/traced_build.h"
 
 #include <fcntl.h>

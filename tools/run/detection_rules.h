@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Detections on the host's side, by thresholds and cooling times of a user's table.
 #pragma once
 

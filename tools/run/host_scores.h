@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Host-side scores: what qz computes itself beside the module, all scores and, by a user's table,
 // detections. Never messages of the module, and marked so wherever they are printed.
 #pragma once

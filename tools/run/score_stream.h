@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // All scores of the detector, of which the module's reports carry two: the module's front end and
 // network, compiled into this program, over the samples that the module gets.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Against the reference as g++ 12 compiles it for AVX2, time on a quiet Zen 4: a ratio of 2.9 with
 // 48 channels and 380 positions, of 3.8 with 60 and 188.
 

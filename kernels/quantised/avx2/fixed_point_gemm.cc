@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Against the reference as g++ 12 compiles it for AVX2, time on a quiet Zen 4: a ratio of 2.5 with
 // 60 input channels and 64 columns.
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Against the reference as g++ 12 compiles it for AVX2, time on a quiet Zen 4: a ratio of 8.7 with
 // 380 rows, 48 input channels and 60 columns, of 12 with 188 rows and 60 input channels.
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Against the reference as g++ 12 compiles it for AVX2, time on a quiet Zen 4: a ratio of 5.4 with
 // 60 channels and 2 rows a position.
 

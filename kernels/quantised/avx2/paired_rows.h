@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Convolution of 3 taps, by which each tap meets the row after that of the tap before: two
 // neighbouring rows of the output from 4 sums of products instead of 6. This is Winograd's minimal
 // filtering F(2,3) (S. Winograd, Arithmetic Complexity of Computations, 1980). With rows x0 to x3

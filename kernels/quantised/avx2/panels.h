@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The two matrix kernels with float scales, for any number of rows. Weights and rows are unpacked
 // once: weights in panels of columns, as many as fit, for all rows; rows in chunks, as many as fit,
 // for all panels. Then each chunk meets each panel, and the sums are requantised. Takes 52 to

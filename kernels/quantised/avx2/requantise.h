@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The requantisation by float scales on 256-bit vectors, in the steps by which it is defined:
 // multiply, round, saturate to int16, add the zero point, saturate to int8, clamp.
 #pragma once

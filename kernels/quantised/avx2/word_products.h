@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Sums of products in tiles of 4 rows and 16 columns. One multiplication makes two products, by
 // Winograd's inner product (S. Winograd, A New Algorithm for Inner Product, 1968):
 //   x0 y0 + x1 y1 = (x0 + y1) (x1 + y0) - x0 x1 - y0 y1

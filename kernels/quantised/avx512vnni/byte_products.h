@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Sums of products in tiles of 4 rows and 32 columns. An instruction multiplies four unsigned bytes
 // with four signed ones and adds the products to a sum, all exactly. Rows are made unsigned by
 // adding 128, and 128 times the sum of a column's weights comes off the column's bias.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Against the reference as g++ 12 compiles it for AVX2, time on a quiet Zen 4: a ratio of 3.2 with
 // 48 channels and 380 positions, of 5.7 with 60 and 188; 1.1 and 1.5 against the variant for AVX2.
 

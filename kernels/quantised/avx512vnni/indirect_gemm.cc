@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Against the reference as g++ 12 compiles it for AVX2, time on a quiet Zen 4: a ratio of 26 with
 // 92 rows, 3 taps, 60 input channels and 60 columns; 1.6 against the variant for AVX2.
 

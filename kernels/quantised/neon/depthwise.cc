@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Instructions against the reference's, both g++ 12 -O3 (scripts/kernel-gains.py): 96,598
 // for 496,716, a ratio of 5.1, with 48 channels and 380 positions.
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Instructions against the reference's, both g++ 12 -O3 (scripts/kernel-gains.py): 3,403
 // for 10,240, a ratio of 3.0, with 64 columns and 60 channels.
 

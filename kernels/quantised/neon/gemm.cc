@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Instructions against the reference's, both g++ 12 -O3 (scripts/kernel-gains.py): 4,361
 // for 23,085, a ratio of 5.3, with 4 rows, 60 columns and 48 channels.
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Instructions against the reference's, both g++ 12 -O3 (scripts/kernel-gains.py): 14,417
 // for 85,790, a ratio of 6.0, with 4 rows, 60 columns and 3 taps of 60 channels.
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Instructions against the reference's, both g++ 12 -O3 (scripts/kernel-gains.py): 17,159
 // for 40,722, a ratio of 2.4, with 60 channels and 190 positions of 2 rows.
 

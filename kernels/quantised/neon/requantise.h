@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The requantisation by float scales, 16 sums at a time: the steps of the reference's
 // RequantiseFp32, lane by lane. Vector instructions take what is smaller than 2^-126 for 0; a
 // product with such a scale rounds to 0 anyway.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The 4-row, 8-column tile of the two matrix kernels with float scales, held in 8 vector registers.
 //
 // Products are added up in pairs of input channels: 66 instructions for 8 channels. Multiplying

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Eight complex values in a vector, real part first, and the arithmetic of signal_arithmetic.h on
 // all of them.
 #pragma once

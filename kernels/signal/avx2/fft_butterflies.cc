@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The three radix-4 butterfly stages of the complex FFT, eight entries a vector.
 //
 // Faster than g++ 12's -O3 -mavx2 code of the reference, in the front end's

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Vectors of eight 32-bit lanes, and those at an array's end of which only the first are in use.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Squared magnitudes of complex bins, eight at a time.
 //
 // 2.6 times as fast as g++ 12's -O3 -mavx2 code of the reference, in the front end's call

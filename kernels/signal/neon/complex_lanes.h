@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Four complex values side by side, and the arithmetic of signal_arithmetic.h on all of them.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The three radix-4 butterfly stages of the complex FFT, four butterflies at a time.
 //
 // Fewer instructions than g++ 12's -O3 code of the reference, executed under emulation in the

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The complex FFT's input in digit-reversed order, 16 values at a time.
 
 #include "kernels/signal/fft_load_vector.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // From the complex FFT of sample pairs to the spectrum of the real samples, four bins from the
 // front and four from the back at a time.
 //

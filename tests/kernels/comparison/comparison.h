@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What the lists of kernels are made of: variants for some processors are compared with the
 // references, byte for byte, and what they cost is measured side by side.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Compares every variant of a kernel for some instruction set with the kernel's reference.
 //
 //   kernel_comparison_test [--seed N]   compares; N is the seed of the first comparison

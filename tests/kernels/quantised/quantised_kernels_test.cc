@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The kernels on random layers, rows and lists against textbook sums, roundings, maxima and
 // lookups, over all tails, with gaps and guards.
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The kernels in the order of the front end. A 99 behind an output is a guard.
 
 #include "kernels/signal/signal_kernels.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Which implementations are chosen, compared with what the compiler's own library detects of the
 // processor.
 

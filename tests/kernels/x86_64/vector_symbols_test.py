@@ -1,4 +1,5 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
 """vector_symbols_test.py NM KERNEL_TABLE ARCHIVE...: what libraries for larger instruction sets define.
 
 A function that several files share may be defined in each; the linker keeps any one of them. If that is the one
