@@ -7,12 +7,11 @@
 // A run keeps nothing for the next, allocates nothing, checks nothing and cannot fail.
 #pragma once
 
-#include <array>
 #include <cstddef>
 #include <cstdint>
 
 #include "config/network.h"
-#include "config/weight_tables.h"
+#include "network/weights.h"
 
 namespace qz::network {
 
@@ -22,21 +21,6 @@ union alignas(16) Arena {
   int8_t bytes[config::kArenaBytes + config::kReadAheadBytes];
   float floats[(config::kArenaBytes + config::kReadAheadBytes) / sizeof(float)];
 };
-
-// The packed tables that a run reads, in the order of config::kTables. They stay the owner's.
-struct Weights {
-  std::array<const void*, config::kTableCount> tables{};
-};
-
-// The tables of a packed model of config::kModelBytes, which stays where it is. What the checker of
-// models passes keeps the network within the contracts of its kernels.
-constexpr Weights WeightsOf(const uint8_t* packed) {
-  Weights weights;
-  for (size_t i = 0; i < config::kTableCount; ++i) {
-    weights.tables[i] = packed + config::kTables[i].offset;
-  }
-  return weights;
-}
 
 // The first byte of a tensor.
 constexpr int8_t* BytesOf(Arena& arena, const config::Tensor& tensor) {
@@ -61,6 +45,5 @@ void RunOperator(size_t op, Arena& arena, const Weights& weights);
 
 // The module's one instance, behind the functions and pointers of mobilenet_backend.h.
 extern Arena arena;
-extern const Weights module_weights;
 
 }  // namespace qz::network

@@ -36,6 +36,8 @@ COMPONENT_OF_SOURCE = {
     "quantised_kernels": "kernels/quantised",
     "audio_frontend": "frontend",
     "mobilenet_backend": "network",
+    "module_weights": "network",
+    "network": "network",
     "detector": "detector",
     "audio_classifier": "classifier",
     "sound_detection_proto": "proto",
