@@ -79,6 +79,8 @@ endif
 	ctest --preset target
 	@$(SHOW_COMPARISONS) build/target/Testing/Temporary/LastTest.log
 	build/host/bin/qz prove $(CLIP) build/host build/target
+	build/host/bin/qz prove $(CLIP) build/host build/host/lib/qz-stream.so
+	build/host/bin/qz prove $(CLIP) build/host build/target/lib/qz-stream.so
 	cmake --preset host-asan
 	cmake --build --preset host-asan --parallel $(JOBS)
 	ctest --preset host-asan

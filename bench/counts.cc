@@ -21,7 +21,11 @@
 #include "chre.h"
 #include "classifier/audio_classifier.h"
 #include "frontend/audio_frontend.h"
+#ifdef QZ_MEASURES_stream
+#include "network/stream_backend.h"
+#else
 #include "network/mobilenet_backend.h"
+#endif
 #include "tests/support/instruction_mark.h"
 #include "tests/support/random.h"
 
@@ -31,7 +35,9 @@ using qz::frontend::kFrameSamples;
 using qz::test::Mark;
 
 constexpr size_t kPassSamples = 32000;
-constexpr size_t kWindowBytes = 382 * 48;
+constexpr size_t kFrameBytes = 48;
+constexpr size_t kWindowFrames = 382;
+constexpr size_t kFramesBetweenRuns = 64;
 // Whole periods of the cadence: 200 frames a pass and a run every 64 frames make 25 runs in 8.
 constexpr int kPasses = 8;
 constexpr int kFrames = 200;
@@ -61,6 +67,40 @@ void Count(const char* name, int times, Prepare prepare, Work work) {
   std::printf("%s %d\n", name, times);
 }
 
+#ifdef QZ_MEASURES_stream
+// What the frames from one run to the next cost; then what each of them does.
+void CountNetwork() {
+  const size_t frames = kWindowFrames + kRuns * kFramesBetweenRuns;
+  const auto values =
+      qz::test::Random(2).Fill<int8_t>((frames + kFramesBetweenRuns) * kFrameBytes, -128, 127);
+  const int8_t* next = values.data();
+  const auto push = [&](int) {
+    stream_backend_push(next);
+    next += kFrameBytes;
+  };
+  for (size_t i = 0; i < kWindowFrames; ++i) push(0);
+  const auto run = [&](int) {
+    for (size_t i = 0; i < kFramesBetweenRuns; ++i) push(0);
+  };
+  Count(
+      "network_run", kRuns, [](int) {}, run);
+  Count(
+      "network_frame", kFramesBetweenRuns, [](int) {}, push);
+}
+#else
+void CountNetwork() {
+  const auto window = qz::test::Random(2).Fill<int8_t>(kWindowFrames * kFrameBytes, -128, 127);
+  const auto fill_window = [&](int) {
+    std::memcpy(mobilenet_backend_input_ptr, window.data(), window.size());
+  };
+  const auto run = [](int) { mobilenet_backend_invoke(); };
+  fill_window(0);
+  run(0);
+  Count("network_run", kRuns, fill_window, run);
+  Count("network_frame", 1, fill_window, run);
+}
+#endif
+
 }  // namespace
 
 int main() {
@@ -80,14 +120,7 @@ int main() {
   }
   Count("frame", kFrames, fill_frame, frame);
 
-  const auto window = qz::test::Random(2).Fill<int8_t>(kWindowBytes, -128, 127);
-  const auto fill_window = [&](int) {
-    std::memcpy(mobilenet_backend_input_ptr, window.data(), kWindowBytes);
-  };
-  const auto run = [](int) { mobilenet_backend_invoke(); };
-  fill_window(0);
-  run(0);
-  Count("network_run", kRuns, fill_window, run);
+  CountNetwork();
 
   tarn::contexthub::sound::AudioClassifier classifier;
   const auto pass = [&](int i) {

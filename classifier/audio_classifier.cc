@@ -5,20 +5,17 @@
 
 #include "chre.h"
 #include "chrex.h"
+#include "classifier/network_engine.h"
 #include "classifier/types/log_prefix.h"
 #include "detector/framing.h"
-#include "detector/window.h"
 #include "frontend/audio_frontend.h"
-#include "network/mobilenet_backend.h"
 
 namespace tarn::contexthub::sound {
 namespace {
 
-// The frame being assembled, and the network's window, oldest frame first.
+// The frame being assembled.
 uint32_t sample_count = 0;
 int16_t frontend_input_buffer[qz::config::kFrameSamples];
-uint32_t feature_count = 0;
-int8_t inference_input_buffer[qz::detector::kWindowBytes];
 
 }  // namespace
 
@@ -46,14 +43,7 @@ void AudioClassifier::Classify(const int16_t* samples, ConfidenceEvent* confiden
 void AudioClassifier::ProcessFrame(float* pass_confidences) {
   memcpy(audio_frontend_input_ptr, frontend_input_buffer, sizeof(frontend_input_buffer));
   audio_frontend_invoke();
-  const auto run = [] {
-    memcpy(mobilenet_backend_input_ptr, inference_input_buffer, sizeof(inference_input_buffer));
-    mobilenet_backend_invoke();
-  };
-  if (qz::detector::TakeFrame(audio_frontend_output_ptr, inference_input_buffer, &feature_count,
-                              run)) {
-    ProcessModelOutput(pass_confidences);
-  }
+  if (TakeFrame(audio_frontend_output_ptr)) ProcessModelOutput(pass_confidences);
 }
 
 }  // namespace tarn::contexthub::sound

@@ -13,7 +13,7 @@ namespace tarn::contexthub::sound {
 // detections and the periodic report. The steps are those of detector/; this class connects them
 // with the runtime: log, clocks and listener.
 //
-// The frame being assembled, the feature window, the front end and the network are static: there
+// The frame being assembled, the front end and the network are static: there
 // must be at most one classifier, and framing continues across pauses of the audio.
 class AudioClassifier {
  public:
@@ -39,7 +39,7 @@ class AudioClassifier {
   void GenerateDetectionEvent(float* pass_confidences, uint32_t confidence_size,
                               ConfidenceEvent* confidences, uint64_t timestamp_ns);
 
-  // Runs the front end on the assembled frame, and the network when the window is full.
+  // Runs the front end on the assembled frame, and hands its features to the network.
   void ProcessFrame(float* pass_confidences);
 
   // By network output, in the hub's clock; 0 means never.

@@ -5,8 +5,8 @@
 #include "chre.h"
 #include "classifier/audio_classifier.h"
 #include "classifier/detection_tables.h"
+#include "classifier/network_engine.h"
 #include "classifier/types/log_prefix.h"
-#include "network/mobilenet_backend.h"
 
 namespace tarn::contexthub::sound {
 namespace {
@@ -28,7 +28,7 @@ void AudioClassifier::ClearConfidenceBuffer() {
 }
 
 void AudioClassifier::ProcessModelOutput(float* pass_confidences) {
-  if (!qz::detector::FoldScores(mobilenet_backend_output_ptr, &short_confidence_buffer_,
+  if (!qz::detector::FoldScores(NetworkScores(), &short_confidence_buffer_,
                                 &long_confidence_buffer_, pass_confidences)) {
     is_confidence_valid_ = false;
   }

@@ -20,14 +20,18 @@ constexpr int8_t NetworkInput(uint16_t feature) {
   return static_cast<int8_t>(value - config::kFeatureZeroPoint);
 }
 
+// A frame of features as the network takes it.
+inline void MakeNetworkInput(const uint16_t* features, int8_t* frame) {
+  for (size_t i = 0; i < config::kFeatureChannels; ++i) frame[i] = NetworkInput(features[i]);
+}
+
 // Appends a frame of features to `window` (kWindowBytes, oldest frame first), which holds
 // `*held` frames. Whenever it is full, calls run(), which scores it, drops the oldest frames up to
 // the next run, and returns true: the scores are new.
 template <typename FrameCount, typename RunNetwork>
 bool TakeFrame(const uint16_t* features, int8_t* window, FrameCount* held, RunNetwork&& run) {
   Require(*held < config::kWindowFrames);
-  int8_t* const frame = window + *held * config::kFeatureChannels;
-  for (size_t i = 0; i < config::kFeatureChannels; ++i) frame[i] = NetworkInput(features[i]);
+  MakeNetworkInput(features, window + *held * config::kFeatureChannels);
   ++*held;
   if (*held < config::kWindowFrames) return false;
   run();

@@ -71,6 +71,9 @@ std::string Comparison::Compare(const Record& first, const Record& second) {
     return Differ(Location(first, std::string(", ") + field.name), std::to_string(field.first),
                   std::to_string(field.second));
   }
+  const bool absent = first.kind == Kind::kMemory && first.number < kWholeWindowObjects &&
+                      (first.bytes.empty() || second.bytes.empty());
+  if (absent) return {};
   if (first.bytes != second.bytes) return BytesDiffer(first, second);
   Count(first);
   return {};
@@ -137,7 +140,8 @@ std::string Comparison::Location(const Record& record, const std::string& detail
     location = "network run " + std::to_string(seen(record.kind) / kOperatorsPerRun) +
                ", operator " + std::to_string(record.number);
   } else if (record.kind == Kind::kMemory) {
-    location += " after buffer " + std::to_string(seen(record.kind) / kWatchedObjectCount) + ", ";
+    // The first record of what was played is that of no buffer.
+    location += " after buffer " + std::to_string(seen(Kind::kPlayed) - 2) + ", ";
     location += record.number < kWatchedObjectCount ? kWatchedObjects[record.number].name
                                                     : "object " + std::to_string(record.number);
   } else if (record.kind != Kind::kEnd) {

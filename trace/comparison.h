@@ -16,8 +16,9 @@ struct Tally {
   uint64_t digest = base::kEmptyDigest;
 };
 
-// Compares two traces record by record, up to the first difference. Counts from 0: frames, network
-// runs, rows, channels, bytes and buffers; lines, messages and events for each nanoapp.
+// Compares two traces record by record, up to the first difference. Memory is compared as far as
+// both nanoapps have it. Counts from 0: frames, network runs, rows, channels, bytes and buffers;
+// lines, messages and events for each nanoapp.
 class Comparison {
  public:
   // The names of the two builds in messages.

@@ -22,6 +22,10 @@ namespace {
 
 constexpr size_t kBufferSamples = 32000;
 
+// That of the linked nanoapp, which the module's has to be.
+enum Engine { kTraced_window, kTraced_stream };
+constexpr Engine kTracedEngine = QZ_TRACED_ENGINE;
+
 struct Options {
   std::string raw_file;
   std::string module;
@@ -70,7 +74,7 @@ base::ExitCode Trace(uint32_t nanoapp, const Options& options, Recorder* recorde
     throw base::LaunchError(failure.message);
   }
   std::string error;
-  if (!recorder->WatchMemory(&error)) {
+  if (!recorder->WatchMemory(kTracedEngine == kTraced_window, &error)) {
     // So that the trace breaks off here: its further lines would be taken for a difference.
     hub.SetLogHandler(nullptr);
     throw base::LaunchError(error);

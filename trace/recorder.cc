@@ -28,8 +28,8 @@ void Recorder::Begin(uint32_t nanoapp, hub::Hub* hub) {
   Write(Kind::kPlayed, nanoapp_, 0, {});
 }
 
-bool Recorder::WatchMemory(std::string* error) {
-  for (uint32_t i = 0; i < kWatchedObjectCount; ++i) {
+bool Recorder::WatchMemory(bool whole_windows, std::string* error) {
+  for (uint32_t i = whole_windows ? 0 : kWholeWindowObjects; i < kWatchedObjectCount; ++i) {
     const WatchedObject& object = kWatchedObjects[i];
     objects_[i] = FindObject(hub_->nanoapp(), object.name, object.bytes, error);
     if (objects_[i] == nullptr) return false;
@@ -41,7 +41,8 @@ void Recorder::Played(uint32_t buffers) {
   Write(Kind::kPlayed, nanoapp_, buffers, {});
   for (uint32_t i = 0; i < kWatchedObjectCount; ++i) {
     const WatchedObject& object = kWatchedObjects[i];
-    Write(Kind::kMemory, i, object.channels, {objects_[i], objects_[i] + object.bytes});
+    const uint32_t size = objects_[i] == nullptr ? 0 : object.bytes;
+    Write(Kind::kMemory, i, object.channels, {objects_[i], objects_[i] + size});
   }
 }
 

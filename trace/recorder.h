@@ -19,9 +19,9 @@ class Recorder final : public hub::ClientListener {
   // What comes from now on is of this nanoapp, kLoadedModule or kLinkedNanoapp. `hub` stays alive
   // until the next call.
   void Begin(uint32_t nanoapp, hub::Hub* hub);
-  // Finds the watched objects of the nanoapp that runs; false with a message in `*error` if one
-  // isn't there.
-  bool WatchMemory(std::string* error);
+  // Finds the watched objects of the nanoapp that runs, those of whole windows only if it has them;
+  // false with a message in `*error` if one isn't there.
+  bool WatchMemory(bool whole_windows, std::string* error);
   // So many buffers were played since WatchMemory.
   void Played(uint32_t buffers);
 

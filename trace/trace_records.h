@@ -33,8 +33,9 @@ constexpr size_t kKindsBeforeEnd = 7;
 constexpr uint32_t kLoadedModule = 0;
 constexpr uint32_t kLinkedNanoapp = 1;
 
-// What is shown of a nanoapp's memory after each buffer of audio: the classifier's window, and all
-// that the last run of the network left, the five scores included.
+// What is shown of a nanoapp's memory after each buffer of audio: the classifier's window, all that
+// the last run of the network left, the frame being assembled, and the noise estimates. The first
+// two are of networks over whole windows: of a network over a stream their records are empty.
 struct WatchedObject {
   const char* name;
   uint32_t bytes;
@@ -42,8 +43,11 @@ struct WatchedObject {
 };
 constexpr WatchedObject kWatchedObjects[] = {
     {"inference_input_buffer", config::kWindow.Bytes(), config::kFeatureChannels},
-    {"arena", config::kArenaBytes, 0}};
-constexpr uint32_t kWatchedObjectCount = 2;
+    {"arena", config::kArenaBytes, 0},
+    {"frontend_input_buffer", config::kFrameSamples * 2, 0},
+    {"state", config::kFeatureChannels * 4, 0}};
+constexpr uint32_t kWatchedObjectCount = 4;
+constexpr uint32_t kWholeWindowObjects = 2;
 
 // Operators of a network run, in order. The values of the last, the scores, are floats of 4 bytes,
 // those of all others int8.

@@ -29,7 +29,7 @@ def instructions(build, counter):
     counts = {}
     with tempfile.TemporaryDirectory() as folder:
         marks = pathlib.Path(folder, "marks")
-        program = ["qemu-arm", "-plugin", f"{counter},out={marks}", str(build / "bin/counts")]
+        program = ["qemu-arm", "-plugin", f"{counter},out={marks}", str(build / "bin/counts_window")]
         printed = subprocess.run(program, check=True, text=True, stdout=subprocess.PIPE).stdout
         counted = [int(line) for line in marks.read_text().split()]
     spans = [b - a for a, b in zip(counted[2::2], counted[3::2])]
@@ -39,7 +39,7 @@ def instructions(build, counter):
         if len(own) != int(times):
             raise Failure(f"{name}: {len(own)} spans between marks, expected {times}")
         counts[name] = round(sum(own) / len(own) - counts.get("nothing", 0))
-    if spans or counts.keys() != {"nothing", "frame", "network_run", "pass", "event"}:
+    if spans or counts.keys() != {"nothing", "frame", "network_run", "network_frame", "pass", "event"}:
         raise Failure(f"counts measured {sorted(counts)} and {len(spans)} spans more")
     return counts
 

@@ -9,7 +9,7 @@ from module_file import COMPONENT_OF_SOURCE, Failure, WITHOUT_SOURCES, pieces
 
 def measured(build):
     """{call: bytes}, from the program's output."""
-    program = ["qemu-arm", str(build / "bin/stack_depth")]
+    program = ["qemu-arm", str(build / "bin/stack_depth_window")]
     printed = subprocess.run(program, check=True, text=True, stdout=subprocess.PIPE).stdout
     depths = read_depths(printed)
     if len(depths) < 2:

@@ -59,13 +59,22 @@ TEST_F(Prove, BuildsThatAreAlikeGiveTheSame) {
   EXPECT_EQ(RunProve("good", "alike --host-clients 9 --client-nanoapps 2", "TMPDIR="), 0) << err_;
   EXPECT_THAT(out_, MatchesRegex("features of 598 frames +digest [0-9a-f]{16}\n"
                                  "outputs of 21 operators in 4 network runs +digest [0-9a-f]{16}\n"
-                                 "memory of the module after 3 buffers +digest [0-9a-f]{16}\n"
+                                 "4 objects in memory after 3 buffers +digest [0-9a-f]{16}\n"
                                  "25 messages to hosts +digest [0-9a-f]{16}\n"
                                  "6 reports +digest [0-9a-f]{16}\n"
                                  "[0-9]+ log lines +digest [0-9a-f]{16}\n"
                                  "good and alike give the same\n"));
   EXPECT_EQ(RunProve("good", "alike >/dev/full"), 5);
   EXPECT_THAT(err_, HasSubstr("qz: standard output: can't be written: "));
+}
+
+// The network over whole windows and over a stream: each row of each operator, and of the memory
+// what both have.
+TEST_F(Prove, ModulesWithEitherNetworkGiveTheSame) {
+  EXPECT_EQ(RunProve("good", QZ_OTHER_MODULE), 0) << out_ << err_;
+  EXPECT_THAT(out_, HasSubstr("\noutputs of 21 operators in 4 network runs "));
+  EXPECT_THAT(out_, HasSubstr("\n2 objects in memory after 3 buffers "));
+  EXPECT_THAT(out_, HasSubstr("good and " QZ_OTHER_MODULE " give the same\n"));
 }
 
 TEST_F(Prove, TooLittleAudioIsNoComparison) {
@@ -103,7 +112,7 @@ TEST_F(Prove, AModuleUnlikeTheLinkedNanoappIsFound) {
   EXPECT_EQ(RunProve("good", "stale"), 1);
   EXPECT_THAT(out_, StartsWith("first difference: memory after buffer 1, arena, byte 182"));
   EXPECT_EQ(RunProve("stale", "stale_too"), 1);
-  EXPECT_THAT(out_, HasSubstr("what was loaded and what was observed do not: memory: 6 of the "));
+  EXPECT_THAT(out_, HasSubstr("what was loaded and what was observed do not: memory: 12 of the "));
 
   const std::string runtime = "/lib/libchre_runtime_without_audio.so";
   for (const std::string build : {"odd", "odd_too"}) {

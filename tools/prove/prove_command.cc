@@ -60,8 +60,9 @@ void PrintTallies(const Comparison& comparison, Console* console) {
   print(Kind::kOperatorOutput, trace::kLinkedNanoapp,
         "outputs of " + std::to_string(trace::kOperatorsPerRun) + " operators in ", " network runs",
         trace::kOperatorsPerRun);
-  print(Kind::kMemory, trace::kLoadedModule, "memory of the module after ", " buffers",
-        trace::kWatchedObjectCount);
+  const uint64_t buffers = comparison.buffers_played() / 2;
+  print(Kind::kMemory, trace::kLoadedModule, "",
+        " objects in memory after " + Grouped(buffers) + " buffers", buffers);
   print(Kind::kHostMessage, trace::kLoadedModule, "", " messages to hosts", 1);
   print(Kind::kClientEvent, trace::kLoadedModule, "", " reports", 1);
   print(Kind::kLogLine, trace::kLoadedModule, "", " log lines", 1);

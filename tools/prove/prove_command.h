@@ -11,7 +11,7 @@ namespace qz::tools {
 
 struct ProveOptions {
   std::string file;                 // "-": standard input
-  std::vector<std::string> builds;  // two build folders
+  std::vector<std::string> builds;  // two build folders, or modules in them
   uint32_t host_clients = 1;
   uint32_t client_nanoapps = 1;  // with none the detector takes no audio
 };

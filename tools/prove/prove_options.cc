@@ -30,7 +30,9 @@ void AddProve(CLI::App* app, base::ExitCode* exit_code) {
   AddClientOptions(prove, &options->host_clients, &options->client_nanoapps, /*min_nanoapps=*/1);
   prove
       ->add_option("BUILDS", options->builds,
-                   "Two build folders (default: this program's own, and target beside it)")
+                   "Two build folders, or modules in them such as build/host/lib/qz-stream.so "
+                   "(default: this "
+                   "program's own folder, and target beside it)")
       ->expected(2);
   prove->callback([options, exit_code] {
     if (options->builds.empty()) options->builds = DefaultBuilds();

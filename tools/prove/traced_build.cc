@@ -10,6 +10,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstring>
+#include <filesystem>
 #include <fstream>
 
 #include "base/error.h"
@@ -29,19 +30,34 @@ std::vector<std::string> LauncherWords(const std::string& folder) {
   return words;
 }
 
+struct Build {
+  std::string folder;
+  std::string engine;  // what the names of its program and module end in
+};
+
+// Of a build folder, or of a module FOLDER/lib/qzENGINE.so.
+Build BuildOf(const std::string& named) {
+  const std::filesystem::path module(named);
+  const std::string name = module.stem().string();
+  if (module.extension() != ".so" || name.compare(0, 2, "qz") != 0) return {named, ""};
+  return {module.parent_path().parent_path().string(), name.substr(2)};
+}
+
 }  // namespace
 
-TracedBuild::TracedBuild(const std::string& folder, const std::string& raw_audio,
+TracedBuild::TracedBuild(const std::string& build, const std::string& raw_audio,
                          uint32_t host_clients, uint32_t client_nanoapps)
-    : program_(folder + "/bin/qz-trace"),
+    : program_(BuildOf(build).folder + "/bin/qz-trace" + BuildOf(build).engine),
       reader_([this](uint8_t* bytes, size_t size) { return Read(bytes, size); }) {
   if (access(program_.c_str(), R_OK) != 0) {
     throw base::LaunchError(program_ + ": " + std::strerror(errno) +
                             ", should be a build's program");
   }
+  const auto& [folder, engine] = BuildOf(build);
+  const std::string module = folder + std::string("/lib/qz").append(engine).append(".so");
   std::vector<std::string> command = LauncherWords(folder);
-  for (const std::string& word : {program_, raw_audio, folder + "/lib/qz.so",
-                                  std::to_string(host_clients), std::to_string(client_nanoapps)}) {
+  for (const std::string& word : {program_, raw_audio, module, std::to_string(host_clients),
+                                  std::to_string(client_nanoapps)}) {
     command.push_back(word);
   }
   Start(command);

@@ -12,15 +12,15 @@
 
 namespace qz::tools {
 
-// A build's bin/qz-trace at work on its lib/qz.so, as a child process. The command that runs
-// its programs on this machine is in the build folder's file `launcher`, a word a line; often it is
-// empty.
-// Where they run the program somewhere else, the paths that follow must be reachable there, and its
-// standard output must come back; it has no standard input.
+// A build's bin/qz-trace at work on its lib/qz.so, as a child process; or, if a module is named
+// instead of the build's folder, on that one: for lib/qz-stream.so bin/qz-trace-stream. The command
+// that runs its programs on this machine is in the build folder's file `launcher`, a word a line;
+// often it is empty. Where they run the program somewhere else, the paths that follow must be
+// reachable there, and its standard output must come back; it has no standard input.
 class TracedBuild {
  public:
   // `raw_audio` is the path of a file as qz-trace reads it. Throws base::LaunchError.
-  TracedBuild(const std::string& folder, const std::string& raw_audio, uint32_t host_clients,
+  TracedBuild(const std::string& build, const std::string& raw_audio, uint32_t host_clients,
               uint32_t client_nanoapps);
   TracedBuild(const TracedBuild&) = delete;
   TracedBuild& operator=(const TracedBuild&) = delete;
