@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// The stages of a stream as calls of kernels. For stream_network.cc, and for those who look between
-// the operators.
+// The stages of a stream as calls of kernels. For the sources that instantiate it, and for those
+// who look between the operators.
 //
 // An observer is called as observe(op, rows, count) with the rows that operator `op` has computed:
 // [count][channels of op], int8, or the scores as float.
@@ -157,5 +157,21 @@ class StreamEngine {
   Stream<kTileRows>& stream_;
   Observe observe_;
 };
+
+struct Unobserved {
+  template <typename Value>
+  void operator()(size_t, const Value*, size_t) const {}
+};
+
+template <size_t kTileRows>
+bool Push(const int8_t* frame, const Weights& weights, Stream<kTileRows>* stream) {
+  return PushFrames(frame, 1, weights, stream).scores;
+}
+
+template <size_t kTileRows>
+Pushed PushFrames(const int8_t* frames, size_t count, const Weights& weights,
+                  Stream<kTileRows>* stream) {
+  return StreamEngine(weights, stream, Unobserved()).PushFrames(frames, count);
+}
 
 }  // namespace qz::network

@@ -4,8 +4,14 @@
 import json
 import pathlib
 
-# Measurements that are known to miss their goal, and why; any other that does is a failure.
-MISSED = {}
+# (module, value): why it misses its limit, where that is known; any other that does is a failure.
+MISSED = {
+    ("stream", "Instructions a run of the network"): "the matrix kernel computes 4 rows where 2 or 1 are new",
+    ("stream", "Instructions of the network with one frame, at most"): "the same",
+    ("stream", "Instructions a frame of the front end"): "not yet cut",
+    ("stream", "Instructions of an audio event, at most"): "front end and network",
+    ("stream", "Clock for always-on use, kHz"): "front end and network",
+}
 
 # Network: a multiply-accumulate unit of 4 lanes that did nothing else would take 0.93 million.
 RUN_INSTRUCTIONS = 1_750_000
@@ -48,3 +54,28 @@ DATA_TABLE_BYTES = sum([
     2 * (4 + 1),        # the two audio functions: address, whether looked up
 ])
 DATA_BYTES = DATA_TABLE_BYTES * 102 // 100  # and 2 % for alignment and reading ahead
+
+# Of the network over a stream, as it was planned and tried out.
+LIMITS = {
+    "window": {
+        "Instructions a run of the network": RUN_INSTRUCTIONS,
+        "Instructions a frame of the front end": FRAME_INSTRUCTIONS,
+        "Clock for always-on use, kHz": CLOCK_KHZ,
+        "Code, bytes": CODE_BYTES,
+        "Constants, bytes": CONSTANTS_BYTES,
+        "Changing and zero data, bytes": DATA_BYTES,
+        "Stack of nanoappHandleEvent, bytes": STACK_BYTES,
+    },
+    "stream": {
+        "Instructions a run of the network": 260_000,
+        "Instructions of the network with one frame, at most": 80_000,
+        "Instructions a frame of the front end": 12_500,
+        "Instructions of an audio event, at most": 3_600_000,
+        "Clock for always-on use, kHz": 1_750,
+        "Code, bytes": 32_000,
+        "Constants, bytes": 94_500,
+        "Changing and zero data, bytes": 7_500,
+        "Tables for the loader, bytes": 2_600,
+        "Stack of nanoappHandleEvent, bytes": STACK_BYTES,
+    },
+}

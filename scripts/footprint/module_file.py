@@ -47,6 +47,7 @@ COMPONENT_OF_SOURCE = {
     "app": "app",
     "audio_binding": "app",
     "qz_module": "app",
+    "qz_module_other": "app",
     "protobuf-nanopb": "nanopb",
     "gcc": "compiler's library",
 }

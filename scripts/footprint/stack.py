@@ -7,9 +7,9 @@ import subprocess
 from module_file import COMPONENT_OF_SOURCE, Failure, WITHOUT_SOURCES, pieces
 
 
-def measured(build):
+def measured(build, engine):
     """{call: bytes}, from the program's output."""
-    program = ["qemu-arm", str(build / "bin/stack_depth_window")]
+    program = ["qemu-arm", str(build / f"bin/stack_depth_{engine}")]
     printed = subprocess.run(program, check=True, text=True, stdout=subprocess.PIPE).stdout
     depths = read_depths(printed)
     if len(depths) < 2:
