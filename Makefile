@@ -6,6 +6,8 @@ JOBS ?= $(shell nproc)
 # of the detector's classes.
 CLIP := build/host/clip.wav
 DEMO := build/host/demo.wav
+# 29 minutes: the first repeated, its loudness changing in another rhythm.
+LONG := build/host/long.wav
 AUDIO ?= $(DEMO)
 
 # Which kernels were compared with their references, out of a log of CTest.
@@ -65,6 +67,7 @@ run: $(if $(filter $(DEMO),$(AUDIO)),demo)
 clip:
 	@scripts/setup-debian.sh clip
 	@test -e $(CLIP) || scripts/make-clip.sh $(CLIP)
+	@test $(LONG) -nt $(CLIP) || sox -D $(CLIP) $(LONG) rate 16000 channels 1 repeat - trim 0 29:00 tremolo 0.1 95
 
 demo:
 	@scripts/setup-debian.sh demo
@@ -79,8 +82,8 @@ endif
 	ctest --preset target
 	@$(SHOW_COMPARISONS) build/target/Testing/Temporary/LastTest.log
 	build/host/bin/qz prove $(CLIP) build/host build/target
-	build/host/bin/qz prove $(CLIP) build/host build/host/lib/qz-stream.so
-	build/host/bin/qz prove $(CLIP) build/host build/target/lib/qz-stream.so
+	build/host/bin/qz prove $(LONG) build/host build/host/lib/qz-stream.so
+	build/host/bin/qz prove $(LONG) build/host build/target/lib/qz-stream.so
 	cmake --preset host-asan
 	cmake --build --preset host-asan --parallel $(JOBS)
 	ctest --preset host-asan
