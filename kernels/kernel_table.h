@@ -29,6 +29,7 @@ ROW(logarithm,         "logarithm",               reference, avx2,           avx
 #define QZ_QUANTISED_KERNELS(ROW) \
 /*  SOURCE             WHAT IT DOES               NEON       AVX2            AVX512-VNNI     KERNEL */ \
 ROW(gemm,              "matrix product",          neon,      avx2,           avx512vnni,     orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35) \
+ROW(gemm_max_pool,     "product, then pooling",   neon,      reference_avx2, reference_avx2, orra_qc8_gemm_maxpool_minmax_fp32_ukernel_4x8__neon) \
 ROW(indirect_gemm,     "convolution",             neon,      avx2,           avx512vnni,     orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35) \
 ROW(fixed_point_gemm,  "fully connected layer",   neon,      avx2,           avx2,           orra_qs8_gemm_minmax_rndnu_ukernel_1x8__asm_aarch32_neon_mlal_lane_cortex_a7) \
 ROW(depthwise,         "depthwise convolution",   neon,      avx2,           avx512vnni,     orra_qc8_dwconv_minmax_fp32_ukernel_3p16c__asm_aarch32_neonv8_mla8_cortex_a35) \

@@ -43,6 +43,19 @@ void Multiply(size_t rows, const int8_t* in, const void* w, int8_t* out) {
       &params);
 }
 
+// The same and the max pool behind it, operator kOp + 1: `rows` rows of the pool's output.
+template <size_t kOp>
+void MultiplyAndPool(size_t rows, const int8_t* in, const void* w, int8_t* out) {
+  constexpr const Operator& kEach = kOperators[kOp];
+  static_assert(kOperators[kOp + 1].kind == OperatorKind::kMaxPool &&
+                kOperators[kOp + 1].taps == 2);
+  constexpr size_t kInputs = kEach.input.channels;
+  const orra_fp32_requant_params params{kEach.zero_point, kMin, kMax};
+  orra_qc8_gemm_maxpool_minmax_fp32_ukernel_4x8__neon(rows, kEach.channels, kEach.taps * kInputs,
+                                                      in, kInputs, w, out, kEach.channels,
+                                                      kBlockStride, &params);
+}
+
 // `list`: offsets from `in`.
 template <size_t kOp>
 void MaxPool(size_t rows, const uintptr_t* list, const int8_t* in, int8_t* out) {

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// A stream of large tiles: apart, so that the module does without.
+// Frames by the chunk: apart, so that the module does without.
 
 #include "network/stream_engine.h"
 #include "network/stream_network.h"
@@ -7,6 +7,7 @@
 namespace qz::network {
 
 template bool Push(const int8_t*, const Weights&, Stream<kChunkTileRows>*);
+template Pushed PushFrames(const int8_t*, size_t, const Weights&, Stream<kDeviceTileRows>*);
 template Pushed PushFrames(const int8_t*, size_t, const Weights&, Stream<kChunkTileRows>*);
 
 }  // namespace qz::network

@@ -3,13 +3,15 @@
 // who look between the operators.
 //
 // An observer is called as observe(op, rows, count) with the rows that operator `op` has computed:
-// [count][channels of op], int8, or the scores as float.
+// [count][channels of op], int8, or the scores as float. With one, every operator is computed by
+// itself; without, a product and the pool behind it are computed together where tiles are small.
 #pragma once
 
 #include <array>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
+#include <type_traits>
 
 #include "kernels/precondition.h"
 #include "network/kernel_calls.h"
@@ -27,11 +29,21 @@ constexpr std::array<uintptr_t, kRows> MakeRowOffsets() {
 template <size_t kChannels, size_t kRows>
 constexpr auto row_offsets = MakeRowOffsets<kChannels, kRows>();
 
+struct Unobserved {
+  template <typename Value>
+  void operator()(size_t, const Value*, size_t) const {}
+};
+
 template <size_t kTileRows, typename Observe>
 class StreamEngine {
  public:
   StreamEngine(const Weights& weights, Stream<kTileRows>* stream, Observe observe)
       : weights_(weights), stream_(*stream), observe_(observe) {}
+
+  bool Push(const int8_t* frame) {
+    std::memcpy(Append<0>(1), frame, kStages[0].channels);
+    return RunFull<0>();
+  }
 
   Pushed PushFrames(const int8_t* frames, size_t count) {
     Pushed pushed;
@@ -50,6 +62,8 @@ class StreamEngine {
 
  private:
   static constexpr const auto& kStages = Stream<kTileRows>::kStages;
+  static constexpr bool kFused =
+      std::is_same_v<Observe, Unobserved> && kTileRows == kDeviceTileRows;
 
   // The rows with which a stage's buffer is full.
   template <size_t kStage>
@@ -103,12 +117,20 @@ class StreamEngine {
   // The operators of a stage from kOp on: `rows` output rows of kOp out of `in`.
   template <size_t kStage, size_t kOp>
   void RunOperators(size_t rows, const int8_t* in) {
-    constexpr bool kLast = kOp + 1 == kStages[kStage].end_op;
-    int8_t* out = Tensor<kOp>();
+    constexpr bool kPooled = kFused && kOperators[kOp + 1].kind == OperatorKind::kMaxPool;
+    constexpr size_t kNext = kOp + (kPooled ? 2 : 1);
+    constexpr bool kLast = kNext == kStages[kStage].end_op;
+    if constexpr (kPooled) rows /= 2;
+    int8_t* out = Within<kOp>();
     if constexpr (kLast && kStage + 1 < kStageCount) out = Append<kStage + 1>(rows);
-    RunOperator<kOp>(rows, in, out);
-    observe_(kOp, out, rows);
-    if constexpr (!kLast) RunOperators<kStage, kOp + 1>(rows / kOperators[kOp + 1].stride, out);
+    if constexpr (kLast && kStage + 1 == kStageCount) out = Vector<0>();
+    if constexpr (kPooled) {
+      MultiplyAndPool<kOp>(rows, in, TableOf<kOp>(), out);
+    } else {
+      RunOperator<kOp>(rows, in, out);
+    }
+    observe_(kNext - 1, out, rows);
+    if constexpr (!kLast) RunOperators<kStage, kNext>(rows / kOperators[kNext].stride, out);
   }
 
   template <size_t kOp>
@@ -129,24 +151,38 @@ class StreamEngine {
 
   void RunVectorOperators() {
     constexpr size_t kFlatten = kFirstVectorOperator;
-    observe_(kFlatten, Tensor<kFlatten - 1>(), 1);
-    FullyConnected<kFlatten + 1>(Tensor<kFlatten - 1>(), TableOf<kFlatten + 1>(),
-                                 Tensor<kFlatten>());
-    observe_(kFlatten + 1, Tensor<kFlatten>(), 1);
-    int8_t* const logits = Tensor<kFlatten + 1>();
-    FullyConnected<kFlatten + 2>(Tensor<kFlatten>(), TableOf<kFlatten + 2>(), logits);
-    observe_(kFlatten + 2, logits, 1);
-    Logistic<kFlatten + 3>(logits);
-    observe_(kFlatten + 3, logits, 1);
-    Dequantise<kFlatten + 4>(logits, stream_.scores);
+    observe_(kFlatten, Vector<0>(), 1);
+    FullyConnected<kFlatten + 1>(Vector<0>(), TableOf<kFlatten + 1>(), Vector<1>());
+    observe_(kFlatten + 1, Vector<1>(), 1);
+    FullyConnected<kFlatten + 2>(Vector<1>(), TableOf<kFlatten + 2>(), Vector<2>());
+    observe_(kFlatten + 2, Vector<2>(), 1);
+    Logistic<kFlatten + 3>(Vector<2>());
+    observe_(kFlatten + 3, Vector<2>(), 1);
+    Dequantise<kFlatten + 4>(Vector<2>(), stream_.scores);
     observe_(kFlatten + 4, stream_.scores, 1);
   }
 
-  // Where an operator writes what does not go to the next stage: operators take turns.
-  template <size_t kOp>
-  int8_t* Tensor() {
-    return stream_.bytes + Stream<kTileRows>::kRowBytes + kOp % 2 * Stream<kTileRows>::kTensorBytes;
+  // The output of operator kFirstVectorOperator + kIndex: all have space beside each other.
+  template <size_t kIndex>
+  int8_t* Vector() {
+    size_t offset = 0;
+    for (size_t i = 0; i < kIndex; ++i) {
+      offset += config::Aligned(kOperators[kFirstVectorOperator + i].channels);
+    }
+    return tensor() + offset;
   }
+
+  // Where an operator within a stage writes. What a pool reads by itself is not where the operator
+  // before has read.
+  template <size_t kOp>
+  int8_t* Within() {
+    if constexpr (!kFused && kOperators[kOp + 1].kind == OperatorKind::kMaxPool) {
+      return not_pooled_.data();
+    } else {
+      return tensor();
+    }
+  }
+  int8_t* tensor() { return stream_.bytes + Stream<kTileRows>::kRowBytes; }
 
   template <size_t kOp>
   const void* TableOf() const {
@@ -156,16 +192,13 @@ class StreamEngine {
   const Weights& weights_;
   Stream<kTileRows>& stream_;
   Observe observe_;
-};
-
-struct Unobserved {
-  template <typename Value>
-  void operator()(size_t, const Value*, size_t) const {}
+  std::array<int8_t, kFused ? 0 : Stream<kTileRows>::kTensorBytes + config::kReadAheadBytes>
+      not_pooled_;
 };
 
 template <size_t kTileRows>
 bool Push(const int8_t* frame, const Weights& weights, Stream<kTileRows>* stream) {
-  return PushFrames(frame, 1, weights, stream).scores;
+  return StreamEngine(weights, stream, Unobserved()).Push(frame);
 }
 
 template <size_t kTileRows>

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The device's stream.
+// The device's stream, frame by frame: all of it that the module links.
 
 #include "network/stream_network.h"
 
@@ -8,6 +8,5 @@
 namespace qz::network {
 
 template bool Push(const int8_t*, const Weights&, Stream<kDeviceTileRows>*);
-template Pushed PushFrames(const int8_t*, size_t, const Weights&, Stream<kDeviceTileRows>*);
 
 }  // namespace qz::network

@@ -25,7 +25,6 @@ template <size_t kTileRows>
 struct Stream {
   static constexpr std::array<Stage, kStageCount> kStages = MakeStages(kTileRows);
   static constexpr size_t kRowBytes = kStages.back().offset + kStages.back().Bytes();
-  // Two tensors between operators of a stage, the one read and the one written.
   static constexpr size_t kTensorBytes = TensorBytes(kStages);
   static_assert(StagesHold(kStages),
                 "a run when a window's last frame comes, as all stages are full");
@@ -34,7 +33,7 @@ struct Stream {
   float scores[config::kClasses];
   uint8_t held[kStageCount];     // rows in each stage's buffer
   uint8_t started[kStageCount];  // 1 once a stage has computed a tile
-  int8_t bytes[kRowBytes + 2 * kTensorBytes + config::kReadAheadBytes];
+  int8_t bytes[kRowBytes + kTensorBytes + config::kReadAheadBytes];
 };
 
 // Takes the next frame, int8 [kFeatureChannels]: features less 128, saturated. True if

@@ -82,7 +82,8 @@ constexpr std::array<Stage, kStageCount> MakeStages(size_t max_tile) {
   return stages;
 }
 
-// The largest tensor between two operators of a stage, or of those behind all stages.
+// The bytes of the largest tensor between two operators of a stage, and of all those behind the
+// stages together.
 constexpr size_t TensorBytes(const std::array<Stage, kStageCount>& stages) {
   size_t bytes = 0;
   for (const Stage& stage : stages) {
@@ -94,11 +95,11 @@ constexpr size_t TensorBytes(const std::array<Stage, kStageCount>& stages) {
       if (!goes_to_next && own > bytes) bytes = own;
     }
   }
-  for (size_t op = kFirstVectorOperator; op < config::kOperatorCount; ++op) {
-    const size_t own = config::kOperators[op].channels;
-    bytes = own > bytes ? own : bytes;
+  size_t vectors = 0;
+  for (size_t op = kFirstVectorOperator; op + 2 < config::kOperatorCount; ++op) {
+    vectors += config::Aligned(config::kOperators[op].channels);
   }
-  return config::Aligned(bytes);
+  return config::Aligned(vectors > bytes ? vectors : bytes);
 }
 
 // Plays three runs' frames, one after another: no buffer overflows, the first scores are there when
@@ -143,19 +144,24 @@ constexpr bool WindowsShareRows() {
 }
 static_assert(WindowsShareRows(), "steps divide the frames between runs, pools take whole pairs");
 
+// A stage has at most one tensor within: pools are computed with the product before them.
 constexpr bool StreamSupports() {
+  using Kind = config::OperatorKind;
+  Kind before = Kind::kFlatten;
   for (size_t op = 0; op < kFirstVectorOperator; ++op) {
     const config::Operator& each = config::kOperators[op];
-    const bool between = each.kind == config::OperatorKind::kPointwise ||
-                         each.kind == config::OperatorKind::kMaxPool;
-    if (!BeginsStage(each) && (op == 0 || !between)) return false;
+    const bool pointwise = each.kind == Kind::kPointwise && before == Kind::kDepthwise;
+    const bool pool =
+        each.kind == Kind::kMaxPool && (before == Kind::kPointwise || before == Kind::kConvolution);
+    if (!BeginsStage(each) && !pointwise && !pool) return false;
+    before = each.kind;
   }
   return kFirstVectorOperator + 5 == config::kOperatorCount &&
          config::kOperators[kFirstVectorOperator + 1].kind == config::OperatorKind::kFullyConnected;
 }
-static_assert(
-    StreamSupports(),
-    "a stream supports convolutions over time, behind each pointwise ones and pools, then "
-    "two fully connected operators, the logistic function and the scores");
+static_assert(StreamSupports(),
+              "a stream supports stages of a convolution over time, a pointwise one behind a "
+              "depthwise one, and a pool of 2 rows; then two fully connected operators, the "
+              "logistic function and the scores");
 
 }  // namespace qz::network

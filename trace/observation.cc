@@ -52,9 +52,8 @@ void KeepRows(size_t op, const float* scores, size_t) { newest[op] = ScoreBytes(
 
 bool PushObserved(const int8_t* frame) {
   const auto keep = [](size_t op, const auto* rows, size_t count) { KeepRows(op, rows, count); };
-  const bool scored = network::StreamEngine(network::module_weights, &network::module_stream, keep)
-                          .PushFrames(frame, 1)
-                          .scores;
+  const bool scored =
+      network::StreamEngine(network::module_weights, &network::module_stream, keep).Push(frame);
   for (uint32_t op = 0; scored && op < kOperatorsPerRun; ++op) {
     recorder->OnOutput(op, static_cast<uint32_t>(config::kOperators[op].channels), newest[op]);
   }

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The seven kernels of the int8 network. Every kernel is a pure function of its arguments and of
+// The eight kernels of the int8 network. Every kernel is a pure function of its arguments and of
 // the memory they point to; none allocates or fails. Results are exact to the byte: the reference
 // implementations define them, and a variant for one processor has to equal them.
 //
@@ -76,7 +76,18 @@ void orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_
     size_t m, size_t n, size_t k, const int8_t* a, size_t a_stride, const void* w, int8_t* c,
     size_t c_stride, size_t c_block_stride, const orra_fp32_requant_params* params);
 
-// The same over listed rows, summed over taps: convolution without copying rows together.
+// Matrix product and max pool of neighbouring rows in one: for r < m and j < n,
+//   c[r][j] = requantise_j(max over p < 2 of (bias[j] + sum over i < k of
+//             a[2r + p][i] * weight[i][j])).
+// The maximum is taken of the sums, which gives the pool of the requantised rows: requantisation
+// never decreases, as scales are not negative. a: [2m][k]; all else as above.
+void orra_qc8_gemm_maxpool_minmax_fp32_ukernel_4x8__neon(size_t m, size_t n, size_t k,
+                                                         const int8_t* a, size_t a_stride,
+                                                         const void* w, int8_t* c, size_t c_stride,
+                                                         size_t c_block_stride,
+                                                         const orra_fp32_requant_params* params);
+
+// The matrix product over listed rows, summed over taps: convolution without copying rows together.
 //   c[r][j] = requantise_j(bias[j] + sum over t and i < k of row(t, r)[i] * weight[t][i][j])
 // a_ptrs: [(m + 3) / 4][taps][4] row addresses, a list for each tile of 4 rows. The last one is
 // full too (the rows that it names in excess readable, their results not written); tap_bytes: size

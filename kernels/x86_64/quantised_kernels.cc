@@ -33,6 +33,16 @@ void orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_
       m, n, k, a, a_stride, w, c, c_stride, c_block_stride, params);
 }
 
+void orra_qc8_gemm_maxpool_minmax_fp32_ukernel_4x8__neon(size_t m, size_t n, size_t k,
+                                                         const int8_t* a, size_t a_stride,
+                                                         const void* w, int8_t* c, size_t c_stride,
+                                                         size_t c_block_stride,
+                                                         const orra_fp32_requant_params* params) {
+  qz::Require(m > 0 && n > 0 && k > 0);
+  choice.Get().orra_qc8_gemm_maxpool_minmax_fp32_ukernel_4x8__neon(
+      m, n, k, a, a_stride, w, c, c_stride, c_block_stride, params);
+}
+
 void orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35(
     size_t m, size_t n, size_t k, size_t tap_bytes, const int8_t* const* a_ptrs, const void* w,
     int8_t* c, size_t c_stride, size_t c_block_stride, size_t a_offset, const int8_t* zero,

@@ -20,7 +20,7 @@ QZ_KERNEL(orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_c
     int8_t* tile = c;
     for (size_t left = n; left > 0; left -= std::min(left, qz::kTileColumns)) {
       const uint8_t* weights = biases + qz::kBiasBytes;
-      qz::VectorTile sums = qz::StartVectorTile(biases);
+      auto sums = qz::StartVectorTile<qz::kTileRows>(biases);
       for (const int8_t* const* entries = a_ptrs; entries != end; entries += qz::kTileRows) {
         const int8_t* rows[qz::kTileRows];
         for (size_t r = 0; r < qz::kTileRows; ++r) {

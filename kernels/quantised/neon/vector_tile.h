@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// The 4-row, 8-column tile of the two matrix kernels with float scales, held in 8 vector registers.
+// The tile of the matrix kernels with float scales: 8 columns and 4, 2 or 1 rows, held in 8 vector
+// registers or fewer.
 //
 // Products are added up in pairs of input channels: 66 instructions for 8 channels. Multiplying
 // 16-bit weights by one lane of 16-bit inputs takes 118 as compiled. llvm-mca, which knows neither
@@ -13,12 +14,14 @@
 
 namespace qz {
 
+template <size_t kRows>
 struct VectorTile {
-  int32x4_t sums[kTileRows][2];  // columns 0 to 3, and 4 to 7
+  int32x4_t sums[kRows][2];  // columns 0 to 3, and 4 to 7
 };
 
-static inline VectorTile StartVectorTile(const uint8_t* biases) {
-  VectorTile tile;
+template <size_t kRows>
+static inline VectorTile<kRows> StartVectorTile(const uint8_t* biases) {
+  VectorTile<kRows> tile;
   for (auto& row : tile.sums) {
     row[0] = LoadInts(biases);
     row[1] = LoadInts(biases + 16);
@@ -52,34 +55,37 @@ static inline const int16_t* PairsAt(const int8_t* row) {
 }
 
 // The last 1 to 3 input channels: what is read beyond them meets weights of 0.
-static inline void AddLastProducts(const int8_t* const (&in)[kTileRows], const int8_t* weights,
-                                   size_t k, VectorTile& tile) {
+template <size_t kRows>
+static inline void AddLastProducts(const int8_t* const (&in)[kRows], const int8_t* weights,
+                                   size_t k, VectorTile<kRows>& tile) {
   const int8x8_t none = vdup_n_s8(0);
   const int8x8_t channel1 = k > 1 ? vld1_s8(weights + 8) : none;
   const int8x8_t channel2 = k > 2 ? vld1_s8(weights + 16) : none;
   const int8x8x2_t weights01 = vzip_s8(vld1_s8(weights), channel1);
   const int8x8x2_t weights23 = vzip_s8(channel2, none);
-  for (size_t r = 0; r < kTileRows; ++r) {
+  for (size_t r = 0; r < kRows; ++r) {
     const int16x4x2_t pairs = vld2_dup_s16(PairsAt(in[r]));
     AddChannels(pairs.val[0], pairs.val[1], weights01, weights23, tile.sums[r]);
   }
 }
 
 // tile.sums[r], column j, += sum over i < k of rows[r][i] * weights[8 * i + j].
-static inline void AddProducts(const int8_t* const (&rows)[kTileRows], const uint8_t* weights,
-                               size_t k, VectorTile& tile) {
+template <size_t kRows>
+static inline void AddProducts(const int8_t* const (&rows)[kRows], const uint8_t* weights, size_t k,
+                               VectorTile<kRows>& tile) {
   // Hidden from the compiler, which then lets loads step their own address: with a known number the
   // loop has 8 additions more.
   size_t channel_bytes = kTileColumns;
   asm("" : "+r"(channel_bytes));
-  const int8_t* in[kTileRows] = {rows[0], rows[1], rows[2], rows[3]};
+  const int8_t* in[kRows];
+  std::copy_n(rows, kRows, in);
   const int8_t* w = reinterpret_cast<const int8_t*>(weights);
   for (size_t eights = k / 8; eights > 0; --eights) {
     const int8x8x2_t weights01 = ReadPairs(w, channel_bytes);
     const int8x8x2_t weights23 = ReadPairs(w, channel_bytes);
     const int8x8x2_t weights45 = ReadPairs(w, channel_bytes);
     const int8x8x2_t weights67 = ReadPairs(w, channel_bytes);
-    for (size_t r = 0; r < kTileRows; ++r) {
+    for (size_t r = 0; r < kRows; ++r) {
       const int16x4x4_t pairs = vld4_dup_s16(PairsAt(in[r]));
       in[r] += 8;
       AddChannels(pairs.val[0], pairs.val[1], weights01, weights23, tile.sums[r]);
@@ -89,7 +95,7 @@ static inline void AddProducts(const int8_t* const (&rows)[kTileRows], const uin
   if ((k & 4) != 0) {
     const int8x8x2_t weights01 = ReadPairs(w, channel_bytes);
     const int8x8x2_t weights23 = ReadPairs(w, channel_bytes);
-    for (size_t r = 0; r < kTileRows; ++r) {
+    for (size_t r = 0; r < kRows; ++r) {
       const int16x4x2_t pairs = vld2_dup_s16(PairsAt(in[r]));
       in[r] += 4;
       AddChannels(pairs.val[0], pairs.val[1], weights01, weights23, tile.sums[r]);
@@ -100,14 +106,34 @@ static inline void AddProducts(const int8_t* const (&rows)[kTileRows], const uin
 
 // Requantises the whole tile and stores its first m rows and `columns` columns, 8 if there are
 // more.
-static inline void StoreTile(const VectorTile& tile, const uint8_t* scales, OutputRange range,
-                             size_t m, size_t columns, int8_t* c, size_t c_stride) {
+template <size_t kRows>
+static inline void StoreTile(const VectorTile<kRows>& tile, const uint8_t* scales,
+                             OutputRange range, size_t m, size_t columns, int8_t* c,
+                             size_t c_stride) {
   const float32x4_t low = LoadFloats(scales), high = LoadFloats(scales + 16);
-  for (size_t r = 0; r < kTileRows; r += 2) {
-    const int8x16_t two_rows = RequantiseFp32(tile.sums[r][0], tile.sums[r][1], tile.sums[r + 1][0],
-                                              tile.sums[r + 1][1], low, high, low, high, range);
+  for (size_t r = 0; r < kRows; r += 2) {
+    const size_t next = std::min(r + 1, kRows - 1);
+    const int8x16_t two_rows = RequantiseFp32(tile.sums[r][0], tile.sums[r][1], tile.sums[next][0],
+                                              tile.sums[next][1], low, high, low, high, range);
     if (r < m) StoreFirst(vget_low_s8(two_rows), columns, c + r * c_stride);
     if (r + 1 < m) StoreFirst(vget_high_s8(two_rows), columns, c + (r + 1) * c_stride);
+  }
+}
+
+// All columns of one tile of a matrix product: Finish makes of the sums the tile that is stored.
+template <size_t kRows, typename Finish>
+static inline void MultiplyTile(const int8_t* const (&rows)[kRows], size_t n, size_t k,
+                                const void* w, int8_t* c, size_t c_stride, size_t c_block_stride,
+                                OutputRange range, size_t stored_rows, Finish finish) {
+  const uint8_t* biases = static_cast<const uint8_t*>(w);
+  for (size_t left = n; left > 0; left -= std::min(left, kTileColumns)) {
+    const uint8_t* weights = biases + kBiasBytes;
+    const uint8_t* scales = weights + k * kTileColumns;
+    VectorTile<kRows> sums = StartVectorTile<kRows>(biases);
+    AddProducts(rows, weights, k, sums);
+    StoreTile(finish(sums), scales, range, stored_rows, left, c, c_stride);
+    c += c_block_stride;
+    biases = scales + kScaleBytes;
   }
 }
 

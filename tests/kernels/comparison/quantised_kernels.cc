@@ -11,6 +11,7 @@ namespace {
 
 QZ_IMPLEMENTATIONS(kGemm, Quantised,
                    orra_qc8_gemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35);
+QZ_IMPLEMENTATIONS(kGemmMaxPool, Quantised, orra_qc8_gemm_maxpool_minmax_fp32_ukernel_4x8__neon);
 QZ_IMPLEMENTATIONS(kIndirectGemm, Quantised,
                    orra_qc8_igemm_minmax_fp32_ukernel_4x8__asm_aarch32_neonv8_mlal_lane_cortex_a35);
 QZ_IMPLEMENTATIONS(kFixedPointGemm, Quantised,
@@ -56,6 +57,18 @@ std::string CompareGemm(CaseRandom& random) {
   const orra_fp32_requant_params params = RandomParams(random);
   const auto c_contents = RandomValues<int8_t>(random, s.m * s.c_stride);
   return Difference(random, kGemm, c_contents, [&](auto gemm, int8_t* c) {
+    gemm(s.m, s.n, s.k, a, s.a_stride, w, c, s.c_stride, s.c_block_stride, &params);
+  });
+}
+
+std::string CompareGemmMaxPool(CaseRandom& random) {
+  const MatrixShape s(random);
+  const auto values = ShapedFill<int8_t>(random, (2 * s.m - 1) * s.a_stride + s.k);
+  const int8_t* a = Location(random, values, kReadAhead);
+  const uint8_t* w = OffsetLayer(random, s.k, s.n, 8);
+  const orra_fp32_requant_params params = RandomParams(random);
+  const auto c_contents = RandomValues<int8_t>(random, s.m * s.c_stride);
+  return Difference(random, kGemmMaxPool, c_contents, [&](auto gemm, int8_t* c) {
     gemm(s.m, s.n, s.k, a, s.a_stride, w, c, s.c_stride, s.c_block_stride, &params);
   });
 }
@@ -172,6 +185,11 @@ std::vector<Kernel> QuantisedKernels() {
        [](Side side) {
          kGemm.of[side](kGemmRows, kChannels, 48, in_rows, 48, weights, out_rows, kChannels, 8,
                         &kParams);
+       }},
+      {kGemmMaxPool.name, CompareGemmMaxPool,
+       [](Side side) {
+         kGemmMaxPool.of[side](2, kChannels, 48, in_rows, 48, weights, out_rows, kChannels, 8,
+                               &kParams);
        }},
       {kIndirectGemm.name, CompareIndirectGemm,
        [](Side side) {

@@ -100,6 +100,18 @@ void CheckMatrixKernels(Random& random, size_t m, size_t n, size_t k) {
       1, n, inputs, a.data(), a_stride, layer.Packed(false).data(), fixed.data(), stride, block,
       &fixed_params);
   EXPECT_EQ(direct, expected);
+
+  // Of two rows the larger, after requantisation as before.
+  std::vector<int8_t> pooled(m / 2 * stride + 16, kGuard), expected_pooled = pooled;
+  for (size_t i = 0; i < m / 2 * stride; ++i) {
+    const size_t first = i / stride * 2 * stride + i % stride;
+    expected_pooled[i] = std::max(expected[first], expected[first + stride]);
+  }
+  if (m > 1) {
+    orra_qc8_gemm_maxpool_minmax_fp32_ukernel_4x8__neon(
+        m / 2, n, inputs, a.data(), a_stride, packed.data(), pooled.data(), stride, block, &params);
+  }
+  EXPECT_EQ(pooled, expected_pooled);
   EXPECT_EQ(indirect, expected);
   EXPECT_EQ(fixed, expected_fixed);
 }
