@@ -77,11 +77,25 @@ std::unique_ptr<AudioInput> OpenStream(const std::string& path, const std::strin
                                       container, stream->bytes);
   }
   if (notice) {
-    notice(name + ": is read to its end before it plays: " + container +
-           " that needs seeking; WAV without compression plays as it comes");
+    notice(name + ": is " + container +
+           " that needs seeking: it is copied to a temporary file of " +
+           "at most 1 GiB and plays after its end; WAV without compression plays as it comes");
   }
   return std::make_unique<SoundFileInput>(
       name, CopyToTemporaryFile(name, file, head.bytes(), kMaxCopiedBytes));
+}
+
+// A WAV file whose header states no audio, as what wrote it could not go back to it. Null, and
+// `file` as it was, if it is another.
+std::unique_ptr<AudioInput> OpenUnfinishedWav(const std::string& name, base::FileDescriptor* file) {
+  StreamHead head(name, file);
+  const auto stream = ReadPcmHeader(&head);
+  if (!stream || !stream->unfinished) {
+    if (lseek(file->get(), 0, SEEK_SET) != 0) ThrowSystemError(name, "can't be read again");
+    return nullptr;
+  }
+  return std::make_unique<PcmInput>(PcmInput::Source{name, std::move(*file), ""}, stream->format,
+                                    ContainerName(head.bytes()), stream->bytes);
 }
 
 }  // namespace
@@ -106,6 +120,7 @@ std::unique_ptr<AudioInput> OpenAudio(const std::string& path, const std::option
   const ssize_t got = pread(file.get(), head.data(), head.size(), 0);
   head.resize(got > 0 ? static_cast<size_t>(got) : 0);
   RefuseUnreadable(path, name, head);
+  if (auto unfinished = OpenUnfinishedWav(name, &file)) return unfinished;
   return std::make_unique<SoundFileInput>(name, std::move(file));
 }
 

@@ -55,6 +55,7 @@ std::optional<PcmFormat> WavFormat(const std::string& bytes, size_t offset, size
 
 std::optional<PcmStream> ReadWavHeader(StreamHead* head) {
   constexpr size_t kChunkHeader = 8;
+  const uint32_t file_size = Little(head->bytes(), 4, 4);
   std::optional<PcmFormat> format;
   for (size_t offset = 12; head->Need(offset + kChunkHeader);) {
     const std::string name = head->bytes().substr(offset, 4);
@@ -62,8 +63,10 @@ std::optional<PcmStream> ReadWavHeader(StreamHead* head) {
     offset += kChunkHeader;
     if (name == "data") {
       if (!format) return std::nullopt;
-      // A size of 0 is one that was never filled in.
-      if (size == 0 || size >= kUntilTheEnd) return PcmStream{*format, std::nullopt};
+      // A size of 0 was never filled in, unless the file's counts other chunks behind.
+      const bool counts_more = file_size < kUntilTheEnd && file_size + kChunkHeader > offset;
+      if (size == 0 && !counts_more) return PcmStream{*format, std::nullopt, true};
+      if (size >= kUntilTheEnd) return PcmStream{*format, std::nullopt};
       return PcmStream{*format, size};
     }
     if (size > kMaxHeader - offset || !head->Need(offset + size + size % 2)) return std::nullopt;

@@ -39,6 +39,7 @@ class StreamHead {
 struct PcmStream {
   PcmFormat format;
   std::optional<uint64_t> bytes;  // of the samples; nothing if they go on until the end
+  bool unfinished = false;        // a size of 0 where one was to be filled in
 };
 
 // Reads the header of a WAV or AU stream up to its first sample. Nothing if it is another kind, its

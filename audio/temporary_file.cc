@@ -72,7 +72,7 @@ base::FileDescriptor CopyToTemporaryFile(const std::string& name,
     copied += static_cast<uint64_t>(got);
     if (copied > max_bytes) {
       throw AudioError(name + ": exceeds the " + std::to_string(max_bytes) +
-                       " bytes that are copied of a stream of its kind; save it as a file");
+                       " bytes (1 GiB) that are copied of a stream of its kind; save it as a file");
     }
     WriteToTemporaryFile(copy, block.data(), static_cast<size_t>(got));
   }

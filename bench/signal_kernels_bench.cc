@@ -64,6 +64,13 @@ void LeftShift(benchmark::State& state) {
 }
 BENCHMARK(LeftShift);
 
+void Load(benchmark::State& state) {
+  Run(state, [](Buffers& b) {
+    orra_cs16_digitreverse_ukernel__neon_x16(256, b.samples.data(), b.shorts.data());
+  });
+}
+BENCHMARK(Load);
+
 // The in-place kernels run on their own results, which fade to zero: their time does not depend on
 // the data.
 void ButterfliesOfFirstStage(benchmark::State& state) {

@@ -263,9 +263,7 @@ TEST_F(AudioInputTest, WavOfUnknownLengthGoesToTheEndAndAStreamPlaysAsItComes) {
   for (const uint32_t size : {0xFFFFFFFFu, 0x7FFFF000u, 0u, 6u}) {
     SCOPED_TRACE(size);
     const std::string wav = Wav({reinterpret_cast<const char*>(&size), 4}, audio);
-    if (size != 0) {
-      EXPECT_EQ(ReadFile(WriteBytes("pipe.wav", wav)), (std::vector<int16_t>{1, -2, 3}));
-    }
+    EXPECT_EQ(ReadFile(WriteBytes("pipe.wav", wav)), (std::vector<int16_t>{1, -2, 3}));
     Pipe pipe;
     pipe.Write(wav);
     const auto input = OpenAudio(pipe.path());  // whose end is still to come
@@ -275,6 +273,15 @@ TEST_F(AudioInputTest, WavOfUnknownLengthGoesToTheEndAndAStreamPlaysAsItComes) {
     EXPECT_EQ(input->ExpectedSamples(), size == 6 ? 3u : 0u);
     if (size != 6) pipe.End();
     EXPECT_EQ(input->Read(samples.data(), 10), 0u);
+  }
+
+  // Nothing but a title behind the samples, and the file's size counts it: a size of 0 is meant.
+  std::string none = Wav(std::string(4, '\0'), std::string("LIST\x04\0\0\0INFO", 12));
+  none.replace(4, 4, std::string{static_cast<char>(none.size() - 8), 0, 0, 0});
+  Pipe pipe;
+  for (const auto& path : {WriteBytes("none.wav", none), StreamOf(&pipe, none)}) {
+    EXPECT_THAT([&] { ReadFile(path); },
+                testing::ThrowsMessage<AudioError>(HasSubstr(": no audio: 0 frames")));
   }
 }
 
