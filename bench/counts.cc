@@ -20,6 +20,7 @@
 #include "bench/minimal_runtime.h"
 #include "chre.h"
 #include "classifier/audio_classifier.h"
+#include "config/detector.h"
 #include "frontend/audio_frontend.h"
 #ifdef QZ_MEASURES_stream
 #include "network/stream_backend.h"
@@ -31,13 +32,14 @@
 
 namespace {
 
-using qz::frontend::kFrameSamples;
+using qz::config::kBufferSamples;
+using qz::config::kFeatureChannels;
+using qz::config::kFrameSamples;
+using qz::config::kFramesBetweenRuns;
+using qz::config::kHopSamples;
+using qz::config::kWindowFrames;
 using qz::test::Mark;
 
-constexpr size_t kPassSamples = 32000;
-constexpr size_t kFrameBytes = 48;
-constexpr size_t kWindowFrames = 382;
-constexpr size_t kFramesBetweenRuns = 64;
 // Whole periods of the cadence: 200 frames a pass and a run every 64 frames make 25 runs in 8.
 constexpr int kPasses = 8;
 constexpr int kFrames = 200;
@@ -48,7 +50,7 @@ constexpr int kRuns = 8;
 std::vector<int16_t> Sound() {
   constexpr size_t kPeriod = 8000;
   qz::test::Random random(1);
-  std::vector<int16_t> samples(kPassSamples * kPasses);
+  std::vector<int16_t> samples(kBufferSamples * kPasses);
   for (size_t i = 0; i < samples.size(); ++i) {
     const int64_t peak = static_cast<int64_t>(i % kPeriod) * 32767 / kPeriod;
     samples[i] = static_cast<int16_t>(random.Between(-peak, peak));
@@ -72,11 +74,11 @@ void Count(const char* name, int times, Prepare prepare, Work work) {
 void CountNetwork() {
   const size_t frames = kWindowFrames + kRuns * kFramesBetweenRuns;
   const auto values =
-      qz::test::Random(2).Fill<int8_t>((frames + kFramesBetweenRuns) * kFrameBytes, -128, 127);
+      qz::test::Random(2).Fill<int8_t>((frames + kFramesBetweenRuns) * kFeatureChannels, -128, 127);
   const int8_t* next = values.data();
   const auto push = [&](int) {
     stream_backend_push(next);
-    next += kFrameBytes;
+    next += kFeatureChannels;
   };
   for (size_t i = 0; i < kWindowFrames; ++i) push(0);
   const auto run = [&](int) {
@@ -89,7 +91,7 @@ void CountNetwork() {
 }
 #else
 void CountNetwork() {
-  const auto window = qz::test::Random(2).Fill<int8_t>(kWindowFrames * kFrameBytes, -128, 127);
+  const auto window = qz::test::Random(2).Fill<int8_t>(kWindowFrames * kFeatureChannels, -128, 127);
   const auto fill_window = [&](int) {
     std::memcpy(mobilenet_backend_input_ptr, window.data(), window.size());
   };
@@ -111,7 +113,8 @@ int main() {
   Count("nothing", 1, nothing, nothing);
 
   const auto fill_frame = [&](int i) {
-    std::memcpy(audio_frontend_input_ptr, sound.data() + i * 160, kFrameSamples * sizeof(int16_t));
+    std::memcpy(audio_frontend_input_ptr, sound.data() + i * kHopSamples,
+                kFrameSamples * sizeof(int16_t));
   };
   const auto frame = [](int) { audio_frontend_invoke(); };
   for (int i = 0; i < kFrames; ++i) {
@@ -126,7 +129,7 @@ int main() {
   const auto pass = [&](int i) {
     tarn::contexthub::sound::ConfidenceEvent report[2] = {};
     uint32_t version = 0;
-    classifier.Classify(sound.data() + i * kPassSamples, report, 2, &version);
+    classifier.Classify(sound.data() + i * kBufferSamples, report, 2, &version);
   };
   for (int i = 0; i < kPasses; ++i) pass(i);
   Count("pass", kPasses, nothing, pass);
@@ -136,8 +139,8 @@ int main() {
   nanoappHandleEvent(1, tarn::contexthub::sound::kSoundServiceRegisterEvent, nullptr);
   const auto event = [&](int i) {
     chreAudioDataEvent data = {};
-    data.sampleCount = kPassSamples;
-    data.samplesS16 = sound.data() + i * kPassSamples;
+    data.sampleCount = kBufferSamples;
+    data.samplesS16 = sound.data() + i * kBufferSamples;
     nanoappHandleEvent(0, CHRE_EVENT_AUDIO_DATA, &data);
   };
   for (int i = 0; i < kPasses; ++i) event(i);

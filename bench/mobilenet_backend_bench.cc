@@ -8,13 +8,14 @@
 #include <cstring>
 #include <vector>
 
+#include "config/network.h"
 #include "network/mobilenet_backend.h"
 #include "tests/support/random.h"
 
 namespace {
 
 void NetworkRun(benchmark::State& state) {
-  constexpr size_t kInputBytes = 382 * 48;
+  constexpr size_t kInputBytes = qz::config::kWindow.Bytes();
   const std::vector<int8_t> input = qz::test::Random(1).Fill<int8_t>(kInputBytes, -128, 127);
   for (auto _ : state) {
     std::memcpy(mobilenet_backend_input_ptr, input.data(), kInputBytes);

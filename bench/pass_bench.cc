@@ -6,6 +6,7 @@
 #include <cstdint>
 
 #include "classifier/audio_classifier.h"
+#include "config/detector.h"
 #include "hub/hub.h"
 #include "tests/support/random.h"
 
@@ -17,7 +18,7 @@ using tarn::contexthub::sound::ConfidenceEvent;
 void Pass(benchmark::State& state) {
   qz::hub::Hub runtime;
   AudioClassifier classifier;
-  const auto samples = qz::test::Random(1).Fill<int16_t>(32000, -2000, 2000);
+  const auto samples = qz::test::Random(1).Fill<int16_t>(qz::config::kBufferSamples, -2000, 2000);
   ConfidenceEvent report[2] = {};
   uint32_t version = 0;
   for (auto _ : state) classifier.Classify(samples.data(), report, 2, &version);

@@ -15,7 +15,7 @@ namespace {
 
 constexpr size_t kChannels = 60;
 constexpr orra_fp32_requant_params kFp32Params{-128, -128, 127};
-constexpr orra_rndnu_requant_params kRndnuParams{0, 1427340160, -5, -128, -128, 127};
+constexpr orra_rndnu_requant_params kRndnuParams{0, 1 << 30, -5, -128, -128, 127};
 
 // Random rows, with room for read-ahead, and weights in blocks of `block_bytes` with scales at the
 // end.

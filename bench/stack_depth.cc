@@ -22,6 +22,7 @@
 #include "bench/minimal_runtime.h"
 #include "chre.h"
 #include "classifier/detection_tables.h"
+#include "config/detector.h"
 #include "proto/sound_detection_message_type.h"
 #include "tests/support/random.h"
 
@@ -155,7 +156,7 @@ std::vector<Call> FromNanoapps(uint16_t event) {
 }
 
 void MeasureAudio() {
-  constexpr uint32_t kSamples = 32000;
+  constexpr uint32_t kSamples = qz::config::kBufferSamples;
   const auto samples = qz::test::Random(1).Fill<int16_t>(kSamples, -32768, 32767);
   chreAudioDataEvent data = {};
   data.sampleCount = kSamples;

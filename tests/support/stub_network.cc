@@ -3,12 +3,13 @@
 
 #include <algorithm>
 
+#include "config/network.h"
 #include "network/mobilenet_backend.h"
 
 namespace {
 
-int8_t input[382 * 48];
-float output[5];
+int8_t input[qz::config::kWindow.Bytes()];
+float output[qz::config::kClasses];
 
 }  // namespace
 

@@ -8,10 +8,12 @@
 #include <functional>
 #include <vector>
 
+#include "config/detector.h"
+
 namespace qz::test {
 
-using Scores = std::array<float, 5>;
-using Window = std::vector<int8_t>;  // 382 frames of 48
+using Scores = std::array<float, config::kClasses>;
+using Window = std::vector<int8_t>;  // int8 [kWindowFrames, kFeatureChannels]
 
 struct StubNetwork {
   // Scores of run `run`, counted from 0 over all runs so far; zeros when unset.

@@ -3,6 +3,7 @@
 
 #include <array>
 
+#include "config/network.h"
 #include "tests/kernels/comparison/comparison.h"
 #include "tests/support/random_layer.h"
 
@@ -163,16 +164,17 @@ std::string CompareMaxPool(CaseRandom& random) {
 
 // The shapes of the network. What the bytes hold changes no instruction count.
 constexpr size_t kChannels = 60;
-constexpr size_t kGemmRows = 380;
-constexpr size_t kIndirectGemmRows = 92;
+constexpr size_t kGemmRows = config::kOperators[1].output.rows;
+constexpr size_t kIndirectGemmRows = config::kOperators[6].output.rows;
+constexpr size_t kMaxRows = config::kWindowFrames;
 constexpr orra_fp32_requant_params kParams{-128, -128, 127};
-constexpr orra_rndnu_requant_params kFixedParams{0, 1427340160, -5, -128, -128, 127};
+constexpr orra_rndnu_requant_params kFixedParams{0, 1 << 30, -5, -128, -128, 127};
 constexpr orra_s8_clamp_params kClamp{-128, 127};
 uint8_t weights[12032];
-int8_t in_rows[382 * kChannels];
-int8_t out_rows[382 * kChannels];
+int8_t in_rows[kMaxRows * kChannels];
+int8_t out_rows[kMaxRows * kChannels];
 constexpr auto kRowList = [] {
-  std::array<const int8_t*, 382> list = {};
+  std::array<const int8_t*, kMaxRows> list = {};
   for (const int8_t*& row : list) row = in_rows;
   return list;
 }();
@@ -204,8 +206,8 @@ std::vector<Kernel> QuantisedKernels() {
        }},
       {kDepthwise.name, CompareDepthwise,
        [](Side side) {
-         kDepthwise.of[side](48, 380, kRowList.data(), weights, out_rows, sizeof kRowList[0], 0, 0,
-                             nullptr, &kParams);
+         kDepthwise.of[side](48, kGemmRows, kRowList.data(), weights, out_rows, sizeof kRowList[0],
+                             0, 0, nullptr, &kParams);
        }},
       {kMaxPool.name, CompareMaxPool,
        [](Side side) {
