@@ -35,7 +35,6 @@ namespace {
 using qz::config::kBufferSamples;
 using qz::config::kFeatureChannels;
 using qz::config::kFrameSamples;
-using qz::config::kFramesBetweenRuns;
 using qz::config::kHopSamples;
 using qz::config::kWindowFrames;
 using qz::test::Mark;
@@ -70,6 +69,8 @@ void Count(const char* name, int times, Prepare prepare, Work work) {
 }
 
 #ifdef QZ_MEASURES_stream
+using qz::config::kFramesBetweenRuns;
+
 // What the frames from one run to the next cost; then what each of them does.
 void CountNetwork() {
   const size_t frames = kWindowFrames + kRuns * kFramesBetweenRuns;
