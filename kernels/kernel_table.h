@@ -23,8 +23,8 @@ ROW(fft_real_split,    "FFT, real split",         neon,      avx2,           avx
 ROW(power_spectrum,    "power spectrum",          reference, avx2,           avx2,           orra_cs16_vsquareabs_ukernel__neon_mlal_ld128_x8) \
 ROW(filterbank,        "filterbank",              neon,      avx2,           avx2,           orra_u32_filterbank_accumulate_ukernel__asm_aarch32_neon_x2) \
 ROW(square_root,       "square root",             reference, avx2,           avx2,           orra_u64_u32_vsqrtshift_ukernel__scalar_cvtu32_sqrt_cvtu32f64_x1) \
-ROW(noise_subtraction, "noise subtraction",       reference, avx2,           avx2,           orra_u32_filterbank_subtract_ukernel__scalar_x2) \
-ROW(logarithm,         "logarithm",               reference, avx2,           avx2,           orra_u32_vlog_ukernel__scalar_x1)
+ROW(noise_subtraction, "noise subtraction",       neon,      avx2,           avx2,           orra_u32_filterbank_subtract_ukernel__scalar_x2) \
+ROW(logarithm,         "logarithm",               neon,      avx2,           avx2,           orra_u32_vlog_ukernel__scalar_x1)
 
 #define QZ_QUANTISED_KERNELS(ROW) \
 /*  SOURCE             WHAT IT DOES               NEON       AVX2            AVX512-VNNI     KERNEL */ \
