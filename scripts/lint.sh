@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # SPDX-License-Identifier: Apache-2.0
-# Checks the formatting of all sources, and the rules of .clang-tidy on what is compiled.
+# Checks the licence lines and the formatting of all sources, and the rules of .clang-tidy on what is compiled.
 # Usage: scripts/lint.sh [--changed] BUILD...     the folders of builds, each configured and built
 # A file is checked as the first of the builds compiles it. --changed: only files that differ from the main branch,
 # and for a changed header one file that includes it. Fails on any finding.
@@ -20,6 +20,7 @@ done
 mapfile -t sources < <(
   git ls-files --cached --others --exclude-standard -- '*.h' '*.cc' | xargs -d '\n' ls -d 2>/dev/null)
 [ ${#sources[@]} -gt 0 ] || { echo "lint.sh: no sources found" >&2; exit 1; }
+scripts/check-spdx.sh
 clang-format --dry-run -Werror "${sources[@]}"
 
 difference=all
