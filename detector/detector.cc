@@ -1,15 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "detector/detector.h"
 
-#include <cstring>
-
 namespace qz::detector {
 
 bool TakeFrame(const uint16_t* features, const network::Weights& weights, Detector* detector) {
-  return TakeFrame(features, detector->window, &detector->frames, [&] {
-    std::memcpy(network::InputOf(detector->arena), detector->window, sizeof(detector->window));
-    network::Run(detector->arena, weights);
-  });
+  int8_t frame[config::kFeatureChannels];
+  MakeNetworkInput(features, frame);
+  return network::Push(frame, weights, &detector->network);
 }
 
 Pass Classify(const int16_t* samples, size_t count, const network::Weights& weights,
@@ -18,7 +15,7 @@ Pass Classify(const int16_t* samples, size_t count, const network::Weights& weig
   PushSamples(samples, count, &detector->stream, [&](const uint16_t* features) {
     if (!TakeFrame(features, weights, detector)) return;
     ++pass.runs;
-    const float* scores = network::ScoresOf(detector->arena);
+    const float* scores = detector->network.scores;
     for (size_t i = 0; i < config::kClasses; ++i) {
       if (pass.single[i] < scores[i]) pass.single[i] = scores[i];
     }

@@ -9,16 +9,14 @@
 #include "detector/feature_stream.h"
 #include "detector/scores.h"
 #include "detector/window.h"
-#include "network/network.h"
+#include "network/stream_network.h"
 
 namespace qz::detector {
 
 // From a fresh start when it is value-initialised.
 struct Detector {
   FeatureStream stream;
-  int8_t window[kWindowBytes];
-  size_t frames;  // held in `window`
-  network::Arena arena;
+  network::Stream<network::kChunkTileRows> network;
   ShortScores newest_short;
   LongScores newest_long;
 };
@@ -31,7 +29,7 @@ struct Pass {
   Scores confidences{};  // compared with thresholds: two smoothed over runs; all 0 if not valid
 };
 
-// Takes the features of the next frame. True if network::ScoresOf(detector->arena) are new.
+// Takes the features of the next frame. True if `detector->network.scores` are new.
 bool TakeFrame(const uint16_t* features, const network::Weights& weights, Detector* detector);
 
 // A pass over the samples that come next. One that is not valid also forgets the newest scores.

@@ -2,16 +2,14 @@
 #include "evaluation/clip_scores.h"
 
 #include <algorithm>
-#include <cstring>
 #include <memory>
 #include <stdexcept>
 #include <string>
 #include <utility>
 
-#include "base/digest.h"
 #include "dataset/clip_features.h"
 #include "detector/window.h"
-#include "network/network.h"
+#include "network/stream_network.h"
 
 namespace qz::evaluation {
 namespace {
@@ -21,19 +19,10 @@ constexpr size_t kRunsBehindTheEnd = 2;
 using config::kBufferSamples;
 using config::kFramesBetweenRuns;
 using config::kWindowFrames;
-static_assert(config::kScores.Bytes() == sizeof(Scores));
 
 // The frames that hold all of the samples, the last ones filled up with others.
 size_t FramesAround(size_t samples) {
   return detector::FramesOf(samples + config::kHopSamples - 1);
-}
-
-void RunOperators(network::Arena* arena, const network::Weights& weights, uint64_t* digest) {
-  for (size_t op = 0; op < config::kOperatorCount; ++op) {
-    network::RunOperator(op, *arena, weights);
-    const config::Tensor& output = config::kOperators[op].output;
-    *digest = base::Digest(network::BytesOf(*arena, output), output.Bytes(), *digest);
-  }
 }
 
 }  // namespace
@@ -57,19 +46,14 @@ ClipScores ScoreFeatures(const model::PackedModel& model, const std::vector<uint
                                 " bytes, expected " + std::to_string(model::kModelBytes));
   }
   const network::Weights weights = network::WeightsOf(model.data());
-  const auto arena = std::make_unique<network::Arena>();
-  std::vector<int8_t> window(detector::kWindowBytes);
-  size_t frames = 0;
+  const auto stream = std::make_unique<network::Stream<network::kChunkTileRows>>();
   ClipScores scores;
-  scores.digest = base::kEmptyDigest;
-  const auto run = [&] {
-    std::copy(window.begin(), window.end(), network::InputOf(*arena));
-    RunOperators(arena.get(), weights, &scores.digest);
-  };
   for (size_t first = 0; first < features.size(); first += config::kFeatureChannels) {
-    if (!detector::TakeFrame(features.data() + first, window.data(), &frames, run)) continue;
+    int8_t frame[config::kFeatureChannels];
+    detector::MakeNetworkInput(features.data() + first, frame);
+    if (!network::Push(frame, weights, stream.get())) continue;
     Scores& newest = scores.runs.emplace_back();
-    std::memcpy(newest.data(), network::ScoresOf(*arena), sizeof newest);
+    std::copy_n(stream->scores, newest.size(), newest.begin());
     for (size_t i = 0; i < newest.size(); ++i) scores.max[i] = std::max(scores.max[i], newest[i]);
   }
   return scores;

@@ -17,9 +17,6 @@ using detector::Scores;
 struct ClipScores {
   std::vector<Scores> runs;  // of each network run, in order; each score k / 256, k from 0 to 255
   Scores max{};              // over the runs
-  // 64-bit FNV-1a over all output bytes of the operators, run by run; the floats of the last
-  // operator little-endian.
-  uint64_t digest = 0;
 };
 
 // The samples of whole 2 s buffers that a clip fills together with the silence behind it: enough
